@@ -1,0 +1,46 @@
+#pragma once
+
+#include "services/servicesexport.h"
+
+#include <memory>
+
+/// A regular 3-D grid of values with interpolation between its nodes.
+///
+/// On each axis the nodes stand at low, low + spacing, low + 2 spacing and so on, as many as reach
+/// the high end of the box, at least two. Positions vary fastest in x, then in y, then in z.
+/// Between nodes the value is the trilinear interpolation (linear on each axis in turn, x first;
+/// Press et al., Numerical Recipes, 1986, section 3.6, extended to three axes); a position outside
+/// the box is moved to the nearest node plane of the grid first. Set up by one thread, then read by
+/// any number.
+class KELM_SERVICES_EXPORT InterpGrid3D {
+  public:
+    InterpGrid3D();
+    ~InterpGrid3D();
+    InterpGrid3D(const InterpGrid3D&) = delete;
+    InterpGrid3D& operator=(const InterpGrid3D&) = delete;
+
+    /// Number of values a node; called first. @throw kelm::ParameterException unless it is 1
+    void SetDimension(unsigned int nDimension);
+
+    /// Defines the nodes over a box and gives every node the value 0.
+    /// @throw kelm::DataException if a bound or spacing is not finite, a spacing is not above 0 or
+    /// the three values of each node cannot be counted in 32 bits; std::bad_alloc
+    void LayoutGrid(double xMin, double yMin, double zMin, double xMax, double yMax, double zMax,
+                    double xSpacing, double ySpacing, double zSpacing);
+
+    /// @return the number of nodes
+    unsigned int GetNumGridPoints() const;
+
+    /// Writes a triple x, y, z for each node. @param out three times GetNumGridPoints() values
+    void GetGridPositions(double* out) const;
+
+    /// @return one writable value a node, in the order of the positions; owned by the grid
+    double* GetArray() const;
+
+    /// Interpolates at a position. @param out one value. Does not throw
+    void GetVal(double x, double y, double z, double* out) const;
+
+  private:
+    struct Grid;
+    std::unique_ptr<Grid> mpoGrid;
+};

@@ -1,0 +1,76 @@
+#pragma once
+
+#include "services/servicesexport.h"
+
+#include <string>
+
+/// Contract of the vector layer store: files, layers, shapes and their vertices.
+///
+/// The library calls one store, whichever implementation it is linked with. Calls that concern one
+/// file come from one thread at a time; different files may be used on different threads.
+
+/// An open file of the store. Opaque: only a store knows its contents.
+struct _iobuf;
+
+/// Segment type of vector layers.
+constexpr int ZAR_SEGMENT_VECTOR = 116;
+
+/// One vertex of a shape: map coordinates and stored height.
+struct ZARVertex {
+    double x;
+    double y;
+    double z;
+};
+
+/// One shape: one ring, whose last vertex repeats the first. A triangle has four vertices.
+struct ZARShape {
+    ZARVertex* vertices; ///< owned by the store
+    int vertexCount;
+};
+
+/// An open layer. A store may keep more behind these two fields.
+struct ZARLayer_t {
+    int shapeCount;
+    int shapeCountValid; ///< non-zero if shapeCount can be relied on
+};
+
+/// Spatial reference of a layer, as the store hands it to the coordinate reference services.
+struct ProjInfo_t {
+    std::string definition; ///< the CRS as WKT; empty if the layer has none
+};
+
+/// Opens a file for reading. @param mode always "r". @return never null. @throw any exception, if
+/// the file is missing, unreadable or of a format that the store does not know.
+KELM_SERVICES_EXPORT _iobuf* ZAROpen(const char* name, const char* mode);
+
+/// Closes a file and ends its layers. Does not throw.
+KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
+
+/// @return the number of segments of this type
+KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
+
+/// @return the number of the first segment of this type behind `after` (0: from the start), or 0
+KELM_SERVICES_EXPORT int ZARSegNext(_iobuf* file, int type, int after);
+
+/// @return the layer of a segment, owned by the file, or null if there is no such layer
+KELM_SERVICES_EXPORT ZARLayer_t* ZARGetLayer(_iobuf* file, int segment);
+
+/// @param n always 0. @return 2 or 4 for a layer of polygons, 1 or 3 for one of points or lines
+KELM_SERVICES_EXPORT int ZARGetLayerType(ZARLayer_t* layer, int n);
+
+/// Fills `*info` with the spatial reference of the layer. @return 0; not relied on
+KELM_SERVICES_EXPORT int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* info);
+
+/// Fills both corners of the layer's extents, heights as stored. @return 0; not relied on
+KELM_SERVICES_EXPORT int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high);
+
+/// Walks the shapes. @param id -1 or a shape id. @return the first id for -1, else the id behind
+/// `id`; -1 at the end. @throw if the layer cannot be read on
+KELM_SERVICES_EXPORT int ZARGetNext(ZARLayer_t* layer, int id);
+
+/// @return the shape, never null; owned by the store and good until the caller moves on to another
+/// shape. @throw any exception, if this one shape cannot be delivered
+KELM_SERVICES_EXPORT ZARShape* ZARGetShapeRef(ZARLayer_t* layer, int id);
+
+/// @return the file that a layer belongs to
+KELM_SERVICES_EXPORT _iobuf* ZARLayer2fp(ZARLayer_t* layer);
