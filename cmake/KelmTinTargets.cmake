@@ -6,7 +6,6 @@ function(kelm_tin_compile_options target)
   # Results must agree to the bit between compilers, optimisation levels and processors. A fused
   # multiply-add rounds once where the source rounds twice, and whether one is used depends on
   # compiler and flags; -ffast-math in a host's flags would reorder sums and drop NaN tests.
-  # The order counts: clang takes -fno-fast-math as leave to contract again.
   target_compile_options(${target} PRIVATE -fno-fast-math -ffp-contract=off)
 
   target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic -Wshadow -Wconversion
