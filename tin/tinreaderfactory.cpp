@@ -1,0 +1,67 @@
+#include "tin/tinreaderfactory.h"
+
+#include "services/exception.h"
+#include "services/reporting.h"
+#include "services/vectorlayer.h"
+#include "tin/detail/shapecount.h"
+#include "tin/tinreader.h"
+
+#include <exception>
+#include <memory>
+
+namespace kelm::tin {
+
+namespace {
+
+struct FileCloser {
+    void operator()(_iobuf* file) const { ZARClose(file); }
+};
+using OpenFile = std::unique_ptr<_iobuf, FileCloser>;
+
+#define THROW_DATA_EXCEPTION(text)                                                                 \
+    throw DataException(text, "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__)
+
+/// The message is the same whatever went wrong; the store's own reason goes to the report.
+_iobuf* Open(const char* pszFilename) {
+    try {
+        return ZAROpen(pszFilename, "r");
+    } catch (const std::exception& reason) {
+        tellus::Report::AddInfo(reason.what());
+    } catch (...) {
+    }
+    THROW_DATA_EXCEPTION(
+        FormatString("The format of file %s is not supported by ZAR", pszFilename));
+}
+
+} // namespace
+
+TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int nLayer,
+                                             const double dfOffset, const double dfScale,
+                                             const ogc::cs::DatumType eSourceDatum) {
+    if (pszFilename == nullptr)
+        THROW_DATA_EXCEPTION("The name of the file must be non-null");
+    OpenFile file(Open(pszFilename));
+    if (ZARSegCount(file.get(), ZAR_SEGMENT_VECTOR) < 1)
+        THROW_DATA_EXCEPTION(FormatString("This file %s contains no vector layer", pszFilename));
+    const int layerNumber = nLayer < 1 ? ZARSegNext(file.get(), ZAR_SEGMENT_VECTOR, 0) : nLayer;
+    ZARLayer_t* layer = ZARGetLayer(file.get(), layerNumber);
+    if (layer == nullptr)
+        THROW_DATA_EXCEPTION(
+            FormatString("ZARGetLayer failed on the provided vector layer %d in the input file %s.",
+                         layerNumber, pszFilename));
+    const int type = ZARGetLayerType(layer, 0);
+    if (type != 2 && type != 4)
+        THROW_DATA_EXCEPTION(FormatString(
+            "The provided vector layer %d in the input file %s must be defined by polygons.",
+            layerNumber, pszFilename));
+    if (detail::GetShapeCount(*layer) <= 0)
+        THROW_DATA_EXCEPTION(
+            FormatString("The provided vector layer %d in the input file %s is empty.", layerNumber,
+                         pszFilename));
+    auto reader = std::make_unique<TinReader>(layer, dfOffset, dfScale, eSourceDatum);
+    // The reader closes the file by way of its layer.
+    static_cast<void>(file.release());
+    return reader.release();
+}
+
+} // namespace kelm::tin
