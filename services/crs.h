@@ -21,7 +21,7 @@ enum DatumType : int {
 
 /// Unit of the heights of a compound CRS.
 enum LinearUnitType : int {
-    LU_Default = 0 ///< metres for ellipsoidal heights, the vertical CRS's own unit for others
+    LU_Default = 0 ///< that of the layer's own CRS for such heights if it names one, else metres
 };
 
 /// A coordinate reference system.
@@ -43,8 +43,10 @@ class KELM_SERVICES_EXPORT IMathTransform {
   public:
     virtual ~IMathTransform();
     /// Transforms points. @param source nCount triples x, y, z, with x as easting or longitude
-    /// @param target nCount triples, another array; z is the height in the target CRS
-    /// @return true; not relied on. @throw if any point cannot be transformed
+    /// @param target nCount triples, another array; z is the height in the target CRS. Without
+    /// meaning after a throw
+    /// @return true; not relied on. @throw if any point cannot be transformed, telling how many
+    /// and the first of them
     virtual bool TransformPoints(const double* source, double* target, unsigned int nCount) = 0;
 };
 
@@ -59,7 +61,9 @@ enum PEType : int { PE_Default = 3 };
 class KELM_SERVICES_EXPORT IProjInfoFactory {
   public:
     /// @param poInfo the record that the vector layer store filled
-    /// @return the two-dimensional CRS of the layer; the caller owns it. @throw if there is none
+    /// @return the two-dimensional CRS of the layer, which also knows the layer's vertical CRS; the
+    /// caller owns it. A record without CRS gives a local one. @throw if the record's CRS cannot be
+    /// read or has no map coordinates
     virtual cs::ICRS* CreateCRS(ProjInfo_t* poInfo) = 0;
 
   protected:
@@ -75,17 +79,21 @@ class KELM_SERVICES_EXPORT ProjectionEngine {
 
 namespace utils {
 
-/// @return true if the CRS is a local one, to which no datum change applies
+/// @return true if the CRS is a local one, to which no datum change applies: none at all (null
+/// too), or one of a site with no stated place on the earth
 KELM_SERVICES_EXPORT bool IsCRSLocal(const cs::ICRS* poCRS);
 
 /// Joins a horizontal CRS and a vertical datum. @param poHorizontal not taken over
+/// @param eDatum VD_Ellipsoidal, or VD_Orthometric, which is the vertical CRS that the layer itself
+/// names, else EGM96 height (EPSG:5773); any code with a local CRS
 /// @return a new CRS of three dimensions; the caller owns it. @throw if there is no such CRS
 KELM_SERVICES_EXPORT cs::ICRS* CreateCompoundCS(cs::ICRS* poHorizontal, cs::DatumType eDatum,
                                                 cs::LinearUnitType eUnit);
 
-/// Makes the transform between two CRSs. @param dfReserved always 0.0
-/// @return a new transform, independent of both CRS objects; the caller owns it
-/// @throw if there is none of full accuracy
+/// Makes the transform between two CRSs of three dimensions. @param dfReserved always 0.0
+/// @return a new transform, independent of both CRS objects; the caller owns it. Between equal CRSs
+/// it changes no bit; between different heights of local CRSs its TransformPoints throws
+/// @throw if there is none of full accuracy, naming the grid files that are missing
 KELM_SERVICES_EXPORT ct::IMathTransform*
 CreateCRSTransform(const cs::ICRS* poSource, const cs::ICRS* poTarget, double dfReserved);
 

@@ -23,8 +23,10 @@ class KELM_SERVICES_EXPORT InterpGrid3D {
     void SetDimension(unsigned int nDimension);
 
     /// Defines the nodes over a box and gives every node the value 0.
-    /// @throw kelm::DataException if a bound or spacing is not finite, a spacing is not above 0 or
-    /// the three values of each node cannot be counted in 32 bits; std::bad_alloc
+    /// @throw kelm::DataException if a bound or spacing is not finite, a high end lies below its
+    /// low end (as the height range of no height at all does), a spacing is not above 0 or lost in
+    /// the rounding of the bounds, or the three values of each node cannot be counted in 32 bits;
+    /// std::bad_alloc. The former nodes are kept then
     void LayoutGrid(double xMin, double yMin, double zMin, double xMax, double yMax, double zMax,
                     double xSpacing, double ySpacing, double zSpacing);
 
@@ -34,10 +36,12 @@ class KELM_SERVICES_EXPORT InterpGrid3D {
     /// Writes a triple x, y, z for each node. @param out three times GetNumGridPoints() values
     void GetGridPositions(double* out) const;
 
-    /// @return one writable value a node, in the order of the positions; owned by the grid
+    /// @return one writable value a node, in the order of the positions; owned by the grid, good
+    /// until the next LayoutGrid
     double* GetArray() const;
 
-    /// Interpolates at a position. @param out one value. Does not throw
+    /// Interpolates at a position; at a node the value is the node's own. Does not throw
+    /// @param out one value; NaN for a NaN coordinate or a grid without nodes
     void GetVal(double x, double y, double z, double* out) const;
 
   private:
