@@ -1,0 +1,223 @@
+#include "bench/peers.h"
+
+#include <embree3/rtcore.h>
+
+#include <algorithm>
+#include <limits>
+#include <stdexcept>
+#include <utility>
+#include <vector>
+
+namespace kelm::bench {
+
+namespace {
+
+/// One for all scenes; builds run in the calling thread.
+RTCDevice GetDevice() {
+    static const std::unique_ptr<RTCDeviceTy, void (*)(RTCDevice)> poDevice(
+        rtcNewDevice("threads=1"), rtcReleaseDevice);
+    if (poDevice == nullptr)
+        throw std::runtime_error("Embree: no device");
+    return poDevice.get();
+}
+
+/// What both uses of Embree work on: the terrain's own arrays, but for the 4 bytes that must be
+/// readable behind the last vertex.
+struct SceneInput {
+    std::vector<point3_t<float>> oVertices;
+    std::vector<Triangle_Id> oTriangles;
+};
+
+void Fill(const Terrain& oTerrain, SceneInput& rInput) {
+    rInput.oVertices = oTerrain.oVertices;
+    rInput.oVertices.push_back({0.0F, 0.0F, 0.0F});
+    rInput.oTriangles = oTerrain.oTriangles;
+}
+
+/// A robust scene of default build quality over the arrays as they are.
+class Scene {
+  public:
+    Scene(const SceneInput& oInput, RTCSceneFlags eFlags) : mpoScene(rtcNewScene(GetDevice())) {
+        rtcSetSceneFlags(mpoScene, eFlags);
+        RTCGeometry geometry = rtcNewGeometry(GetDevice(), RTC_GEOMETRY_TYPE_TRIANGLE);
+        rtcSetSharedGeometryBuffer(geometry, RTC_BUFFER_TYPE_VERTEX, 0, RTC_FORMAT_FLOAT3,
+                                   oInput.oVertices.data(), 0, sizeof(point3_t<float>),
+                                   oInput.oVertices.size() - 1);
+        rtcSetSharedGeometryBuffer(geometry, RTC_BUFFER_TYPE_INDEX, 0, RTC_FORMAT_UINT3,
+                                   oInput.oTriangles.data(), 0, sizeof(Triangle_Id),
+                                   oInput.oTriangles.size());
+        rtcCommitGeometry(geometry);
+        rtcAttachGeometry(mpoScene, geometry);
+        rtcReleaseGeometry(geometry);
+        rtcCommitScene(mpoScene);
+        if (rtcGetDeviceError(GetDevice()) != RTC_ERROR_NONE)
+            throw std::runtime_error("Embree: the scene was not built");
+        RTCBounds bounds;
+        rtcGetSceneBounds(mpoScene, &bounds);
+        mfTop = bounds.upper_z + 1.0F;
+        mfDepth = mfTop - bounds.lower_z + 1.0F;
+    }
+    Scene(const Scene&) = delete;
+    Scene& operator=(const Scene&) = delete;
+    ~Scene() { rtcReleaseScene(mpoScene); }
+
+    /// A ray down through a position, over the whole height of the scene.
+    RTCRayHit DropRay(float x, float y) const {
+        return MakeRay({x, y, mfTop}, {0.0F, 0.0F, -1.0F}, mfDepth);
+    }
+
+    static RTCRayHit MakeRay(const point3_t<float>& a, const point3_t<float>& direction,
+                             float fLength) {
+        RTCRayHit ray{};
+        ray.ray.org_x = a.x;
+        ray.ray.org_y = a.y;
+        ray.ray.org_z = a.z;
+        ray.ray.dir_x = direction.x;
+        ray.ray.dir_y = direction.y;
+        ray.ray.dir_z = direction.z;
+        ray.ray.tfar = fLength;
+        ray.ray.mask = ~0U;
+        ray.hit.geomID = RTC_INVALID_GEOMETRY_ID;
+        return ray;
+    }
+
+    RTCScene Get() const { return mpoScene; }
+
+  private:
+    RTCScene mpoScene;
+    float mfTop;
+    float mfDepth;
+};
+
+/// The first hit of a ray. @return its parameter along the ray, or -1
+float FindFirst(const Scene& oScene, RTCRayHit& rRay) {
+    RTCIntersectContext context;
+    rtcInitIntersectContext(&context);
+    rtcIntersect1(oScene.Get(), &context, &rRay);
+    return rRay.hit.geomID == RTC_INVALID_GEOMETRY_ID ? -1.0F : rRay.ray.tfar;
+}
+
+/// A query that lists the parameters of all hits. The filter refuses each, so that the search goes
+/// on behind it.
+struct HitList {
+    RTCIntersectContext oContext; ///< first, so that the filter finds the rest
+    std::vector<float> oHits;
+};
+
+void ListHit(const RTCFilterFunctionNArguments* poArgs) {
+    auto* list = reinterpret_cast<HitList*>(poArgs->context);
+    list->oHits.push_back(RTCRayN_tfar(poArgs->ray, poArgs->N, 0));
+    poArgs->valid[0] = 0;
+}
+
+/// @return the parameters of all hits; good until the next call
+const std::vector<float>& FindAll(const Scene& oScene, RTCRayHit& rRay) {
+    static HitList list;
+    rtcInitIntersectContext(&list.oContext);
+    list.oContext.filter = ListHit;
+    list.oHits.clear();
+    rtcIntersect1(oScene.Get(), &list.oContext, &rRay);
+    return list.oHits;
+}
+
+const auto WITH_FILTER = RTC_SCENE_FLAG_ROBUST | RTC_SCENE_FLAG_CONTEXT_FILTER_FUNCTION;
+
+} // namespace
+
+template <>
+struct Index<Embree>::Input : SceneInput {};
+template <>
+struct Index<EmbreeHits>::Input : SceneInput {};
+
+template <>
+struct Index<Embree>::Tree : Scene {
+    using Scene::Scene;
+};
+template <>
+struct Index<EmbreeHits>::Tree : Scene {
+    using Scene::Scene;
+};
+
+template <>
+const char* Index<Embree>::GetName() {
+    return "Embree, first hit";
+}
+template <>
+const char* Index<EmbreeHits>::GetName() {
+    return "Embree, list of hits";
+}
+
+template <>
+std::shared_ptr<const Index<Embree>::Input>
+Index<Embree>::Prepare(const std::shared_ptr<const Terrain>& poTerrain) {
+    auto input = std::make_shared<Input>();
+    Fill(*poTerrain, *input);
+    return input;
+}
+template <>
+std::shared_ptr<const Index<EmbreeHits>::Input>
+Index<EmbreeHits>::Prepare(const std::shared_ptr<const Terrain>& poTerrain) {
+    auto input = std::make_shared<Input>();
+    Fill(*poTerrain, *input);
+    return input;
+}
+
+template <>
+Index<Embree>::Index(const Input& oInput) : mpoTree(new Tree(oInput, RTC_SCENE_FLAG_ROBUST)) {}
+template <>
+Index<EmbreeHits>::Index(const Input& oInput) : mpoTree(new Tree(oInput, WITH_FILTER)) {}
+
+template <>
+Index<Embree>::~Index() = default;
+template <>
+Index<EmbreeHits>::~Index() = default;
+
+template <>
+bool Index<Embree>::GetHeight(float x, float y, float& h) const {
+    RTCRayHit ray = mpoTree->DropRay(x, y);
+    const float t = FindFirst(*mpoTree, ray);
+    if (t < 0.0F)
+        return false;
+    h = ray.ray.org_z - t;
+    return true;
+}
+
+template <>
+bool Index<EmbreeHits>::GetHeight(float x, float y, float& h) const {
+    RTCRayHit ray = mpoTree->DropRay(x, y);
+    const std::vector<float>& hits = FindAll(*mpoTree, ray);
+    if (hits.empty())
+        return false;
+    h = ray.ray.org_z - *std::min_element(hits.begin(), hits.end());
+    return true;
+}
+
+// Along a segment the height is monotone: seen from the higher end the first hit is the highest.
+template <>
+bool Index<Embree>::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b,
+                                           float& h) const {
+    const point3_t<float>& top = a.z >= b.z ? a : b;
+    const point3_t<float>& end = a.z >= b.z ? b : a;
+    const point3_t<float> direction{end.x - top.x, end.y - top.y, end.z - top.z};
+    RTCRayHit ray = Scene::MakeRay(top, direction, 1.0F);
+    const float t = FindFirst(*mpoTree, ray);
+    if (t < 0.0F)
+        return false;
+    h = top.z + t * direction.z;
+    return true;
+}
+
+template <>
+bool Index<EmbreeHits>::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b,
+                                               float& h) const {
+    const point3_t<float> direction{b.x - a.x, b.y - a.y, b.z - a.z};
+    RTCRayHit ray = Scene::MakeRay(a, direction, 1.0F);
+    const std::vector<float>& hits = FindAll(*mpoTree, ray);
+    if (hits.empty())
+        return false;
+    h = a.z + direction.z * (direction.z > 0.0F ? *std::max_element(hits.begin(), hits.end())
+                                                : *std::min_element(hits.begin(), hits.end()));
+    return true;
+}
+
+} // namespace kelm::bench

@@ -1,0 +1,69 @@
+#pragma once
+
+#include "bench/terrain.h"
+#include "tin/aabbtree.h"
+#include "tin/point.h"
+
+#include <memory>
+
+namespace kelm::bench {
+
+/// A competing index. A new one is one name below and one source file that defines the members for
+/// it: Input, Tree and the functions.
+///
+/// The same calls for all: an index is built over what its library works on, which Prepare makes of
+/// a terrain beforehand, and answers from another translation unit, as ours does.
+template <typename Peer>
+class Index {
+  public:
+    /// The terrain in the form that the peer's build takes.
+    struct Input;
+
+    static const char* GetName();
+    static std::shared_ptr<const Input> Prepare(const std::shared_ptr<const Terrain>& poTerrain);
+
+    /// Builds. @param oInput outlives the index
+    explicit Index(const Input& oInput);
+    Index(const Index&) = delete;
+    Index& operator=(const Index&) = delete;
+    ~Index();
+
+    /// The greatest height at a surface-local position. @return is there one?
+    bool GetHeight(float x, float y, float& h) const;
+    /// Height of the highest crossing of the segment from a to b. @return is there one?
+    bool GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h) const;
+
+  private:
+    struct Tree;
+    std::unique_ptr<Tree> mpoTree;
+};
+
+struct Ours;       ///< AabbTree with its defaults
+struct Cgal;       ///< AABB_tree of 3-D triangles
+struct Embree;     ///< robust scene; the first hit from above is the highest
+struct EmbreeHits; ///< the same scene; a filter lists every hit and the highest is looked up
+struct Boost;      ///< R-tree of the triangles' boxes in plan, packed; then the triangle itself
+
+/// Hands a peer to a generic function.
+template <typename Peer>
+struct PeerTag {
+    using Type = Peer;
+};
+
+/// Calls call(PeerTag) for each peer this program was built with, ours first.
+template <typename Call>
+void ForEachPeer(const Call& call) {
+    call(PeerTag<Ours>{});
+#ifdef KELM_BENCH_CGAL
+    call(PeerTag<Cgal>{});
+#endif
+#ifdef KELM_BENCH_EMBREE
+    call(PeerTag<Embree>{});
+    call(PeerTag<EmbreeHits>{});
+#endif
+#ifdef KELM_BENCH_BOOST
+    call(PeerTag<Boost>{});
+#endif
+}
+
+} // namespace kelm::bench

@@ -1,0 +1,83 @@
+#include "bench/workload.h"
+
+#include "bench/random.h"
+#include "bench/terrain.h"
+#include "tin/aabbtree.h"
+
+#include <algorithm>
+#include <cmath>
+
+namespace kelm::bench {
+
+namespace {
+
+constexpr unsigned RASTER = 1000;
+
+Positions MakePositions(const std::string& sTerrain, const std::string& sOrder) {
+    const auto surface = GetSurface(sTerrain);
+    const auto& box = surface->GetBBox();
+    const bool isRandom = sOrder == "random";
+    Random random(3);
+    Positions positions(std::size_t{RASTER} * RASTER);
+    for (std::size_t i = 0; i < positions.size(); ++i) {
+        const float u = isRandom ? random.Unit() : (static_cast<float>(i % RASTER) + 0.5F) / RASTER;
+        const float v = isRandom ? random.Unit() : (static_cast<float>(i / RASTER) + 0.5F) / RASTER;
+        positions[i] = {box.min.x + u * (box.max.x - box.min.x),
+                        box.min.y + v * (box.max.y - box.min.y)};
+    }
+    return positions;
+}
+
+Segments MakeSegments(const std::string& sTerrain, unsigned nPercent) {
+    const auto surface = GetSurface(sTerrain);
+    const tin::AabbTree tree(surface.get());
+    const auto& box = surface->GetBBox();
+    const float length = static_cast<float>(nPercent) / 100.0F *
+                         std::max(box.max.x - box.min.x, box.max.y - box.min.y);
+    Random random(5);
+    const auto anywhere = [&](float low, float high) { return low + random.Unit() * (high - low); };
+    Segments segments(nPercent > 10 ? 2000 : 20000);
+    for (Segment& segment : segments) {
+        const auto ground = [&](point3_t<float>& p) {
+            return surface->GetHeight(p.x, p.y, p.z, &tree);
+        };
+        do {
+            const float turn = 6.2831853F * random.Unit();
+            segment.a = {anywhere(box.min.x, box.max.x), anywhere(box.min.y, box.max.y), 0.0F};
+            segment.b = {segment.a.x + length * std::cos(turn),
+                         segment.a.y + length * std::sin(turn), 0.0F};
+        } while (!ground(segment.a) || !ground(segment.b));
+        segment.a.z += 1.0F;
+        segment.b.z += 1.0F + 0.05F * length * random.Unit();
+    }
+    return segments;
+}
+
+} // namespace
+
+std::shared_ptr<const Positions> GetPositions(const std::string& sTerrain,
+                                              const std::string& sOrder) {
+    return Recall<Positions>(sTerrain + "/" + sOrder, [&] {
+        return std::make_shared<Positions>(MakePositions(sTerrain, sOrder));
+    });
+}
+
+std::shared_ptr<const Segments> GetSegments(const std::string& sTerrain, unsigned nPercent) {
+    return Recall<Segments>(sTerrain + "/" + std::to_string(nPercent), [&] {
+        return std::make_shared<Segments>(MakeSegments(sTerrain, nPercent));
+    });
+}
+
+Difference Compare(const std::vector<float>& oAnswers, const std::vector<float>& oOurs,
+                   float fTolerance) {
+    Difference difference;
+    for (std::size_t i = 0; i < oOurs.size(); ++i) {
+        if ((oAnswers[i] > NO_HEIGHT) != (oOurs[i] > NO_HEIGHT))
+            ++difference.nFound;
+        else if (std::fabs(oAnswers[i] - oOurs[i]) > fTolerance)
+            ++difference.nHeight;
+    }
+    return difference;
+}
+
+} // namespace kelm::bench
