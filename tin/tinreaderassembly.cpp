@@ -1,6 +1,7 @@
 #include "tin/tinreader.h"
 
 #include "services/exception.h"
+#include "tin/detail/cornerhash.h"
 #include "tin/detail/parallelblocks.h"
 #include "tin/octree2.h"
 
@@ -37,27 +38,42 @@ unsigned FindStandIn(const Octree2& oTree, const std::vector<KeyPoint<double>>& 
     return leaf->mnKey;
 }
 
+template <typename StandIn>
+void Renumber(std::vector<Triangle_Id>& oIds, const StandIn& getStandIn) {
+    detail::ParallelBlocks(
+        static_cast<unsigned>(oIds.size()), omp_get_max_threads(),
+        [&](unsigned, unsigned first, unsigned last) {
+            for (unsigned i = first; i < last; ++i)
+                for (std::uint32_t* id : {&oIds[i].id0, &oIds[i].id1, &oIds[i].id2})
+                    *id = getStandIn(*id);
+        });
+}
+
+/// Welds where no octree is needed. @return the number of kept corners, 0 if one is
+unsigned WeldByHash(const std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds,
+                    std::vector<unsigned>& oKeys) {
+    std::vector<unsigned> standIns(oPoints.size());
+    if (!detail::CornerHash::FindStandIns(oPoints, standIns))
+        return 0;
+    unsigned kept = 0;
+    for (unsigned i = 0; i < oKeys.size(); ++i) {
+        oKeys[i] = standIns[i] == i ? 1 : 0;
+        kept += oKeys[i];
+    }
+    Renumber(oIds, [&](unsigned corner) { return standIns[corner]; });
+    return kept;
+}
+
 /// Welds the corners: oKeys becomes 1 for a kept corner and 0 for a dropped one, and each triangle
 /// refers to kept corners only. @return the number of kept corners
 unsigned Weld(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds,
               std::vector<unsigned>& oKeys) {
+    if (const unsigned kept = WeldByHash(oPoints, oIds, oKeys); kept != 0)
+        return kept;
+    std::iota(oKeys.begin(), oKeys.end(), 0U);
     const Octree2 tree(oPoints, oKeys);
-    const auto renumber = [&](unsigned, unsigned first, unsigned last) {
-        for (unsigned i = first; i < last; ++i)
-            for (std::uint32_t* id : {&oIds[i].id0, &oIds[i].id1, &oIds[i].id2})
-                *id = FindStandIn(tree, oPoints, oKeys, *id);
-    };
-    detail::ParallelBlocks(static_cast<unsigned>(oIds.size()), omp_get_max_threads(), renumber);
+    Renumber(oIds, [&](unsigned corner) { return FindStandIn(tree, oPoints, oKeys, corner); });
     return static_cast<unsigned>(tree.GetPointCount());
-}
-
-/// Map position of the surface's origin: the first kept corner that has a finite one.
-point2_t<double> FindBase(const std::vector<KeyPoint<double>>& oPoints,
-                          const std::vector<unsigned>& oKept) {
-    for (const unsigned corner : oKept)
-        if (std::isfinite(oPoints[corner].x) && std::isfinite(oPoints[corner].y))
-            return {oPoints[corner].x, oPoints[corner].y};
-    return {0.0, 0.0};
 }
 
 /// Indices of the kept corners, in rising order.
@@ -124,7 +140,6 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
     if (oPoints.empty() || oIds.empty())
         return nullptr;
     std::vector<unsigned> oKeys(oPoints.size());
-    std::iota(oKeys.begin(), oKeys.end(), 0U);
     unsigned nVertices;
     try {
         nVertices = Weld(oPoints, oIds, oKeys);

@@ -3,6 +3,7 @@
 #include "tin/aabbtree.h"
 #include "tin/detail/leafwalk.h"
 #include "tin/detail/parallelscan.h"
+#include "tin/detail/pointprobe.h"
 
 #include <limits>
 
@@ -26,9 +27,8 @@ bool Tin::GetHeight(const float& x, const float& y, float& height, const AabbTre
         return false;
     float highest = LOWEST;
     if (tree != nullptr) {
-        const auto holds = [=](const BBox<float, point2_t<float>>& box) {
-            return TestInside(box, x, y);
-        };
+        const detail::PointProbe probe(x, y);
+        const auto holds = [=](const BBox<float, point2_t<float>>& box) { return probe.IsIn(box); };
         detail::VisitLeaves(tree->GetRoot(), holds, [&](const std::vector<unsigned>& leaves) {
             for (const unsigned id : leaves)
                 if (holds(mpoTriangles[id].GetBBox()))
@@ -52,7 +52,10 @@ bool Tin::GetHeight(const double& x, const double& y, float& height, const AabbT
 
 void Tin::FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,
                                const AabbTree* tree) const {
-    const auto holds = [=](unsigned id) { return mpoTriangles[id].IsPointInside(x, y); };
+    const detail::PointProbe probe(x, y);
+    const auto holds = [=](unsigned id) {
+        return probe.IsIn(mpoTriangles[id].GetBBox()) && mpoTriangles[id].IsPointInsideLT(x, y);
+    };
     if (tree == nullptr) {
         detail::ParallelScan(mnTriangles, mnThreads, holds, result);
         return;

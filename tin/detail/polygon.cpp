@@ -24,21 +24,31 @@ bool IsRepeat(const V& point, const V& predecessor) {
     return dx > -tolerance && tolerance > dx && dy > -tolerance && tolerance > dy;
 }
 
-/// Do the segments A-B and P-Q meet? Their ends count; parallel segments never meet.
+/// Does the segment A-B meet one of the segments between consecutive points of a chain? Ends count;
+/// parallel segments never meet. Without a branch in the loop, so that pairs are tested side by
+/// side.
 template <typename T>
-bool TestSegmentsMeet(const point2_t<T>& a, const point2_t<T>& b, const point2_t<T>& p,
-                      const point2_t<T>& q) {
-    T d = (b.x - a.x) * (q.y - p.y) - (q.x - p.x) * (b.y - a.y);
-    if (std::numeric_limits<T>::epsilon() > std::fabs(d))
-        return false;
-    T s = (a.y - p.y) * (q.x - p.x) - (a.x - p.x) * (q.y - p.y);
-    T t = (a.y - p.y) * (b.x - a.x) - (a.x - p.x) * (b.y - a.y);
-    if (T(0) > d) {
-        d = -d;
-        s = -s;
-        t = -t;
+bool TestMeetsChain(const point2_t<T>& a, const point2_t<T>& b, const point2_t<T>* chain,
+                    unsigned segments) {
+    const T rx = b.x - a.x;
+    const T ry = b.y - a.y;
+    T meets = T(0); // counted in T, for want of integer lanes of its width
+#pragma omp simd reduction(+ : meets)
+    for (unsigned j = 0; j < segments; ++j) {
+        const T qx = chain[j + 1].x - chain[j].x;
+        const T qy = chain[j + 1].y - chain[j].y;
+        const T wx = a.x - chain[j].x;
+        const T wy = a.y - chain[j].y;
+        const T d = rx * qy - qx * ry;
+        const T sign = std::copysign(T(1), d);
+        const T size = std::fabs(d);
+        const T s = (wy * qx - wx * qy) * sign;
+        const T t = (wy * rx - wx * ry) * sign;
+        const bool meet = !(std::numeric_limits<T>::epsilon() > size) & (T(0) <= s) & (s <= size) &
+                          (T(0) <= t) & (t <= size);
+        meets += meet ? T(1) : T(0);
     }
-    return T(0) <= s && s <= d && T(0) <= t && t <= d;
+    return meets != T(0);
 }
 
 } // namespace
@@ -118,13 +128,16 @@ template <typename T>
 bool Polygon<T>::IsSimple() const {
     if (mnPoints < 4)
         return true;
-    for (unsigned i = 0; i + 2 < mnPoints; ++i)
-        for (unsigned j = i + 2; j < mnPoints; ++j) {
-            const unsigned k = j + 1 == mnPoints ? 0 : j + 1;
-            if (k != i &&
-                TestSegmentsMeet(mpoPoints[i], mpoPoints[i + 1], mpoPoints[j], mpoPoints[k]))
-                return false;
-        }
+    const unsigned last = mnPoints - 1;
+    const point2_t<T> closing[2] = {mpoPoints[last], mpoPoints[0]};
+    for (unsigned i = 0; i + 2 < mnPoints; ++i) {
+        const point2_t<T>& a = mpoPoints[i];
+        const point2_t<T>& b = mpoPoints[i + 1];
+        // The closing edge is a neighbour of the first one.
+        if (TestMeetsChain(a, b, mpoPoints + i + 2, last - i - 2) ||
+            (i > 0 && TestMeetsChain(a, b, closing, 1)))
+            return false;
+    }
     return true;
 }
 
