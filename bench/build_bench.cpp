@@ -1,7 +1,9 @@
+#include "bench/child.h"
 #include "bench/suite.h"
 
-#include <algorithm>
 #include <optional>
+
+#include <malloc.h>
 
 namespace kelm::bench {
 
@@ -22,23 +24,62 @@ void Build(benchmark::State& rState, const std::string& sTerrain) {
                              rState.iterations());
 }
 
-/// About a million triangles a round, so that small builds are averaged.
-std::int64_t GetRepeats(const std::string& sTerrain) {
-    const bool isLarge = sTerrain.find('M') != std::string::npos;
-    return isLarge ? 1 : sTerrain.rfind("100k", 0) == 0 ? 5 : 30;
+/// Bytes that a build takes at its peak and keeps, by a process of its own.
+void WeighBuild(benchmark::State& rState, const std::string& sPeer, const std::string& sTerrain) {
+    for (auto _ : rState) {
+        const Figures figures = RunChild({"build", sPeer, sTerrain});
+        rState.counters["peak"] = figures.at("peak");
+        rState.counters["held"] = figures.at("held");
+        rState.counters["triangles"] = figures.at("triangles");
+    }
 }
 
 } // namespace
 
+Figures MeasureBuild(const std::string& sPeer, const std::string& sTerrain) {
+    Figures figures;
+    ForEachPeer([&](auto tag) {
+        using Peer = typename decltype(tag)::Type;
+        if (sPeer != Index<Peer>::GetName())
+            return;
+        const auto terrain = GetTerrain(sTerrain);
+        const auto input = Index<Peer>::Prepare(terrain);
+        malloc_trim(0);
+        ResetPeak();
+        const double base = GetResident();
+        const Index<Peer> index(*input);
+        figures["held"] = GetResident() - base;
+        figures["peak"] = GetPeak() - base;
+        figures["triangles"] = static_cast<double>(terrain->oTriangles.size());
+    });
+    return figures;
+}
+
 void AddBuild(const Plan& oPlan) {
-    for (const std::string& terrain : oPlan.GetTerrains())
+    const auto forEachBuild = [](const auto& call) {
         ForEachPeer([&](auto tag) {
-            using Peer = typename decltype(tag)::Type;
-            if constexpr (!std::is_same_v<Peer, EmbreeHits>)
-                Add({"build", terrain, Index<Peer>::GetName()}, [=](benchmark::State& state) {
-                    Build<Peer>(state, terrain);
-                })->Iterations(GetRepeats(terrain));
+            if constexpr (!std::is_same_v<typename decltype(tag)::Type, EmbreeHits>)
+                call(tag);
         });
+    };
+    for (const std::string& terrain : oPlan.GetTerrains())
+        forEachBuild([&](auto tag) {
+            using Peer = typename decltype(tag)::Type;
+            Add({"build", terrain, Index<Peer>::GetName()}, [=](benchmark::State& state) {
+                Build<Peer>(state, terrain);
+            })->Iterations(GetRepeats(terrain));
+        });
+    // Inputs that could make a build quadratic.
+    for (const char* ending : {"-same", "-crowded"})
+        for (const std::string& size : oPlan.GetSizes())
+            Add({"build", size + ending, Index<Ours>::GetName()},
+                [=](benchmark::State& state) { Build<Ours>(state, size + ending); });
+    const std::string terrain = oPlan.bQuick ? "100k" : "1M";
+    forEachBuild([&](auto tag) {
+        const std::string peer = Index<typename decltype(tag)::Type>::GetName();
+        Add({"memory", terrain, peer},
+            [=](benchmark::State& state) { WeighBuild(state, peer, terrain); });
+    });
 }
 
 } // namespace kelm::bench

@@ -1,7 +1,9 @@
+#include "bench/child.h"
 #include "bench/suite.h"
 
 #include <gdal.h>
 
+#include <algorithm>
 #include <cstring>
 
 // Usage: tin_bench [--quick] [--data=FOLDER] [options of Google Benchmark]
@@ -35,20 +37,30 @@ void AddVersions() {
 #ifdef KELM_BENCH_BOOST
     benchmark::AddCustomContext("Boost", KELM_BENCH_BOOST);
 #endif
+#ifdef KELM_BENCH_GEOS
+    benchmark::AddCustomContext("GEOS", KELM_BENCH_GEOS);
+#endif
+#ifdef KELM_BENCH_MESHOPTIMIZER
+    benchmark::AddCustomContext("meshoptimizer", KELM_BENCH_MESHOPTIMIZER);
+#endif
 }
 
 } // namespace
 
 int main(int argc, char** argv) {
     GDALAllRegister();
+    if (argc > 1 && std::strcmp(argv[1], "--child") == 0)
+        return kelm::bench::RunJob({argv + 2, argv + argc});
     Plan plan;
     plan.bQuick = TakeOption(argc, argv, "--quick") != nullptr;
     if (const char* folder = TakeOption(argc, argv, "--data="))
         plan.sDataFolder = folder;
-    for (const auto add : {kelm::bench::AddBuild, kelm::bench::AddHeight, kelm::bench::AddLine,
-                           kelm::bench::AddScan, kelm::bench::AddRaster})
+    for (const auto add :
+         {kelm::bench::AddBuild, kelm::bench::AddHeight, kelm::bench::AddLine, kelm::bench::AddScan,
+          kelm::bench::AddRaster, kelm::bench::AddWeld, kelm::bench::AddRing, kelm::bench::AddLoad})
         add(plan);
     AddVersions();
+    benchmark::AddCustomContext("plan", plan.bQuick ? "quick" : "full");
     benchmark::Initialize(&argc, argv);
     if (benchmark::ReportUnrecognizedArguments(argc, argv))
         return 1;

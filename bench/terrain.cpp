@@ -110,6 +110,20 @@ void StretchToGrid(Terrain& rTerrain) {
     stretch(&point3_t<float>::y);
 }
 
+/// Every triangle becomes the first one.
+void MakeSame(Terrain& rTerrain) {
+    std::fill(rTerrain.oTriangles.begin(), rTerrain.oTriangles.end(), rTerrain.oTriangles[0]);
+}
+
+/// Crowds the vertices towards the origin, so that each 100th of the way there is a power of two.
+void Crowd(Terrain& rTerrain) {
+    const float end = rTerrain.oVertices.back().x;
+    for (point3_t<float>& vertex : rTerrain.oVertices) {
+        vertex.x = end * std::exp2(100.0F * (vertex.x / end - 1.0F));
+        vertex.y = end * std::exp2(100.0F * (vertex.y / end - 1.0F));
+    }
+}
+
 /// Cuts an ending off a name. @return was it there?
 bool TakeEnding(std::string& rName, const std::string& sEnding) {
     if (rName.size() < sEnding.size() ||
@@ -122,6 +136,8 @@ bool TakeEnding(std::string& rName, const std::string& sEnding) {
 std::unique_ptr<Terrain> MakeTerrain(const std::string& sName) {
     std::string base = sName;
     const bool isGrid = TakeEnding(base, "-grid");
+    const bool isSame = TakeEnding(base, "-same");
+    const bool isCrowded = TakeEnding(base, "-crowded");
     const bool isShuffled = TakeEnding(base, "-shuffled");
     auto terrain = std::make_unique<Terrain>();
     if (base == "jacksboro") {
@@ -136,6 +152,10 @@ std::unique_ptr<Terrain> MakeTerrain(const std::string& sName) {
     }
     if (isShuffled)
         Shuffle(terrain->oTriangles);
+    if (isSame)
+        MakeSame(*terrain);
+    if (isCrowded)
+        Crowd(*terrain);
     if (isGrid)
         StretchToGrid(*terrain);
     terrain->sName = sName;

@@ -1,0 +1,179 @@
+#include "bench/child.h"
+#include "bench/suite.h"
+#include "tin/tinreader.h"
+#include "tin/tinreaderfactory.h"
+
+#include <cmath>
+#include <filesystem>
+#include <stdexcept>
+
+#include <ogrsf_frmts.h>
+
+namespace kelm::bench {
+
+namespace {
+
+struct Format {
+    const char* pszDriver;
+    const char* pszEnding;
+};
+
+constexpr Format FORMATS[] = {
+    {"GPKG", ".gpkg"}, {"FlatGeobuf", ".fgb"}, {"ESRI Shapefile", ".shp"}};
+
+template <typename T>
+T& Need(T* poObject, const std::string& sWhat) {
+    if (poObject == nullptr)
+        throw std::runtime_error("GDAL: no " + sWhat);
+    return *poObject;
+}
+
+/// Three corners and the first again.
+OGRPolygon* MakePolygon(const containers::KeyPoint<double>* poCorners) {
+    auto* ring = new OGRLinearRing;
+    for (const int i : {0, 1, 2, 0})
+        ring->addPoint(poCorners[i].x, poCorners[i].y, poCorners[i].z);
+    auto* polygon = new OGRPolygon;
+    polygon->addRingDirectly(ring);
+    return polygon;
+}
+
+void WriteLayer(OGRLayer& rLayer, const Terrain& oTerrain) {
+    const auto corners = GetCorners(oTerrain);
+    for (std::size_t i = 0; i < corners.size(); i += 3) {
+        OGRFeature feature(rLayer.GetLayerDefn());
+        feature.SetGeometryDirectly(MakePolygon(&corners[i]));
+        if (rLayer.CreateFeature(&feature) != OGRERR_NONE)
+            throw std::runtime_error("GDAL: a triangle was not written");
+    }
+}
+
+/// Writes a terrain as polygons with heights.
+void WriteFile(const std::string& sTerrain, const Format& format, const std::string& sFile) {
+    GDALDriver& driver =
+        Need(GetGDALDriverManager()->GetDriverByName(format.pszDriver), format.pszDriver);
+    const GDALDatasetUniquePtr file(driver.Create(sFile.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
+    OGRSpatialReference reference;
+    reference.importFromEPSG(32616);
+    OGRLayer& layer =
+        Need(Need(file.get(), sFile).CreateLayer("terrain", &reference, wkbPolygon25D, nullptr),
+             "layer");
+    file->StartTransaction();
+    WriteLayer(layer, *GetTerrain(sTerrain));
+    file->CommitTransaction();
+}
+
+/// The file of a terrain, made anew unless a whole one is there.
+std::string GetFile(const std::string& sFolder, const std::string& sTerrain, const Format& format) {
+    const std::filesystem::path folder = std::filesystem::path(sFolder) / sTerrain;
+    const std::filesystem::path mark = folder / (format.pszEnding + std::string(".whole"));
+    const std::string file = (folder / ("terrain" + std::string(format.pszEnding))).string();
+    if (!std::filesystem::exists(mark)) {
+        std::filesystem::create_directories(folder);
+        std::filesystem::remove(file);
+        WriteFile(sTerrain, format, file);
+        std::filesystem::create_directory(mark);
+    }
+    return file;
+}
+
+/// Sum of all ordinates of a triangle's corners, to tell whether two loads found the same.
+double AddCorner(double x, double y, double z) {
+    return x + y + z;
+}
+
+Figures LoadOurs(const std::string& sFile) {
+    Figures figures;
+    const double start = GetProcessorTime();
+    const std::unique_ptr<tin::TinReader> reader(tin::TinReaderFactory::CreateTinReader(
+        sFile.c_str(), 0, 0.0, 1.0, ogc::cs::DatumType::VD_Orthometric));
+    const double opened = GetProcessorTime();
+    const std::unique_ptr<tin::Tin> surface(reader->Load(nullptr));
+    const double loaded = GetProcessorTime();
+    figures["open"] = opened - start;
+    figures["load"] = loaded - opened;
+    figures["triangles"] = surface->GetTriangleCount();
+    double dx;
+    double dy;
+    surface->GetXYBase(dx, dy);
+    for (unsigned i = 0; i < surface->GetTriangleCount(); ++i)
+        for (int k = 0; k < 3; ++k) {
+            const point3_t<float>& v = *surface->GetTriangle(i)->GetVertex(k);
+            figures["corners"] +=
+                AddCorner(dx + static_cast<double>(v.x), dy + static_cast<double>(v.y),
+                          static_cast<double>(v.z));
+        }
+    return figures;
+}
+
+/// Reads each corner of each polygon and keeps nothing.
+Figures LoopOverOgr(const std::string& sFile) {
+    Figures figures;
+    const double start = GetProcessorTime();
+    const GDALDatasetUniquePtr file(GDALDataset::Open(sFile.c_str(), GDAL_OF_VECTOR));
+    OGRLayer& layer = Need(Need(file.get(), sFile).GetLayer(0), "layer");
+    const double opened = GetProcessorTime();
+    double sum = 0.0;
+    double count = 0.0;
+    for (const auto& feature : layer) {
+        const OGRLinearRing& ring = *feature->GetGeometryRef()->toPolygon()->getExteriorRing();
+        for (int i = 0; i + 1 < ring.getNumPoints(); ++i)
+            sum += AddCorner(ring.getX(i), ring.getY(i), ring.getZ(i));
+        count += 1.0;
+    }
+    figures["open"] = opened - start;
+    figures["load"] = GetProcessorTime() - opened;
+    figures["triangles"] = count;
+    figures["corners"] = sum;
+    return figures;
+}
+
+bool IsTerrain(const Figures& oFigures, const Terrain& oTerrain) {
+    double sum = 0.0;
+    const auto corners = GetCorners(oTerrain);
+    for (const auto& corner : corners)
+        sum += AddCorner(corner.x, corner.y, corner.z);
+    const double count = static_cast<double>(corners.size());
+    return 3.0 * oFigures.at("triangles") == count &&
+           std::fabs(oFigures.at("corners") - sum) < 0.001 * count;
+}
+
+/// The time is that of the load proper; what opening took stands beside it.
+void Load(benchmark::State& rState, const Plan& oPlan, const std::string& sTerrain,
+          const Format& format, const std::string& sWho) {
+    const std::string file = GetFile(oPlan.sDataFolder, sTerrain, format);
+    const auto terrain = GetTerrain(sTerrain);
+    for (auto _ : rState) {
+        const Figures figures = RunChild({"load", sWho, file});
+        rState.SetIterationTime(figures.at("load"));
+        rState.counters["open"] = figures.at("open");
+        rState.counters["peak"] = figures.at("peak");
+        if (!IsTerrain(figures, *terrain))
+            rState.SkipWithError("the file was not read as it was written");
+    }
+    rState.SetItemsProcessed(static_cast<std::int64_t>(terrain->oTriangles.size()) *
+                             rState.iterations());
+}
+
+} // namespace
+
+Figures MeasureLoad(const std::string& sWho, const std::string& sFile) {
+    const double base = GetResident();
+    Figures figures = sWho == "ours" ? LoadOurs(sFile) : LoopOverOgr(sFile);
+    figures["peak"] = GetPeak() - base;
+    return figures;
+}
+
+void AddLoad(const Plan& oPlan) {
+    std::vector<std::string> terrains{"200k"};
+    if (!oPlan.bQuick)
+        terrains.push_back("1M");
+    for (const std::string& terrain : terrains)
+        for (const Format& format : FORMATS)
+            for (const std::string who : {"ours", "bare OGR loop"})
+                Add({"load", format.pszDriver, terrain, who}, [=](benchmark::State& state) {
+                    Load(state, oPlan, terrain, format, who);
+                })->UseManualTime();
+}
+
+} // namespace kelm::bench
