@@ -76,6 +76,15 @@ unsigned Weld(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& 
     return static_cast<unsigned>(tree.GetPointCount());
 }
 
+/// Map position of the surface's origin: the first kept corner that has a finite one.
+point2_t<double> FindBase(const std::vector<KeyPoint<double>>& oPoints,
+                          const std::vector<unsigned>& oKept) {
+    for (const unsigned corner : oKept)
+        if (std::isfinite(oPoints[corner].x) && std::isfinite(oPoints[corner].y))
+            return {oPoints[corner].x, oPoints[corner].y};
+    return {0.0, 0.0};
+}
+
 /// Indices of the kept corners, in rising order.
 std::vector<unsigned> FindKept(const std::vector<unsigned>& oKeys, unsigned count) {
     std::vector<unsigned> kept;
