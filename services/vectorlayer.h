@@ -8,6 +8,10 @@
 ///
 /// The library calls one store, whichever implementation it is linked with. Calls that concern one
 /// file come from one thread at a time; different files may be used on different threads.
+///
+/// The bundled store reads GeoPackage, ESRI Shapefile, FlatGeobuf, GeoJSON, GML, DXF, File
+/// Geodatabase and SQLite files. Its shape ids lead to feature ids by the rule of
+/// services/bundled/shapeids.h.
 
 /// An open file of the store. Opaque: only a store knows its contents.
 struct _iobuf;
@@ -43,7 +47,7 @@ struct ProjInfo_t {
 /// the file is missing, unreadable or of a format that the store does not know.
 KELM_SERVICES_EXPORT _iobuf* ZAROpen(const char* name, const char* mode);
 
-/// Closes a file and ends its layers. Does not throw.
+/// Closes a file and ends its layers; null is let be. Does not throw.
 KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
 
 /// @return the number of segments of this type
@@ -53,6 +57,7 @@ KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
 KELM_SERVICES_EXPORT int ZARSegNext(_iobuf* file, int type, int after);
 
 /// @return the layer of a segment, owned by the file, or null if there is no such layer
+/// @throw any exception, if the layer cannot be read
 KELM_SERVICES_EXPORT ZARLayer_t* ZARGetLayer(_iobuf* file, int segment);
 
 /// @param n always 0. @return 2 or 4 for a layer of polygons, 1 or 3 for one of points or lines
@@ -65,7 +70,7 @@ KELM_SERVICES_EXPORT int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* inf
 KELM_SERVICES_EXPORT int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high);
 
 /// Walks the shapes. @param id -1 or a shape id. @return the first id for -1, else the id behind
-/// `id`; -1 at the end. @throw if the layer cannot be read on
+/// `id`; -1 at the end. @throw if the layer cannot be read on, or has no shape `id`
 KELM_SERVICES_EXPORT int ZARGetNext(ZARLayer_t* layer, int id);
 
 /// @return the shape, never null; owned by the store and good until the caller moves on to another

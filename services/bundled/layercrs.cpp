@@ -1,0 +1,61 @@
+#include "services/bundled/layercrs.h"
+
+#include "services/bundled/formats.h"
+#include "services/bundled/gdalcall.h"
+#include "services/exception.h"
+#include "services/reporting.h"
+
+#include <cpl_conv.h>
+#include <ogrsf_frmts.h>
+
+#include <memory>
+
+namespace kelm::store {
+
+namespace {
+
+/// Srs ids -1 and 0 of a GeoPackage. Later versions of GDAL add words to the names, and files of
+/// other formats that were made from a GeoPackage carry them on, a Shapefile with underscores.
+bool IsUndefined(const OGRSpatialReference& oCrs) {
+    const char* pszName = oCrs.GetName();
+    for (const char* pszUndefined : {"Undefined Cartesian SRS", "Undefined geographic SRS",
+                                     "Undefined_Cartesian_SRS", "Undefined_geographic_SRS"})
+        if (pszName && STARTS_WITH_CI(pszName, pszUndefined))
+            return true;
+    return false;
+}
+
+std::string WriteText(const OGRSpatialReference& oCrs, const std::string& subject,
+                      const GdalCall& oCall) {
+    if (oCrs.IsEmpty() || IsUndefined(oCrs))
+        return {};
+    const char* const apszOptions[] = {"FORMAT=WKT2_2019", "MULTILINE=NO", nullptr};
+    char* pszText = nullptr;
+    const OGRErr eError = oCrs.exportToWkt(&pszText, apszOptions);
+    const std::unique_ptr<char, decltype(&CPLFree)> poText(pszText, CPLFree);
+    if (eError != OGRERR_NONE || !pszText || !*pszText)
+        throw DataException(FormatString("The CRS of the %s cannot be written as WKT: %s",
+                                         subject.c_str(), oCall.GetFailures().c_str()),
+                            "services/bundled/layercrs", __PRETTY_FUNCTION__, __LINE__);
+    return pszText;
+}
+
+} // namespace
+
+std::string ReadCrsText(OGRLayer& oLayer, const std::string& subject) {
+    std::string text;
+    Warnings oWarnings;
+    {
+        GdalCall oCall;
+        const Confinement oConfinement;
+        if (const OGRSpatialReference* poCrs = oLayer.GetSpatialRef())
+            text = WriteText(*poCrs, subject, oCall);
+        oWarnings = oCall.TakeWarnings();
+        if (oCall.HasFailed())
+            AddWarning(oWarnings, oCall.GetFailures(), 1);
+    }
+    PassOn(oWarnings, "The CRS of the " + subject);
+    return text;
+}
+
+} // namespace kelm::store
