@@ -1,0 +1,41 @@
+#pragma once
+
+#include <stdlib.h>
+
+#include <filesystem>
+#include <fstream>
+#include <stdexcept>
+#include <string>
+
+namespace kelm::test {
+
+/// A folder that is removed with all that is in it when the object ends.
+class TemporaryFolder {
+  public:
+    TemporaryFolder() {
+        std::string name = std::filesystem::temp_directory_path() / "kelm-tin-XXXXXX";
+        if (!mkdtemp(name.data()))
+            throw std::runtime_error("cannot make a folder like " + name);
+        moPath = name;
+    }
+    ~TemporaryFolder() {
+        std::error_code oError;
+        std::filesystem::remove_all(moPath, oError);
+    }
+    TemporaryFolder(const TemporaryFolder&) = delete;
+    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+
+    /// @return the path of a file of this name in the folder
+    std::string GetPath(const std::string& name) const { return moPath / name; }
+
+    /// Writes a file of this content. @return its path
+    std::string WriteFile(const std::string& name, const std::string& content) const {
+        std::ofstream(moPath / name, std::ios::binary) << content;
+        return GetPath(name);
+    }
+
+  private:
+    std::filesystem::path moPath;
+};
+
+} // namespace kelm::test
