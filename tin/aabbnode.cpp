@@ -248,8 +248,9 @@ void AabbNode::FindLeaves(const Box& box, std::vector<unsigned>& list) const {
 
 template <typename P>
 void AabbNode::FindLeavesByLine(const P& a, const P& b, std::vector<unsigned>& out) const {
+    const Ray2<float> ray = detail::CreateSegmentRay(a, b);
     detail::VisitLeaves(
-        this, [&](const Box& box) { return IsIntersectedBBox(box, a, b); },
+        this, [&](const Box& box) { return detail::TestSegment(box, ray); },
         [&](const std::vector<unsigned>& leaves) {
             out.insert(out.end(), leaves.begin(), leaves.end());
         });

@@ -62,6 +62,12 @@ inline bool TestSegment(const BBox<T, P>& box, const Ray2<T>& ray) {
            ClipToSlab(box.min.y, box.max.y, origin.y, dirInv.y, ray.GetSign(1), tMin, tMax);
 }
 
+/// The ray of the segment from a to b in plan, to be tested against many boxes.
+template <typename P>
+inline Ray2<float> CreateSegmentRay(const P& a, const P& b) {
+    return {point2_t<float>{a.x, a.y}, point2_t<float>{b.x - a.x, b.y - a.y}};
+}
+
 } // namespace detail
 
 /// True if the segment from a to b meets the box in plan, touching included; z takes no part. A
@@ -69,8 +75,7 @@ inline bool TestSegment(const BBox<T, P>& box, const Ray2<T>& ray) {
 /// with 2-D or 3-D points, 3-D box with 3-D points.
 template <typename B, typename P>
 inline bool IsIntersectedBBox(const BBox<float, B>& box, const P& a, const P& b) {
-    const Ray2<float> ray(point2_t<float>{a.x, a.y}, point2_t<float>{b.x - a.x, b.y - a.y});
-    return detail::TestSegment(box, ray);
+    return detail::TestSegment(box, detail::CreateSegmentRay(a, b));
 }
 
 } // namespace kelm::tin

@@ -29,8 +29,9 @@ bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>
         return false;
     h = LOWEST;
     if (tree != nullptr) {
+        const Ray2<float> ray = detail::CreateSegmentRay(a, b);
         const auto meets = [&](const BBox<float, point2_t<float>>& box) {
-            return IsIntersectedBBox(box, a, b);
+            return detail::TestSegment(box, ray);
         };
         float highest = LOWEST;
         detail::VisitLeaves(tree->GetRoot(), meets, [&](const std::vector<unsigned>& leaves) {

@@ -1,13 +1,13 @@
 #include "tin/triangle.h"
 
 #include "services/exception.h"
+#include "tin/detail/barycentric.h"
 #include "tin/ray2.h"
 #include "tin/vector3.h"
 
 #include <algorithm>
 #include <cfloat>
 #include <cmath>
-#include <limits>
 
 static_assert(FLT_EVAL_METHOD == 0, "a float expression must be rounded to float at each step");
 
@@ -15,20 +15,13 @@ namespace kelm::tin {
 
 namespace {
 
-/// Below this a determinant is no divisor: the configuration is degenerate.
-constexpr double EPSILON = std::numeric_limits<double>::epsilon();
-
-double Widen(float v) {
-    return static_cast<double>(v);
-}
+using detail::EPSILON;
+using detail::IsDegenerate;
+using detail::Widen;
 
 /// Difference in `float`, component by component, then widened.
 Vector3 Difference(const point3_t<float>& a, const point3_t<float>& b) {
     return {Widen(a.x - b.x), Widen(a.y - b.y), Widen(a.z - b.z)};
-}
-
-bool IsDegenerate(double det) {
-    return det > -EPSILON && EPSILON > det;
 }
 
 /// Does the segment A-B cross the segment P-Q in plan? Ends count; parallel segments never cross.
@@ -118,22 +111,11 @@ void Triangle::GetCenterXY(point2_t<float>* out) const {
 }
 
 int Triangle::GetBarycentricCoord(float x, float y, double& l0, double& l1, double& l2) const {
-    const point3_t<float>& v0 = *vertices[0];
-    const point3_t<float>& v1 = *vertices[1];
-    const point3_t<float>& v2 = *vertices[2];
-    const float a = v1.y - v2.y;
-    const double det = Widen((v0.x - v2.x) * a - (v1.x - v2.x) * (v0.y - v2.y));
-    if (IsDegenerate(det))
+    detail::Barycentric barycentric(*vertices[0], *vertices[1], *vertices[2]);
+    if (barycentric.IsFlat())
         return -1;
-    // In this direction a NaN weight passes each bound.
-    l0 = Widen((v2.x - v1.x) * (y - v2.y) + (x - v2.x) * a) / det;
-    if (l0 > 1.0 || 0.0 > l0)
-        return -1;
-    l1 = Widen((v2.y - v0.y) * (x - v2.x) + (y - v2.y) * (v0.x - v2.x)) / det;
-    if (l1 > 1.0 || 0.0 > l1)
-        return -1;
-    l2 = (1.0 - l0) - l1;
-    return l2 > 1.0 || 0.0 > l2 ? -1 : 0;
+    barycentric.SetRow(y);
+    return barycentric.GetWeights(x, l0, l1, l2) ? 0 : -1;
 }
 
 float Triangle::GetWeightedHeight(double l0, double l1, double l2) const {

@@ -123,6 +123,8 @@ class KELM_TIN_EXPORT Triangle {
 
   private:
     float GetWeightedHeight(double l0, double l1, double l2) const;
+    void AddGridPoint(int col, int row, std::vector<int>& points, std::vector<float>& heights,
+                      const double* bary) const;
 
     template <typename Single, typename Run>
     bool WalkGrid(int cols, int rows, Single&& single, Run&& run) const;

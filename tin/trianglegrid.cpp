@@ -1,5 +1,7 @@
 #include "tin/triangle.h"
 
+#include "tin/detail/barycentric.h"
+
 #include <algorithm>
 #include <cmath>
 #include <limits>
@@ -71,6 +73,11 @@ void Triangle::GetGridPoint(int col, int row, std::vector<int>& points, std::vec
     if (GetBarycentricCoord(static_cast<float>(col), static_cast<float>(row), bary[0], bary[1],
                             bary[2]) != 0)
         return;
+    AddGridPoint(col, row, points, heights, bary);
+}
+
+void Triangle::AddGridPoint(int col, int row, std::vector<int>& points, std::vector<float>& heights,
+                            const double* bary) const {
     points.push_back(col);
     points.push_back(row);
     heights.push_back(GetWeightedHeight(bary[0], bary[1], bary[2]));
@@ -124,11 +131,18 @@ bool Triangle::WalkGrid(int cols, int rows, Single&& single, Run&& run) const {
 unsigned Triangle::GetGridPoints(int cols, int rows, std::vector<int>& points,
                                  std::vector<float>& heights) const {
     double bary[3];
+    detail::Barycentric barycentric(*vertices[0], *vertices[1], *vertices[2]);
+    const bool flat = barycentric.IsFlat();
     const auto add = [&](int col, int row) { GetGridPoint(col, row, points, heights, bary); };
-    const bool covered = WalkGrid(cols, rows, add, [&](int first, int last, int row) {
+    const auto addRun = [&](int first, int last, int row) {
+        if (flat)
+            return;
+        barycentric.SetRow(static_cast<float>(row));
         for (int col = first; col <= last; ++col)
-            add(col, row);
-    });
+            if (barycentric.GetWeights(static_cast<float>(col), bary[0], bary[1], bary[2]))
+                AddGridPoint(col, row, points, heights, bary);
+    };
+    const bool covered = WalkGrid(cols, rows, add, addRun);
     return covered ? static_cast<unsigned>(points.size() / 2) : 0U;
 }
 

@@ -31,7 +31,9 @@ class PointProbe {
 #else
     PointProbe(float x, float y) : mfX(x), mfY(y) {}
 
-    bool IsIn(const BBox<float, point2_t<float>>& box) const { return TestInside(box, mfX, mfY); }
+    bool IsIn(const BBox<float, point2_t<float>>& box) const {
+        return TestInside(box, mfX, mfY);
+    }
 
   private:
     float mfX;
