@@ -1,6 +1,8 @@
 #include "bench/peers.h"
 #include "bench/plane.h"
 
+// Boost's own headers include deprecated ones.
+#define BOOST_ALLOW_DEPRECATED_HEADERS
 #include <boost/geometry.hpp>
 #include <boost/geometry/geometries/box.hpp>
 #include <boost/geometry/geometries/point_xy.hpp>

@@ -90,13 +90,17 @@ void WalkRows(const Terrain& oTerrain, const Row& row) {
     }
 }
 
-/// Each cell of a run is tested and weighted by itself.
+/// Each cell of a run is tested and weighted by itself, by the textbook's formula.
 void WalkPlainly(const std::string& sTerrain, Raster& rRaster) {
     WalkRows(*GetTerrain(sTerrain), [&](const auto& corners, int y, const Run& run) {
+        const auto& [v0, v1, v2] = corners;
         for (int x = run.nFirst; x <= run.nLast; ++x) {
-            double h;
-            if (GetPlaneHeight(corners[0], corners[1], corners[2], x, y, h))
-                KeepHighest(rRaster, x, y, static_cast<float>(h));
+            const double det = (v1.y - v2.y) * (v0.x - v2.x) + (v2.x - v1.x) * (v0.y - v2.y);
+            const double w0 = ((v1.y - v2.y) * (x - v2.x) + (v2.x - v1.x) * (y - v2.y)) / det;
+            const double w1 = ((v2.y - v0.y) * (x - v2.x) + (v0.x - v2.x) * (y - v2.y)) / det;
+            const double w2 = 1.0 - w0 - w1;
+            if (w0 >= 0.0 && w1 >= 0.0 && w2 >= 0.0)
+                KeepHighest(rRaster, x, y, static_cast<float>(w0 * v0.z + w1 * v1.z + w2 * v2.z));
         }
     });
 }

@@ -65,6 +65,7 @@ inline std::int64_t GetRepeats(const std::string& sTerrain) {
 inline void ReportDifference(benchmark::State& rState, const Difference& oDifference) {
     rState.counters["differ"] = static_cast<double>(oDifference.GetSum());
     rState.counters["differ_found"] = static_cast<double>(oDifference.nFound);
+    rState.counters["differ_most"] = static_cast<double>(oDifference.fMost);
 }
 
 /// The index of a peer over a terrain, the one asked for last kept in memory.

@@ -72,10 +72,13 @@ Difference Compare(const std::vector<float>& oAnswers, const std::vector<float>&
                    float fTolerance) {
     Difference difference;
     for (std::size_t i = 0; i < oOurs.size(); ++i) {
-        if ((oAnswers[i] > NO_HEIGHT) != (oOurs[i] > NO_HEIGHT))
+        if ((oAnswers[i] > NO_HEIGHT) != (oOurs[i] > NO_HEIGHT)) {
             ++difference.nFound;
-        else if (std::fabs(oAnswers[i] - oOurs[i]) > fTolerance)
-            ++difference.nHeight;
+            continue;
+        }
+        const float distance = std::fabs(oAnswers[i] - oOurs[i]);
+        difference.nHeight += distance > fTolerance ? 1 : 0;
+        difference.fMost = std::max(difference.fMost, distance);
     }
     return difference;
 }

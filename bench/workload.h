@@ -33,6 +33,7 @@ std::shared_ptr<const Segments> GetSegments(const std::string& sTerrain, unsigne
 struct Difference {
     std::size_t nFound = 0;  ///< one has a height, the other has none
     std::size_t nHeight = 0; ///< both have one, and they lie further apart than the tolerance
+    float fMost = 0.0F;      ///< greatest distance of two heights, in metres
 
     std::size_t GetSum() const { return nFound + nHeight; }
 };

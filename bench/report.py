@@ -1,0 +1,396 @@
+#!/usr/bin/env python3
+"""Writes docs/benchmarks.md from the rounds of tin_bench.
+
+Usage: report.py ROUND.json ... > docs/benchmarks.md
+
+Each figure is the median of the rounds. Fails if a benchmark failed, for one because our index and
+our scan disagree.
+"""
+
+import json
+import math
+import platform
+import statistics
+import subprocess
+import sys
+
+# Why a goal is missed, by its key in get_goals(). A goal that is short and has no sentence here is
+# printed as unexplained.
+CAUSES = {}
+
+# Title, key, unit of a figure (factor on nanoseconds an item, text), workload in words.
+SUBJECTS = [
+    ("Build", "build", (1, "ns a triangle"),
+     "An index over a terrain that is in memory in the form that each builds from: our triangles, "
+     "CGAL's triangles, Embree's shared buffers, a vector of boxes for Boost. Releasing it is not "
+     "timed. Terrains are fractal, their nodes 10 m apart with 3 m of jitter, two triangles a "
+     "cell, in row order or shuffled; `jacksboro` is real (17,619 triangles). `same`: as many copies of "
+     "one triangle. `crowded`: vertices crowd towards a corner of the box by powers of two."),
+    ("Memory of an index", "memory", (0, "bytes a triangle"),
+     "Resident memory that a build adds at its peak and keeps, beyond what it is built over, each "
+     "in a process of its own."),
+    ("Heights along scanlines", "height/scanline", (1, "ns a height"),
+     "The greatest height at a million positions, row by row over the whole extent, one call a "
+     "position. CGAL lists the triangles that a plumb line meets, Boost those whose box holds the "
+     "position; the highest is looked up. Embree casts a ray down, by its robust flag: the first "
+     "hit is the highest; in the second column a filter lists all hits."),
+    ("Heights at random positions", "height/random", (1, "ns a height"),
+     "The same at a million positions in random order."),
+    ("Highest crossing of short segments", "line/2%", (1e-3, "µs a segment"),
+     "20,000 lines of sight of 2 % of the extent, from 1 m above the ground to at least 1 m and up "
+     "to 5 % of the length above it. Our index and Boost's know the plan only and see every "
+     "triangle below the segment. CGAL's and Embree's are three-dimensional and see those whose "
+     "box the segment passes through; for Embree, the first hit from the higher end."),
+    ("Highest crossing of long segments", "line/50%", (1e-3, "µs a segment"),
+     "The same for 2,000 segments of 50 % of the extent."),
+    ("Heights without an index", "scan", (1e-3, "µs a height"),
+     "One height by a scan of all triangles, beside reading one word of each cache line of the "
+     "array of triangles."),
+    ("Welding", "weld", (1, "ns a corner"),
+     "Three corners a triangle in map coordinates, 24 bytes each: for every corner the first one "
+     "that is within 1e-9 on each axis; for meshoptimizer, whose bits are the same. `twins`: one "
+     "corner in a thousand is moved by the least step of a double. `ours, corners to surface` adds "
+     "what follows in a load: vertices, triangles and their boxes."),
+    ("Rings, star-shaped", "ring/star", (1e-3, "µs a ring"),
+     "Rings of 4 to 500 corners around a centre, tested for being simple and cut into triangles. "
+     "GEOS: isSimple and PolygonTriangulator on a polygon made beforehand. CGAL: constrained "
+     "Delaunay. Ours starts from the vertices of a shape."),
+    ("Rings, wiggly", "ring/wiggly", (1e-3, "µs a ring"),
+     "The same for bands that go up and down at each step."),
+    ("Whole surface to a raster", "raster", (1e-6, "ms a raster"),
+     "2000 x 2000 cells over the whole terrain, the greatest height in each, from triangles in "
+     "grid coordinates. Embree casts a ray a cell, its index built beforehand. The row walks are "
+     "plain loops in `double` over the triangles: one tests and weights each cell of a row, the "
+     "other takes them for inside and steps along the plane. GDAL triangulates the vertices anew."),
+    ("Loading, GeoPackage", "load/GPKG", (1e-9, "s"),
+     "Triangles as polygons with heights, each load in a process of its own: processor time of "
+     "`Load` beside a loop over all features that reads each corner and keeps nothing."),
+    ("Loading, FlatGeobuf", "load/FlatGeobuf", (1e-9, "s"), "The same."),
+    ("Loading, Shapefile", "load/ESRI Shapefile", (1e-9, "s"), "The same."),
+]
+
+
+class Results:
+    """The rounds: for each benchmark, its figures by name."""
+
+    def __init__(self, paths):
+        self.figures = {}
+        self.failures = []
+        for path in paths:
+            with open(path, encoding="utf-8") as file:
+                round_ = json.load(file)
+            self.context = round_["context"]
+            for run in round_["benchmarks"]:
+                self.add(run)
+
+    def add(self, run):
+        parts = [p for p in run["name"].split("/")
+                 if not p.startswith("iterations:") and p not in ("process_time", "manual_time")]
+        key = ("/".join(parts[:-2]), parts[-2], parts[-1])
+        if run.get("error_occurred"):
+            self.failures.append("/".join(parts) + ": " + run["error_message"])
+            return
+        figures = self.figures.setdefault(key, {})
+        for name in ("items_per_second", "differ", "differ_found",
+                     "differ_most", "open", "peak", "held", "triangles",
+                     "crossings"):
+            if name in run:
+                figures.setdefault(name, []).append(run[name])
+
+    def get(self, subject, row, who, name):
+        """The median of a figure, or None."""
+        values = self.figures.get((subject, row, who), {}).get(name)
+        return statistics.median(values) if values else None
+
+    def get_time(self, subject, row, who="ours"):
+        """Nanoseconds an item, or None."""
+        rate = self.get(subject, row, who, "items_per_second")
+        return 1e9 / rate if rate else None
+
+    def get_ratio(self, subject, row, who):
+        """The other's time by ours, or None."""
+        ours = self.get_time(subject, row)
+        other = self.get_time(subject, row, who)
+        return other / ours if ours and other else None
+
+    def get_rows(self, subject):
+        return list(dict.fromkeys(k[1] for k in self.figures if k[0] == subject))
+
+    def get_columns(self, subject):
+        return list(dict.fromkeys(k[2] for k in self.figures if k[0] == subject))
+
+    def get_spread(self):
+        """Median over all benchmarks of the greatest by the least of its rounds."""
+        spreads = [max(v) / min(v) for f in self.figures.values()
+                   for v in [f.get("items_per_second", [])] if len(v) > 1]
+        return statistics.median(spreads) if spreads else None
+
+
+def format_figure(value):
+    if value is None:
+        return ""
+    digits = max(0, 2 - math.floor(math.log10(value))) if value > 0 else 0
+    return f"{value:,.{min(digits, 4)}f}"
+
+
+def format_table(header, rows):
+    lines = ["| " + " | ".join(header) + " |", "|" + "---|" * len(header)]
+    lines += ["| " + " | ".join(row) + " |" for row in rows]
+    return "\n".join(lines)
+
+
+def format_cell(results, subject, row, who, factor):
+    time = results.get_time(subject, row, who)
+    if time is None:
+        return ""
+    ratio = results.get_ratio(subject, row, who)
+    return format_figure(time * factor) + (f" ({ratio:.2f})" if who != "ours" and ratio else "")
+
+
+def get_notes(results, subject):
+    """Where a competitor's answers differ from ours."""
+    notes = []
+    for who in results.get_columns(subject):
+        named = [describe_difference(results, subject, row, who)
+                 for row in results.get_rows(subject) if results.get(subject, row, who, "differ")]
+        if named:
+            notes.append(f"- {who}: {'; '.join(named)}")
+    return ["Other answers than ours:\n\n" + "\n".join(notes)] if notes else []
+
+
+def describe_difference(results, subject, row, who):
+    count = int(results.get(subject, row, who, "differ"))
+    found = int(results.get(subject, row, who, "differ_found") or 0)
+    most = results.get(subject, row, who, "differ_most") or 0
+    words = []
+    if found:
+        words.append(f"{found:,} found by one of the two only")
+    if count > found and most:
+        words.append(f"{count - found:,} heights apart by up to {most:.2g} m")
+    return f"{row} {', '.join(words) or f'{count:,}'}"
+
+
+def format_memory(results):
+    rows = []
+    for row in results.get_rows("memory"):
+        for who in results.get_columns("memory"):
+            count = results.get("memory", row, who, "triangles")
+            rows.append([row, who.split(",")[0]] + [format_figure(results.get("memory", row, who, name) / count)
+                                      for name in ("held", "peak")])
+    return format_table(["Terrain", "Index", "kept", "peak"], rows)
+
+
+def format_load(results, subject):
+    rows = []
+    for row in results.get_rows(subject):
+        for who in results.get_columns(subject):
+            rows.append([row, who, format_cell(results, subject, row, who, 1e-9 * get_count(row)),
+                         format_figure(results.get(subject, row, who, "open")),
+                         format_figure(results.get(subject, row, who, "peak") / 1e6)])
+    return format_table(["Triangles", "", "time, s (ratio)", "opening, s", "peak memory, MB"], rows)
+
+
+def get_count(row):
+    """Triangles of a terrain by its name."""
+    name = row.split("-")[0]
+    number = float(name[:-1]) * {"k": 1e3, "M": 1e6}[name[-1]]
+    return 2 * round(math.sqrt(number / 2)) ** 2
+
+
+def format_subject(results, title, subject, factor, unit, words):
+    if not results.get_rows(subject):
+        return ""
+    parts = [f"## {title}", words]
+    if subject == "memory":
+        parts.append(f"In {unit}.\n\n" + format_memory(results))
+    elif subject.startswith("load"):
+        parts.append(format_load(results, subject))
+    else:
+        columns = results.get_columns(subject)
+        table = [[row] + [format_cell(results, subject, row, who, factor) for who in columns]
+                 for row in results.get_rows(subject)]
+        columns_named = [who.split(",")[0] if subject == "build" else who for who in columns]
+        first = "Corners" if subject.startswith("ring") else "Terrain"
+        parts.append(f"In {unit}.\n\n" + format_table([first] + columns_named, table))
+    parts += get_notes(results, subject)
+    return "\n\n".join(parts)
+
+
+class Goal:
+    """One row of the goals: pairs of what was compared and its value, each with a bound."""
+
+    def __init__(self, key, text):
+        self.key = key
+        self.text = text
+        self.values = []
+
+    def at_least(self, label, value, bound):
+        self.values.append((label, value, bound, value is not None and value >= bound, "≥"))
+        return self
+
+    def at_most(self, label, value, bound):
+        self.values.append((label, value, bound, value is not None and value <= bound, "≤"))
+        return self
+
+    def format(self):
+        known = [v for v in self.values if v[1] is not None]
+        found = "; ".join(f"{label} {value:.2f}" for label, value, _, _, _ in known)
+        if not known:
+            return [self.text, "", "not measured"]
+        short = [f"{label} {value:.2f}, not {sign} {bound:g}"
+                 for label, value, bound, is_met, sign in known if not is_met]
+        if not short:
+            return [self.text, found, "met"]
+        cause = CAUSES.get(self.key, "Cause not yet known.")
+        return [self.text, found, f"**short**: {'; '.join(short)}. {cause}"]
+
+
+def invert(value):
+    return 1 / value if value else None
+
+
+def get_goals(results):
+    ratio = results.get_ratio
+
+    def compare(goal, subject, rows, bounds):
+        for row in rows:
+            for who, bound in bounds:
+                goal.at_least(f"{who} {row}", ratio(subject, row, who), bound)
+        return goal
+
+    embree, boost, from_100k = "Embree, first hit", "Boost R-tree", ("100k", "1M", "4M")
+    goals = [
+        compare(Goal("build", "Build at 100k and 1M: 1.3 x CGAL, 1.5 x Embree"), "build",
+                ("100k", "1M"), (("CGAL", 1.3), (embree, 1.5))),
+        compare(Goal("scanline", "Heights along scanlines from 100k: 3 x CGAL, 1.4 x Boost, level "
+                     "with Embree (0.95)"), "height/scanline", from_100k,
+                (("CGAL", 3.0), (boost, 1.4), (embree, 0.95))),
+        compare(compare(Goal("random", "Heights at random: 2 x CGAL, level with Boost at 100k "
+                             "(0.95)"), "height/random", from_100k, (("CGAL", 2.0),)),
+                "height/random", ("100k",), ((boost, 0.95),)),
+        compare(Goal("line-short", "Short segments: 1.25 x Boost"), "line/2%", from_100k,
+                ((boost, 1.25),)),
+        compare(Goal("line-long", "Long segments: 1.25 x Boost"), "line/50%", from_100k,
+                ((boost, 1.25),)),
+    ]
+    scan = Goal("scan", "Heights without an index: at most 1.5 x touching each cache line")
+    for row in results.get_rows("scan"):
+        scan.at_most(row, invert(ratio("scan", row, "touching each cache line")), 1.5)
+    goals += [
+        scan,
+        compare(Goal("weld", "Welding from 1M: 2 x meshoptimizer, 10 x the plain octree"), "weld",
+                ("1M", "4M"), (("meshoptimizer", 2.0), ("plain octree", 10.0))),
+    ]
+    rings = Goal("ring", "Rings of 4 and 5 / 10 / 50 / 500 corners: 10 / 7 / 5 / 1.3 x GEOS")
+    for corners, bound in (("4", 10), ("5", 10), ("10", 7), ("50", 5), ("500", 1.3)):
+        for shape in ("star", "wiggly"):
+            rings.at_least(f"{shape} {corners}", ratio("ring/" + shape, corners, "GEOS"), bound)
+    goals += [
+        rings,
+        compare(Goal("raster", "Raster at 100k: 5 x Embree's ray a cell, 1.8 x a plain row walk"),
+                "raster", ("100k",), (("Embree, a ray a cell", 5.0), ("plain row walk", 1.8))),
+    ]
+    load = Goal("load", "Loading: at most 1.3 x the bare OGR loop (FlatGeobuf), 1.2 x (GeoPackage, "
+                "Shapefile)")
+    for driver, bound in (("FlatGeobuf", 1.3), ("GPKG", 1.2), ("ESRI Shapefile", 1.2)):
+        for row in results.get_rows("load/" + driver):
+            load.at_most(f"{driver} {row}", invert(ratio("load/" + driver, row, "bare OGR loop")),
+                         bound)
+    return goals + [load, get_growth_goal(results)]
+
+
+def get_growth(results, subject, start, end, per_log):
+    first, last = results.get_time(subject, start), results.get_time(subject, end)
+    if not first or not last:
+        return None
+    logs = math.log(get_count(end)) / math.log(get_count(start)) if per_log else 1.0
+    return last / first / logs
+
+
+def get_growth_goal(results):
+    goal = Goal("growth", "Growth from 100k to 4M: a build as n log n (1.5 for caches), a height "
+                "along scanlines at most 1.5 x; no quadratic path")
+    goal.at_most("build by n log n", get_growth(results, "build", "100k", "4M", True), 1.5)
+    goal.at_most("height", get_growth(results, "height/scanline", "100k", "4M", False), 1.5)
+    for kind in ("same", "crowded"):
+        goal.at_most(f"build by n log n, {kind}",
+                     get_growth(results, "build", "100k-" + kind, "4M-" + kind, True), 1.5)
+    return goal
+
+
+def format_growth(results):
+    """Our time an item from size to size, beside the competitors'."""
+    rows = []
+    for title, subject, _, _ in SUBJECTS:
+        sizes = [s for s in ("10k", "100k", "1M", "4M") if results.get_time(subject, s)]
+        if len(sizes) < 2 or subject in ("scan", "raster", "line/2%", "line/50%"):
+            continue
+        for who in results.get_columns(subject):
+            times = [results.get_time(subject, s, who) for s in sizes]
+            if all(times):
+                rows.append([title, who] + [f"{t / times[0]:.2f}" for t in times])
+    if not rows:
+        return ""
+    sizes = ["10k", "100k", "1M", "4M"][:len(rows[0]) - 2]
+    return ("## Growth\n\nTime an item by that at 10k.\n\n"
+            + format_table(["Work", ""] + sizes, rows))
+
+
+def read_line(path, start):
+    with open(path, encoding="utf-8") as file:
+        for line in file:
+            if line.startswith(start):
+                return line.split("=" if "=" in line else ":", 1)[1].strip().strip('"')
+    return "?"
+
+
+def format_machine(results, rounds):
+    context = results.context
+    commit = subprocess.run(["git", "describe", "--always", "--dirty"], capture_output=True,
+                            text=True, check=False).stdout.strip()
+    memory = int(read_line("/proc/meminfo", "MemTotal").split()[0]) / 1048576
+    caches = ", ".join(f"L{c['level']} {c['size'] // 1024} KiB" for c in context["caches"]
+                       if c["type"] != "Instruction")
+    peers = [f"{name} {context[name]}" for name in
+             ("CGAL", "Embree", "Boost", "GEOS", "meshoptimizer", "GDAL") if name in context]
+    rows = [
+        ["Date", context["date"][:10]],
+        ["Machine", f"{read_line('/proc/cpuinfo', 'model name')}, {context['num_cpus']} cores, "
+                    f"{caches}, {memory:.0f} GiB of memory"],
+        ["System", f"{read_line('/etc/os-release', 'PRETTY_NAME')}, Linux {platform.release()}"],
+        ["Compiler", f"gcc {context['compiler']}, release preset, for any x86-64"],
+        ["Library", commit],
+        ["Others", ", ".join(peers)],
+        ["Run", f"{context['plan']}, {rounds} rounds, load average at the last "
+                f"{context['load_avg'][0]:.1f}"],
+    ]
+    spread = results.get_spread()
+    if spread:
+        rows.append(["Spread", f"the slowest round of a benchmark takes {spread:.2f} x the "
+                               "quickest (median)"])
+    return format_table(["", ""], rows)
+
+
+def main(paths):
+    results = Results(paths)
+    if results.failures:
+        sys.exit("Failed:\n" + "\n".join(sorted(set(results.failures))))
+    parts = [
+        "# Benchmarks",
+        "Made by `scripts/bench`, which installs the others from Debian, builds, runs everything "
+        "and writes this page. One thread, pinned to one core, processor time, median of the "
+        "rounds. In brackets stands the ratio: the other's time by ours, above 1 where ours is "
+        "the quicker. In each run every competitor's answers are compared with ours, and ours "
+        "with a scan of all triangles.",
+        format_machine(results, len(paths)),
+        "## Goals",
+        format_table(["Goal", "Found", "Verdict"], [g.format() for g in get_goals(results)]),
+    ]
+    parts += [format_subject(results, title, key, factor, unit, words)
+              for title, key, (factor, unit), words in SUBJECTS]
+    parts.append(format_growth(results))
+    print("\n\n".join(part for part in parts if part))
+
+
+if __name__ == "__main__":
+    main(sys.argv[1:])
