@@ -67,7 +67,7 @@ void WriteFile(const std::string& sTerrain, const Format& format, const std::str
 std::string GetFile(const std::string& sFolder, const std::string& sTerrain, const Format& format) {
     const std::filesystem::path folder = std::filesystem::path(sFolder) / sTerrain;
     const std::filesystem::path mark = folder / (format.pszEnding + std::string(".whole"));
-    const std::string file = (folder / ("terrain" + std::string(format.pszEnding))).string();
+    std::string file = (folder / ("terrain" + std::string(format.pszEnding))).string();
     if (!std::filesystem::exists(mark)) {
         std::filesystem::create_directories(folder);
         std::filesystem::remove(file);

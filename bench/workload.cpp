@@ -19,9 +19,10 @@ Positions MakePositions(const std::string& sTerrain, const std::string& sOrder) 
     const bool isRandom = sOrder == "random";
     Random random(3);
     Positions positions(std::size_t{RASTER} * RASTER);
-    for (std::size_t i = 0; i < positions.size(); ++i) {
+    for (unsigned i = 0; i < RASTER * RASTER; ++i) {
+        const unsigned row = i / RASTER;
         const float u = isRandom ? random.Unit() : (static_cast<float>(i % RASTER) + 0.5F) / RASTER;
-        const float v = isRandom ? random.Unit() : (static_cast<float>(i / RASTER) + 0.5F) / RASTER;
+        const float v = isRandom ? random.Unit() : (static_cast<float>(row) + 0.5F) / RASTER;
         positions[i] = {box.min.x + u * (box.max.x - box.min.x),
                         box.min.y + v * (box.max.y - box.min.y)};
     }
