@@ -2,7 +2,7 @@
 
 #include "services/reporting.h"
 #include "tin/detail/leafwalk.h"
-#include "tin/ray2.h"
+#include "tin/detail/segmentprobe.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -248,9 +248,9 @@ void AabbNode::FindLeaves(const Box& box, std::vector<unsigned>& list) const {
 
 template <typename P>
 void AabbNode::FindLeavesByLine(const P& a, const P& b, std::vector<unsigned>& out) const {
-    const Ray2<float> ray = detail::CreateSegmentRay(a, b);
+    const detail::SegmentProbe probe(a, b);
     detail::VisitLeaves(
-        this, [&](const Box& box) { return detail::TestSegment(box, ray); },
+        this, [&](const Box& box) { return probe.IsMet(box); },
         [&](const std::vector<unsigned>& leaves) {
             out.insert(out.end(), leaves.begin(), leaves.end());
         });

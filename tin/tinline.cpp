@@ -3,6 +3,7 @@
 #include "tin/aabbtree.h"
 #include "tin/detail/leafwalk.h"
 #include "tin/detail/parallelscan.h"
+#include "tin/detail/segmentprobe.h"
 #include "tin/ray2.h"
 
 #include <limits>
@@ -29,9 +30,9 @@ bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>
         return false;
     h = LOWEST;
     if (tree != nullptr) {
-        const Ray2<float> ray = detail::CreateSegmentRay(a, b);
+        const detail::SegmentProbe probe(a, b);
         const auto meets = [&](const BBox<float, point2_t<float>>& box) {
-            return detail::TestSegment(box, ray);
+            return probe.IsMet(box);
         };
         float highest = LOWEST;
         detail::VisitLeaves(tree->GetRoot(), meets, [&](const std::vector<unsigned>& leaves) {
