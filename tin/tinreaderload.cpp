@@ -29,16 +29,16 @@ class ScopedLock {
 
 /// The shape, or null if the store cannot deliver it. A store that throws has told why.
 const ZARShape* FindShape(ZARLayer_t* layer, int id) {
+    const ZARShape* shape = nullptr;
     try {
-        const ZARShape* shape = ZARGetShapeRef(layer, id);
-        if (shape == nullptr)
-            tellus::Warning::Warn(
-                FormatString("Shape# %d is ignored because the store has none.", id),
-                "tin/tinreader", __LINE__);
-        return shape;
+        shape = ZARGetShapeRef(layer, id);
     } catch (...) {
         return nullptr;
     }
+    if (shape == nullptr)
+        tellus::Warning::Warn(FormatString("Shape# %d is ignored because the store has none.", id),
+                              "tin/tinreader", __LINE__);
+    return shape;
 }
 
 } // namespace
