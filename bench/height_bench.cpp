@@ -59,13 +59,18 @@ void GetHeights(benchmark::State& rState, const std::string& sTerrain, const std
 } // namespace
 
 void AddHeight(const Plan& oPlan) {
+    const auto addAll = [](const std::string& sOrder, const std::string& sTerrain) {
+        ForEachPeer([&](auto tag) {
+            using Peer = typename decltype(tag)::Type;
+            Add({"height", sOrder, sTerrain, Index<Peer>::GetName()},
+                [=](benchmark::State& state) { GetHeights<Peer>(state, sTerrain, sOrder); });
+        });
+    };
     for (const std::string& terrain : oPlan.GetTerrains())
-        for (const std::string order : {"scanline", "random"})
-            ForEachPeer([&](auto tag) {
-                using Peer = typename decltype(tag)::Type;
-                Add({"height", order, terrain, Index<Peer>::GetName()},
-                    [=](benchmark::State& state) { GetHeights<Peer>(state, terrain, order); });
-            });
+        for (const char* order : {"scanline", "random"})
+            addAll(order, terrain);
+    for (const std::string& size : oPlan.GetSizes())
+        addAll("fine", size);
 }
 
 } // namespace kelm::bench

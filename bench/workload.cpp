@@ -13,19 +13,37 @@ namespace {
 
 constexpr unsigned RASTER = 1000;
 
+/// Cell of a raster of 1000 x 1000 over 224 x 224 cells of 10 m.
+constexpr float FINE = 2.24F;
+
+/// Positions of row-major cells over a box, from a row on and round again.
+Positions MakeRows(const point2_t<float>& low, const point2_t<float>& high, unsigned side,
+                   unsigned start) {
+    Positions positions(std::size_t{RASTER} * RASTER);
+    const auto at = [side](float from, float to, unsigned i) {
+        return from + (static_cast<float>(i) + 0.5F) / static_cast<float>(side) * (to - from);
+    };
+    for (unsigned i = 0; i < RASTER * RASTER; ++i) {
+        const unsigned row = (start + i / side) % side;
+        positions[i] = {at(low.x, high.x, i % side), at(low.y, high.y, row)};
+    }
+    return positions;
+}
+
 Positions MakePositions(const std::string& sTerrain, const std::string& sOrder) {
     const auto surface = GetSurface(sTerrain);
-    const auto& box = surface->GetBBox();
-    const bool isRandom = sOrder == "random";
+    const point2_t<float> low{surface->GetBBox().min.x, surface->GetBBox().min.y};
+    const point2_t<float> high{surface->GetBBox().max.x, surface->GetBBox().max.y};
+    if (sOrder == "scanline")
+        return MakeRows(low, high, RASTER, 0);
+    if (sOrder == "fine") {
+        const auto side = static_cast<unsigned>((high.x - low.x) / FINE);
+        return MakeRows(low, high, side, side / 2);
+    }
     Random random(3);
     Positions positions(std::size_t{RASTER} * RASTER);
-    for (unsigned i = 0; i < RASTER * RASTER; ++i) {
-        const unsigned row = i / RASTER;
-        const float u = isRandom ? random.Unit() : (static_cast<float>(i % RASTER) + 0.5F) / RASTER;
-        const float v = isRandom ? random.Unit() : (static_cast<float>(row) + 0.5F) / RASTER;
-        positions[i] = {box.min.x + u * (box.max.x - box.min.x),
-                        box.min.y + v * (box.max.y - box.min.y)};
-    }
+    for (point2_t<float>& p : positions)
+        p = {low.x + random.Unit() * (high.x - low.x), low.y + random.Unit() * (high.y - low.y)};
     return positions;
 }
 

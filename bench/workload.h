@@ -13,8 +13,9 @@ constexpr float NO_HEIGHT = -1e30F;
 
 using Positions = std::vector<point2_t<float>>;
 
-/// A million positions in the box of a terrain, surface-local; "scanline": row by row over a raster
-/// of 1000 x 1000, "random": anywhere.
+/// A million positions in the box of a terrain, surface-local. "scanline": row by row over a raster
+/// of 1000 x 1000. "fine": row by row too, as many to a triangle on any fractal terrain as the
+/// former has at 100k, from the middle row on and again from the first. "random": anywhere.
 std::shared_ptr<const Positions> GetPositions(const std::string& sTerrain,
                                               const std::string& sOrder);
 
