@@ -45,3 +45,17 @@ function(kelm_tin_enable_ipo target)
       INTERPROCEDURAL_OPTIMIZATION_RELWITHDEBINFO ON)
   endif()
 endfunction()
+
+# Links what no user of a library sees. An installed shared library would name an imported shared one
+# to its users, who would have to find it: so it is linked by its file.
+function(kelm_tin_link_hidden target dependency)
+  get_target_property(type ${target} TYPE)
+  get_target_property(dependency_type ${dependency} TYPE)
+  if(type STREQUAL "SHARED_LIBRARY" AND dependency_type STREQUAL "SHARED_LIBRARY")
+    target_include_directories(${target} SYSTEM PRIVATE
+      $<TARGET_PROPERTY:${dependency},INTERFACE_INCLUDE_DIRECTORIES>)
+    target_link_libraries(${target} PRIVATE $<TARGET_LINKER_FILE:${dependency}>)
+  else()
+    target_link_libraries(${target} PRIVATE ${dependency})
+  endif()
+endfunction()
