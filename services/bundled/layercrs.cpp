@@ -2,6 +2,7 @@
 
 #include "services/bundled/formats.h"
 #include "services/bundled/gdalcall.h"
+#include "services/bundled/undefinedcrs.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
@@ -14,20 +15,9 @@ namespace kelm::store {
 
 namespace {
 
-/// Srs ids -1 and 0 of a GeoPackage. Later versions of GDAL add words to the names, and files of
-/// other formats that were made from a GeoPackage carry them on, a Shapefile with underscores.
-bool IsUndefined(const OGRSpatialReference& oCrs) {
-    const char* pszName = oCrs.GetName();
-    for (const char* pszUndefined : {"Undefined Cartesian SRS", "Undefined geographic SRS",
-                                     "Undefined_Cartesian_SRS", "Undefined_geographic_SRS"})
-        if (pszName && STARTS_WITH_CI(pszName, pszUndefined))
-            return true;
-    return false;
-}
-
 std::string WriteText(const OGRSpatialReference& oCrs, const std::string& subject,
                       const GdalCall& oCall) {
-    if (oCrs.IsEmpty() || IsUndefined(oCrs))
+    if (oCrs.IsEmpty() || services::TestUndefinedCRS(oCrs.GetName()))
         return {};
     const char* const apszOptions[] = {"FORMAT=WKT2_2019", "MULTILINE=NO", nullptr};
     char* pszText = nullptr;

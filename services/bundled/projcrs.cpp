@@ -1,6 +1,7 @@
 #include "services/bundled/projcrs.h"
 
 #include "services/bundled/projsession.h"
+#include "services/bundled/undefinedcrs.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
@@ -17,17 +18,6 @@ constexpr const char* kSource = "services/bundled/projcrs";
 
 /// EGM96 height: its grid comes with PROJ's basic data everywhere.
 constexpr const char* kDefaultVerticalCode = "5773";
-
-/// Names under which GDAL hands out GeoPackage layers that state no CRS.
-constexpr const char* kUndefinedNames[] = {"Undefined geographic SRS", "Undefined Cartesian SRS",
-                                           "Undefined SRS"};
-
-bool TestUndefined(const char* pszName) {
-    for (const char* pszUndefined : kUndefinedNames)
-        if (std::strcmp(pszName, pszUndefined) == 0)
-            return true;
-    return false;
-}
 
 /// @return the type of a CRS, or of what a bound CRS binds; the type of null is unknown
 PJ_TYPE GetCoreType(ProjSession& oSession, const PJ* po) {
@@ -128,7 +118,7 @@ std::unique_ptr<ProjCRS> ReadCRS(const std::string& definition) {
     const char* pszName = proj_get_name(poCRS.get());
     if (eType == PJ_TYPE_PROJECTED_CRS || eType == PJ_TYPE_GEOGRAPHIC_2D_CRS ||
         eType == PJ_TYPE_GEOGRAPHIC_3D_CRS) {
-        if (!TestUndefined(pszName))
+        if (!services::TestUndefinedCRS(pszName))
             text = ReduceCRS(oSession, poCRS.get(), poHorizontal.get());
     } else if (eType == PJ_TYPE_ENGINEERING_CRS) {
         text.moName = pszName;
