@@ -1,6 +1,7 @@
 #include "tin/tinreader.h"
 
 #include "services/interpgrid3d.h"
+#include "services/reporting.h"
 #include "tin/detail/parallelblocks.h"
 
 #include <cstddef>
@@ -29,6 +30,12 @@ Values CreateTriples(unsigned count) {
 
 double ToMap(float local, double base) {
     return static_cast<double>(local) + base;
+}
+
+/// Do map coordinates look like degrees? One cell of the grid then spans the surface many times
+/// over, and what it gives between its nodes has little to do with the datum.
+bool LooksLikeDegrees(double xMin, double yMin, double xMax, double yMax) {
+    return xMin >= -360.0 && xMax <= 360.0 && yMin >= -90.0 && yMax <= 90.0;
 }
 
 /// Kept out of line: merged into a vectorised loop, g++ 12 has dropped the rounding.
@@ -105,6 +112,12 @@ void TinReader::BuildInterpGridForWindow(const aabb_t<point2_t<float>>* poWindow
                      static_cast<double>(fZMin), ToMap(poWindow->max.x, mdfXBase),
                      ToMap(poWindow->max.y, mdfYBase), static_cast<double>(fZMax), GRID_SPACING,
                      GRID_SPACING, static_cast<double>(fZSpacing));
+    if (LooksLikeDegrees(ToMap(poWindow->min.x, mdfXBase), ToMap(poWindow->min.y, mdfYBase),
+                         ToMap(poWindow->max.x, mdfXBase), ToMap(poWindow->max.y, mdfYBase)))
+        tellus::Warning::Warn("Heights are interpolated between positions 100 map units apart, and "
+                              "the coordinates look like degrees: use a projected layer to change "
+                              "the vertical datum of a large surface.",
+                              "tin/tinreader", __LINE__);
     const unsigned n = oGrid.GetNumGridPoints();
     Values positions = CreateTriples(n);
     oGrid.GetGridPositions(positions.get());
