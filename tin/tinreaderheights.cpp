@@ -55,7 +55,7 @@ bool TinReader::HeightConvert(const aabb_t<point2_t<float>>* poWindow, point3_t<
 bool TinReader::HeightConvertSimple(const aabb_t<point2_t<float>>*, point3_t<float>* poPoints,
                                     unsigned int nCount) const {
     detail::ParallelBlocks(nCount, detail::GetTeamAbove(PARALLEL_ABOVE, nCount),
-                           [=](unsigned, unsigned first, unsigned last) {
+                           [this, poPoints](unsigned, unsigned first, unsigned last) {
                                for (unsigned i = first; i < last; ++i)
                                    poPoints[i].z = static_cast<float>(GetElevation(poPoints[i].z));
                            });

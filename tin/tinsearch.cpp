@@ -53,7 +53,7 @@ bool Tin::GetHeight(const double& x, const double& y, float& height, const AabbT
 void Tin::FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,
                                const AabbTree* tree) const {
     const detail::PointProbe probe(x, y);
-    const auto holds = [=](unsigned id) {
+    const auto holds = [this, probe, x, y](unsigned id) {
         return probe.IsIn(mpoTriangles[id].GetBBox()) && mpoTriangles[id].IsPointInsideLT(x, y);
     };
     if (tree == nullptr) {
