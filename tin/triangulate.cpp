@@ -16,10 +16,18 @@ struct Coordinates {
     std::vector<double> y;
 };
 
-/// Is a point of first .. last-1 inside the triangle P, Q, R? Edges and corners are inside, without
-/// tolerance. Points are taken in blocks without a branch.
-bool TestAnyInside(const Point& p, const Point& q, const Point& r, const Coordinates& points,
-                   std::size_t first, std::size_t last) {
+/// Is the point inside the triangle P, Q, R? Edges and corners are inside, without tolerance.
+inline bool IsInside(const Point& p, const Point& q, const Point& r, double x, double y) {
+    const double pq = (q.x - p.x) * (y - p.y) - (x - p.x) * (q.y - p.y);
+    const double qr = (r.x - q.x) * (y - q.y) - (x - q.x) * (r.y - q.y);
+    const double rp = (p.x - r.x) * (y - r.y) - (x - r.x) * (p.y - r.y);
+    return !(pq < 0.0) & !(qr < 0.0) & !(rp < 0.0);
+}
+
+/// @return position of the first point of first .. last-1 inside the triangle P, Q, R; last if
+/// there is none. Points are taken in blocks without a branch.
+std::size_t FindInside(const Point& p, const Point& q, const Point& r, const Coordinates& points,
+                       std::size_t first, std::size_t last) {
     constexpr std::size_t BLOCK = 64;
     const double* const x = points.x.data();
     const double* const y = points.y.data();
@@ -27,66 +35,96 @@ bool TestAnyInside(const Point& p, const Point& q, const Point& r, const Coordin
         const std::size_t end = std::min(last, first + BLOCK);
         double inside = 0.0; // counted in double, for want of integer lanes of its width
 #pragma omp simd reduction(+ : inside)
-        for (std::size_t i = first; i < end; ++i) {
-            const double pq = (q.x - p.x) * (y[i] - p.y) - (x[i] - p.x) * (q.y - p.y);
-            const double qr = (r.x - q.x) * (y[i] - q.y) - (x[i] - q.x) * (r.y - q.y);
-            const double rp = (p.x - r.x) * (y[i] - r.y) - (x[i] - r.x) * (p.y - r.y);
-            inside += !(pq < 0.0) & !(qr < 0.0) & !(rp < 0.0) ? 1.0 : 0.0;
-        }
+        for (std::size_t i = first; i < end; ++i)
+            inside += IsInside(p, q, r, x[i], y[i]) ? 1.0 : 0.0;
         if (inside != 0.0)
-            return true;
+            break;
         first = end;
     }
-    return false;
+    while (first < last && !IsInside(p, q, r, x[first], y[first]))
+        ++first;
+    return first;
 }
 
 /// The corners that are left to clip, counter-clockwise.
 class Ring {
   public:
-    explicit Ring(const kelm::tin::Polygon<double>& oPolygon) {
-        const unsigned n = oPolygon.GetPointCount();
-        const bool counterClockwise = oPolygon.GetSignedArea() > 0.0;
-        moCorners.resize(n);
-        moAt.x.resize(n);
-        moAt.y.resize(n);
-        for (unsigned i = 0; i < n; ++i) {
-            moCorners[i] = counterClockwise ? i : n - 1 - i;
-            moAt.x[i] = oPolygon.GetPoints()[moCorners[i]].x;
-            moAt.y[i] = oPolygon.GetPoints()[moCorners[i]].y;
+    explicit Ring(const kelm::tin::Polygon<double>& oPolygon)
+        : mnPoints(oPolygon.GetPointCount()), mbForward(oPolygon.GetSignedArea() > 0.0),
+          moRanks(mnPoints), moAt{std::vector<double>(mnPoints), std::vector<double>(mnPoints)},
+          moBlockers(mnPoints, NONE) {
+        for (unsigned i = 0; i < mnPoints; ++i) {
+            moRanks[i] = i;
+            moAt.x[i] = oPolygon.GetPoints()[GetCorner(i)].x;
+            moAt.y[i] = oPolygon.GetPoints()[GetCorner(i)].y;
         }
     }
 
-    std::size_t GetSize() const { return moCorners.size(); }
-    unsigned GetCorner(std::size_t position) const { return moCorners[position]; }
+    std::size_t GetSize() const { return moRanks.size(); }
+    unsigned GetCorner(std::size_t position) const {
+        return mbForward ? moRanks[position] : mnPoints - 1 - moRanks[position];
+    }
 
     void Remove(std::size_t position) {
+        const std::size_t n = GetSize();
+        moBlockers[moRanks[position == 0 ? n - 1 : position - 1]] = NONE;
+        moBlockers[moRanks[position + 1 == n ? 0 : position + 1]] = NONE;
         const auto at = static_cast<std::ptrdiff_t>(position);
-        moCorners.erase(moCorners.begin() + at);
+        moRanks.erase(moRanks.begin() + at);
         moAt.x.erase(moAt.x.begin() + at);
         moAt.y.erase(moAt.y.begin() + at);
     }
 
     /// Is the corner at v one that can be cut off between its neighbours at u and w? Another corner
     /// in the triangle forbids it, also one at the place of u, v or w: the test goes by position.
-    bool IsEar(std::size_t u, std::size_t v, std::size_t w) const {
+    ///
+    /// As long as the three are neighbours, corners only go. So one that was found inside forbids
+    /// the ear until it goes itself, and those passed over on the way to it need no second look.
+    /// That keeps the whole cutting quadratic in the corners.
+    bool IsEar(std::size_t u, std::size_t v, std::size_t w) {
         const Point p = At(u);
         const Point q = At(v);
         const Point r = At(w);
         if (LEAST_TURN > (q.x - p.x) * (r.y - p.y) - (q.y - p.y) * (r.x - p.x))
             return false;
-        // The three are neighbours, so the others stand in one run of the ring, or in two of the
-        // list.
-        if (u < w)
-            return !TestAnyInside(p, q, r, moAt, w + 1, GetSize()) &&
-                   !TestAnyInside(p, q, r, moAt, 0, u);
-        return !TestAnyInside(p, q, r, moAt, w + 1, u);
+        unsigned& blocker = moBlockers[moRanks[v]];
+        std::size_t at = w + 1;
+        if (blocker != NONE) {
+            at = static_cast<std::size_t>(
+                std::lower_bound(moRanks.begin(), moRanks.end(), blocker) - moRanks.begin());
+            if (at < GetSize() && moRanks[at] == blocker)
+                return false;
+        }
+        at = FindBlocker(p, q, r, at, u);
+        if (at == u)
+            return true;
+        blocker = moRanks[at];
+        return false;
     }
 
   private:
+    static constexpr unsigned NONE = 0xFFFFFFFFU;
+
     Point At(std::size_t position) const { return {moAt.x[position], moAt.y[position]}; }
 
-    std::vector<unsigned> moCorners;
-    Coordinates moAt; ///< of the corners, in the same order
+    /// @return position of the first corner inside the triangle, in ring order from one position
+    /// up to u; u if there is none
+    std::size_t FindBlocker(const Point& p, const Point& q, const Point& r, std::size_t from,
+                            std::size_t u) const {
+        if (from > u) {
+            const std::size_t at = FindInside(p, q, r, moAt, from, GetSize());
+            if (at != GetSize())
+                return at;
+            from = 0;
+        }
+        return FindInside(p, q, r, moAt, from, u);
+    }
+
+    unsigned mnPoints;
+    bool mbForward;
+    std::vector<unsigned> moRanks;    ///< places in the whole ring, ascending
+    Coordinates moAt;                 ///< of the corners, in the same order
+    std::vector<unsigned> moBlockers; ///< by rank of the tip: rank of a corner inside its ear
 };
 
 } // namespace
