@@ -145,7 +145,8 @@ void TinReader::SetElFactor(const double dfOffset, const double dfScale) {
 void TinReader::SetOutputVerticalDatum(DatumType eType) {
     TestDatum(meSourceDatum, eType);
     const bool unknown = meSourceDatum == VD_Other && eType == VD_Other;
-    if (unknown || mpoOutput3DCRS == nullptr || eType != meOutputDatum) {
+    // A reader on null has no CRS, and no heights to convert.
+    if (mpoCRS != nullptr && (unknown || mpoOutput3DCRS == nullptr || eType != meOutputDatum)) {
         // Both are made before the old ones go, so that a failure changes nothing.
         std::unique_ptr<ICRS> compound(CreateCompound(*mpoCRS, eType));
         ogc::ct::IMathTransform* transform =

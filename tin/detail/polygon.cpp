@@ -176,7 +176,9 @@ bool Polygon<T>::IsIntersected(const BBox<T, point2_t<T>>& oWindow) const {
 template class Polygon<double>;
 
 std::vector<unsigned> detail::FindRingVertices(const ZARShape& oShape) {
-    std::vector<unsigned> kept{0U};
+    std::vector<unsigned> kept;
+    kept.reserve(static_cast<std::size_t>(oShape.vertexCount));
+    kept.push_back(0U);
     for (unsigned i = 1; i + 1 < static_cast<unsigned>(oShape.vertexCount); ++i)
         if (!IsRepeat(oShape.vertices[i], oShape.vertices[i - 1]))
             kept.push_back(i);
