@@ -39,7 +39,7 @@ struct Proj {
     /// @return WKT 2 of anything that PROJ knows by a short name
     std::string GetWkt(const char* pszName) const {
         PJ* po = proj_create(mpo, pszName);
-        const std::string text = proj_as_wkt(mpo, po, PJ_WKT2_2019, nullptr);
+        std::string text = proj_as_wkt(mpo, po, PJ_WKT2_2019, nullptr);
         proj_destroy(po);
         return text;
     }
