@@ -1,0 +1,48 @@
+#pragma once
+
+#include <tin/tin.h>
+#include <tin/tinreader.h>
+#include <tin/tinreaderfactory.h>
+
+#include <CLI/CLI.hpp>
+#include <ogrsf_frmts.h>
+
+#include <memory>
+#include <stdexcept>
+#include <string>
+
+/// A layer of a file, as the command line names it.
+struct Layer {
+    std::string file;
+    int number = 0; ///< from 1 on, below 1 for the first
+};
+
+inline void AddLayerOptions(CLI::App& app, Layer& layer) {
+    app.add_option("file", layer.file, "File with a layer of polygons")
+        ->required()
+        ->check(CLI::ExistingPath);
+    app.add_option("--layer", layer.number, "Number of the layer from 1 on; else the first");
+}
+
+/// Loads the whole layer, its heights as they stand.
+inline std::unique_ptr<kelm::tin::Tin> LoadTerrain(const Layer& layer) {
+    const std::unique_ptr<kelm::tin::TinReader> reader(kelm::tin::TinReaderFactory::CreateTinReader(
+        layer.file.c_str(), layer.number, 0.0, 1.0, kelm::ogc::cs::VD_Other));
+    std::unique_ptr<kelm::tin::Tin> terrain(reader->Load(nullptr));
+    if (!terrain)
+        throw std::runtime_error("no polygon of the layer gave a triangle");
+    return terrain;
+}
+
+/// The CRS of a layer, asked of GDAL: a reader has one, but it is made for computing, not for
+/// showing or writing it. @return an empty CRS if the layer has none
+inline OGRSpatialReference ReadCrs(const Layer& layer) {
+    GDALAllRegister();
+    const GDALDatasetUniquePtr file(GDALDataset::Open(layer.file.c_str(), GDAL_OF_VECTOR));
+    int rest = layer.number;
+    if (file)
+        for (OGRLayer* each : file->GetLayers())
+            if (each->GetGeomType() != wkbNone && --rest < 1)
+                return each->GetSpatialRef() ? *each->GetSpatialRef() : OGRSpatialReference();
+    return OGRSpatialReference();
+}

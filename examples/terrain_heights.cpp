@@ -1,0 +1,151 @@
+// Opens a terrain, tells what is known of it before and after the load, and answers positions:
+//
+//     terrain_heights terrain.gpkg --source orthometric --output ellipsoidal --at 745000,4052000
+//     terrain_heights terrain.gpkg --stdin < positions.csv > heights.txt
+//
+// Answers go to standard output, one line a position; all else goes to standard error.
+
+#include "command.h"
+#include "terrain.h"
+
+#include <tin/aabbtree.h>
+
+#include <sys/resource.h>
+
+#include <chrono>
+#include <future>
+#include <optional>
+
+using namespace kelm::ogc::cs;
+using namespace kelm::tin;
+
+namespace {
+
+struct Options {
+    DatumType source = VD_Other;
+    std::optional<DatumType> output; ///< if not the source's
+    double offset = 0.0;
+    double scale = 1.0;
+    std::vector<double> window;
+    std::vector<double> positions; ///< x and y in turn
+    bool readStdin = false;
+};
+
+void DefineOptions(CLI::App& app, Options& options) {
+    const CLI::CheckedTransformer datums(std::map<std::string, DatumType>{
+        {"other", VD_Other}, {"orthometric", VD_Orthometric}, {"ellipsoidal", VD_Ellipsoidal}});
+    app.add_option("--source", options.source, "Vertical datum of the stored heights")
+        ->transform(datums);
+    app.add_option("--output", options.output, "Vertical datum of the answers; else as --source")
+        ->transform(datums);
+    app.add_option("--offset", options.offset, "A stored height h counts as (h + offset) * scale");
+    app.add_option("--scale", options.scale, "See --offset");
+    app.add_option("--window", options.window, "xmin,ymin,xmax,ymax: load what meets this box")
+        ->delimiter(',')
+        ->expected(4);
+    app.add_option("--at", options.positions, "x,y in map coordinates; can be repeated")
+        ->delimiter(',');
+    app.add_flag("--stdin", options.readStdin, "Read positions from a CSV with columns x and y");
+}
+
+/// For byte counts and printf, which has no format for std::uint64_t.
+using Bytes = unsigned long long;
+
+/// The most memory that the process has held so far.
+Bytes GetPeakBytes() {
+    rusage usage{};
+    getrusage(RUSAGE_SELF, &usage);
+    return static_cast<Bytes>(usage.ru_maxrss) * 1024;
+}
+
+void PrintLayer(const TinReader& reader, const OGRSpatialReference& crs) {
+    const BBox<double, point3_t<double>>& box = reader.GetBBox();
+    const auto shapes = static_cast<unsigned>(reader.GetShapeCount());
+    std::fprintf(stderr, "%u shapes, CRS %s\n", shapes, crs.IsEmpty() ? "none" : crs.GetName());
+    std::fprintf(stderr, "x %.3f to %.3f, y %.3f to %.3f, area %.0f, heights %.3f to %.3f\n",
+                 box.min.x, box.max.x, box.min.y, box.max.y, reader.GetArea(), box.min.z,
+                 box.max.z);
+    std::fprintf(stderr, "expected bytes: load %zu, surface %zu, tree %llu\n",
+                 reader.EstimateLoadBytes(), reader.EstimateObjBytes_Tin(),
+                 Bytes{EstimateAabbTreeBytes(shapes)});
+}
+
+/// Loads on another thread, so that this one can tell how long it has been at work.
+std::unique_ptr<Tin> Load(TinReader& reader, const std::vector<double>& sides) {
+    BBox<double, point2_t<double>> window;
+    if (!sides.empty()) {
+        window.min = {sides[0], sides[1]};
+        window.max = {sides[2], sides[3]};
+    }
+    auto load = std::async(std::launch::async,
+                           [&] { return reader.Load(sides.empty() ? nullptr : &window); });
+    int seconds = 0;
+    while (load.wait_for(std::chrono::seconds(1)) != std::future_status::ready)
+        std::fprintf(stderr, "\rloading for %d s", ++seconds);
+    std::fputs(seconds > 0 ? "\n" : "", stderr);
+    std::unique_ptr<Tin> surface(load.get());
+    if (!surface)
+        throw std::runtime_error("no polygon of the layer or the window gave a triangle");
+    return surface;
+}
+
+void PrintHeight(const Tin& surface, const AabbTree& tree, double x, double y) {
+    float height;
+    if (surface.GetHeight(x, y, height, &tree))
+        std::printf("%.3f\n", static_cast<double>(height));
+    else
+        std::puts("off the surface");
+}
+
+/// @throw std::runtime_error for a text that is no number
+double GetNumber(const OGRFeature& row, const char* column) {
+    const char* text = row.GetFieldAsString(column);
+    if (CPLGetValueType(text) == CPL_VALUE_STRING)
+        throw std::runtime_error("standard input, position " + std::to_string(row.GetFID()) + ": " +
+                                 column + " is no number: \"" + text + "\"");
+    return CPLAtof(text);
+}
+
+void PrintHeightsOfStdin(const Tin& surface, const AabbTree& tree) {
+    const GDALDatasetUniquePtr csv(GDALDataset::Open("CSV:/vsistdin/", GDAL_OF_VECTOR));
+    OGRLayer* layer = csv ? csv->GetLayer(0) : nullptr;
+    if (!layer || layer->GetLayerDefn()->GetFieldIndex("x") < 0 ||
+        layer->GetLayerDefn()->GetFieldIndex("y") < 0)
+        throw std::runtime_error("standard input is no CSV with the columns x and y");
+    for (const OGRFeatureUniquePtr& row : *layer)
+        PrintHeight(surface, tree, GetNumber(*row, "x"), GetNumber(*row, "y"));
+}
+
+void Run(const Layer& layer, const Options& options) {
+    if (options.positions.size() % 2 != 0)
+        throw CLI::ValidationError("--at", "a position is a pair x,y");
+    const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
+        layer.file.c_str(), layer.number, options.offset, options.scale, options.source));
+    reader->SetOutputVerticalDatum(options.output.value_or(options.source));
+    PrintLayer(*reader, ReadCrs(layer));
+
+    const Bytes before = GetPeakBytes();
+    const std::unique_ptr<Tin> surface = Load(*reader, options.window);
+    const Bytes load = GetPeakBytes() - before;
+    const AabbTree tree(surface.get());
+    std::fprintf(stderr, "%u vertices, %u triangles\n", surface->GetVertexCount(),
+                 surface->GetTriangleCount());
+    std::fprintf(stderr, "measured bytes: load %llu, surface %llu, tree %llu\n", load,
+                 Bytes{surface->GetObjBytes()}, Bytes{tree.GetObjBytes()});
+
+    for (std::size_t i = 0; i < options.positions.size(); i += 2)
+        PrintHeight(*surface, tree, options.positions[i], options.positions[i + 1]);
+    if (options.readStdin)
+        PrintHeightsOfStdin(*surface, tree);
+}
+
+} // namespace
+
+int main(int argc, char** argv) {
+    Layer layer;
+    Options options;
+    CLI::App app("Heights of a terrain at map positions.", "terrain_heights");
+    AddLayerOptions(app, layer);
+    DefineOptions(app, options);
+    return RunCommand(app, argc, argv, [&] { Run(layer, options); });
+}
