@@ -84,6 +84,8 @@ Tin* Tin::SubsetByRegion(const BBox<double, point2_t<double>>& region, const Aab
 
 Tin* Tin::SubsetByLineString(const point2_t<float>* points, unsigned count,
                              const AabbTree* tree) const {
+    if (points == nullptr)
+        return nullptr;
     std::vector<unsigned> all;
     std::vector<unsigned> part;
     for (unsigned i = 1; i < count; ++i) {
@@ -99,6 +101,8 @@ Tin* Tin::SubsetByLineString(const point2_t<float>* points, unsigned count,
 
 Tin* Tin::SubsetByLineString(const point2_t<double>* points, unsigned count,
                              const AabbTree* tree) const {
+    if (points == nullptr)
+        return nullptr;
     std::vector<point2_t<float>> local(count);
     for (unsigned i = 0; i < count; ++i)
         local[i] = {static_cast<float>(points[i].x - mdfXBase),

@@ -55,7 +55,7 @@ bool IsIntersectedSegment(const float& ax, const float& ay, const float& bx, con
 Triangle::Triangle() : vertices{nullptr, nullptr, nullptr} {}
 
 Triangle::Triangle(point3_t<float>** list) : Triangle() {
-    SetVertices(list[0], list[1], list[2]);
+    SetVertices(list);
 }
 
 void Triangle::SetVertices(point3_t<float>* const a, point3_t<float>* const b,
@@ -69,6 +69,8 @@ void Triangle::SetVertices(point3_t<float>* const a, point3_t<float>* const b,
 }
 
 void Triangle::SetVertices(point3_t<float>* const* const list) {
+    if (list == nullptr)
+        SetVertices(nullptr, nullptr, nullptr);
     SetVertices(list[0], list[1], list[2]);
 }
 

@@ -30,7 +30,7 @@ class KELM_TIN_EXPORT Triangle {
   public:
     /// No vertices; the box is the point at the origin.
     Triangle();
-    /// Sets the vertices from a list of three. @throw kelm::DataException if one is null
+    /// Sets the vertices from a list of three. @throw kelm::DataException if it or one is null
     explicit Triangle(point3_t<float>** list);
     /// The copy shares the vertices.
     Triangle(const Triangle&) = default;
