@@ -1,0 +1,88 @@
+// The bytes of a file, in memory, through the store and the reader: a surface, null or a documented
+// exception. The first byte chooses the format.
+
+#include "fuzz/bytes.h"
+#include "services/bundled/datasetfile.h"
+#include "services/exception.h"
+#include "services/vectorlayer.h"
+#include "tin/tinreader.h"
+
+#include <cpl_vsi.h>
+
+#include <memory>
+#include <string>
+
+namespace {
+
+constexpr const char* FOLDER = "/vsimem/fuzz";
+
+void Write(const std::string& name, const std::uint8_t* data, std::size_t size) {
+    auto* bytes = const_cast<GByte*>(data);
+    if (VSILFILE* file = VSIFileFromMemBuffer(name.c_str(), bytes, size, FALSE))
+        VSIFCloseL(file);
+}
+
+/// Formats of several files: each is an id of one byte, a length of two, and its bytes.
+template <typename Name>
+void WriteParts(fuzz::Bytes& rBytes, const Name& getName) {
+    while (!rBytes.IsEmpty()) {
+        const unsigned id = rBytes.Take<std::uint8_t>();
+        const std::size_t length = rBytes.Take<std::uint16_t>();
+        const std::uint8_t* from = nullptr;
+        const std::size_t taken = rBytes.Skip(length, from);
+        Write(getName(id), from, taken);
+    }
+}
+
+/// @return the name to open
+std::string WriteFile(fuzz::Bytes& rBytes) {
+    static const char* const ENDINGS[] = {"gpkg", "fgb",    "geojson", "gml",
+                                          "dxf",  "sqlite", "shp",     "gdb"};
+    static const char* const SHAPE_PARTS[] = {".shp", ".shx", ".dbf", ".prj"};
+    const unsigned format = rBytes.TakeFrom(0, 7);
+    const std::string name = std::string(FOLDER) + "/input." + ENDINGS[format];
+    if (format == 6)
+        WriteParts(rBytes, [](unsigned id) {
+            return std::string(FOLDER) + "/input" + SHAPE_PARTS[id % 4];
+        });
+    else if (format == 7)
+        WriteParts(rBytes, [&](unsigned id) {
+            const std::string number = std::to_string(id / 4 % 10);
+            const char* const endings[] = {".gdbtable", ".gdbtablx", ".gdbindexes", ".spx"};
+            return name + "/a0000000" + number + endings[id % 4];
+        });
+    else
+        Write(name, rBytes.GetNext(), rBytes.GetSize());
+    return name;
+}
+
+void Load(const std::string& name) {
+    using namespace kelm;
+    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(store::OpenDataset(name, "input").release(),
+                                                      &ZARClose);
+    ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
+    if (layer == nullptr || ZARGetLayerType(layer, 0) == 0)
+        return;
+    tin::TinReader reader(layer, 0.0, 2.0, ogc::cs::VD_Ellipsoidal);
+    static_cast<void>(file.release());
+    tin::BBox<double, point2_t<double>> window;
+    window.max = {10.0, 10.0};
+    for (const auto* wanted : {static_cast<decltype(&window)>(nullptr), &window}) {
+        const std::unique_ptr<tin::Tin> surface(reader.Load(wanted));
+        fuzz::Require(!surface || surface->GetTriangleCount() > 0);
+    }
+}
+
+} // namespace
+
+extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
+    fuzz::Bytes bytes(data, size);
+    const std::string name = WriteFile(bytes);
+    try {
+        Load(name);
+    } catch (const kelm::Exception& e) {
+        fuzz::Require(e.what()[0] != '\0');
+    }
+    VSIRmdirRecursive(FOLDER);
+    return 0;
+}
