@@ -1,0 +1,23 @@
+#include "tests/support/allocationcounter.h"
+
+#include <cstdlib>
+
+using kelm::tin::tests::AllocationCounter;
+
+// The array forms of the standard library call these.
+void* operator new(std::size_t size) {
+    const bool counts = AllocationCounter::mbCounts;
+    const bool fails = counts && ++AllocationCounter::mnRequests == AllocationCounter::mnFailAt;
+    void* block = fails ? nullptr : std::malloc(size);
+    if (block == nullptr)
+        throw std::bad_alloc();
+    AllocationCounter::mnBalance += counts;
+    return block;
+}
+void operator delete(void* block) noexcept {
+    AllocationCounter::mnBalance -= AllocationCounter::mbCounts && block != nullptr;
+    std::free(block);
+}
+void operator delete(void* block, std::size_t) noexcept {
+    operator delete(block);
+}
