@@ -106,7 +106,8 @@ class KELM_TIN_EXPORT Tin {
     /// deletes it. It shares nothing with this one.
     /// @param tree null: triangles of which an edge meets the region, in ascending order. An index
     /// of this surface: every triangle of each leaf whose box meets the region, in tree order
-    /// @return null if there is none, or if a bound is NaN @throw std::bad_alloc
+    /// @return null if there is none. A NaN bound leaves its side open without an index
+    /// and meets no box of one @throw std::bad_alloc
     Tin* SubsetByRegion(const BBox<float, point2_t<float>>& region, const AabbTree* tree) const;
     Tin* SubsetByRegion(const BBox<double, point2_t<double>>& region, const AabbTree* tree) const;
     /// The same for the triangles that the segments between consecutive points touch in plan, in

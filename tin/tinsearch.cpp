@@ -5,7 +5,6 @@
 #include "tin/detail/parallelscan.h"
 #include "tin/detail/pointprobe.h"
 
-#include <cmath>
 #include <limits>
 
 namespace kelm::tin {
@@ -71,10 +70,6 @@ void Tin::FindTrianglesByPoint(const float& x, const float& y, std::vector<unsig
 
 void Tin::FindTrianglesByRegion(const BBox<float, point2_t<float>>& region,
                                 std::vector<unsigned>& result, const AabbTree* tree) const {
-    // The test of an edge would take a NaN for a side that is open.
-    for (const float bound : {region.min.x, region.min.y, region.max.x, region.max.y})
-        if (std::isnan(bound))
-            return;
     if (tree != nullptr)
         tree->FindLeaves(region, result);
     else
