@@ -17,13 +17,16 @@ void Print(const char* what, const Tin& surface, float x, float y) {
 } // namespace
 
 int main() {
-    auto* vertices = new point3_t<float>[9] {
-        {0, 0, 10}, {10, 0, 10}, {10, 10, 10}, {0, 10, 10}, // a square of two triangles
-            {10, 0, 40}, {10, 10, 40},                      // a wall upon its eastern side
-            {4, 0, 25}, {8, 0, 25}, {
-            8, 4, 25
-        }
-    }; // a sheet above it
+    auto* vertices = new point3_t<float>[9];
+    vertices[0] = {0.0f, 0.0f, 10.0f}; // a square of two triangles
+    vertices[1] = {10.0f, 0.0f, 10.0f};
+    vertices[2] = {10.0f, 10.0f, 10.0f};
+    vertices[3] = {0.0f, 10.0f, 10.0f};
+    vertices[4] = {10.0f, 0.0f, 40.0f}; // a wall upon its eastern side
+    vertices[5] = {10.0f, 10.0f, 40.0f};
+    vertices[6] = {4.0f, 0.0f, 25.0f}; // a sheet above it
+    vertices[7] = {8.0f, 0.0f, 25.0f};
+    vertices[8] = {8.0f, 4.0f, 25.0f};
     auto* ids = new Triangle_Id[5]{{0, 1, 2}, {0, 2, 3}, {1, 2, 5}, {1, 5, 4}, {6, 7, 8}};
     const Tin surface(vertices, 9, ids, 5, 0.0, 0.0);
     Print("on the inner edge", surface, 2.0f, 2.0f);

@@ -22,12 +22,16 @@ void Print(const char* what, bool found, float height) {
 
 int main() {
     // Two triangles that meet nowhere, and a roof at 50 m above the second one.
-    auto* vertices = new point3_t<float>[9] {
-        {0, 0, 10}, {100, 0, 20}, {0, 100, 30}, {300, 0, 10}, {400, 0, 10}, {300, 100, 10},
-            {300, 0, 50}, {400, 0, 50}, {
-            300, 100, 50
-        }
-    };
+    auto* vertices = new point3_t<float>[9];
+    vertices[0] = {0.0f, 0.0f, 10.0f};
+    vertices[1] = {100.0f, 0.0f, 20.0f};
+    vertices[2] = {0.0f, 100.0f, 30.0f};
+    vertices[3] = {300.0f, 0.0f, 10.0f};
+    vertices[4] = {400.0f, 0.0f, 10.0f};
+    vertices[5] = {300.0f, 100.0f, 10.0f};
+    vertices[6] = {300.0f, 0.0f, 50.0f};
+    vertices[7] = {400.0f, 0.0f, 50.0f};
+    vertices[8] = {300.0f, 100.0f, 50.0f};
     auto* ids = new Triangle_Id[3]{{0, 1, 2}, {3, 4, 5}, {6, 7, 8}};
     const Tin surface(vertices, 9, ids, 3, 500000.0, 4650000.0);
     const AabbTree tree(&surface);
