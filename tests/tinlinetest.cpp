@@ -3,7 +3,7 @@
 
 #include <array>
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 namespace {
 
@@ -94,4 +94,4 @@ TEST(TinLine, TheHighestCrossingInBothFrames) {
     }
 }
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test

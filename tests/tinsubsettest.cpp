@@ -3,7 +3,7 @@
 
 #include <map>
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 namespace {
 
@@ -24,7 +24,8 @@ void ExpectSubset(const Mesh& mesh, const Indices& list, const Tin* poSubset) {
     unsigned next = 0;
     for (auto& [id, copy] : copies) {
         copy = subset->GetVertex(next++);
-        ASSERT_EQ(std::memcmp(copy, &mesh.vertices[id], sizeof(Point)), 0);
+        const auto& [x, y, z] = mesh.vertices[id]; // z may be NaN
+        ASSERT_TRUE(copy->x == x && copy->y == y && !(copy->z < z || copy->z > z));
     }
     for (next = 0; next < list.size(); ++next) {
         const Triangle_Id& id = mesh.ids[list[next]];
@@ -96,10 +97,12 @@ TEST(TinSubset, OfRegionsAndLineStringsInBothFrames) {
 }
 
 TEST(TinSubset, AFailedAllocationLeavesNothingBehind) {
+    if (!AllocationCounter::IS_ACTIVE)
+        GTEST_SKIP();
     Random random;
     const OpenTin tin = MakeSheet(6, 3, random).MakeTin();
     const point2_t<double> points[] = {{1, 1}, {50, 20}, {9, 50}};
     EXPECT_GT(FailEachRequest([&] { delete tin.SubsetByLineString(points, 3, nullptr); }), 10);
 }
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test

@@ -1,7 +1,7 @@
 #include "services/exception.h"
 #include "tests/support/sheets.h"
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 // Leaks and double releases show under the address sanitizer.
 
@@ -73,4 +73,4 @@ TEST(Tin, CopiesShowTheSameArraysAndReleaseNothing) {
     EXPECT_EQ(first.GetTriangle(0), second.GetTriangle(0));
 }
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test

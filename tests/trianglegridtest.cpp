@@ -3,7 +3,7 @@
 
 #include <cmath>
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 namespace {
 
@@ -26,10 +26,10 @@ struct GridTriangle : Triangle {
     }
     /// By integers, for corners in quarters: is the cell inside, edges included?
     bool TestCell(int col, int row) const {
-        long x[3], y[3];
+        int x[3], y[3];
         for (unsigned i = 0; i < 3; ++i) {
-            x[i] = std::lround(4 * corners[i].x) - 4 * col;
-            y[i] = std::lround(4 * corners[i].y) - 4 * row;
+            x[i] = static_cast<int>(4 * corners[i].x) - 4 * col;
+            y[i] = static_cast<int>(4 * corners[i].y) - 4 * row;
         }
         const auto [least, greatest] = std::minmax(
             {x[0] * y[1] - x[1] * y[0], x[1] * y[2] - x[2] * y[1], x[2] * y[0] - x[0] * y[2]});
@@ -128,4 +128,4 @@ TEST(TriangleGrid, ThreadsMarkOneGrid) {
     EXPECT_EQ(counts[19], 0U);
 }
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test

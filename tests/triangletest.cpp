@@ -6,7 +6,7 @@
 
 #include <cmath>
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 namespace {
 
@@ -135,4 +135,4 @@ TEST(Vector3, OrderOfSumsAndScaling) {
     EXPECT_TRUE(v.z < 1.0 && tiny.x == 1e-310); // by the reciprocal; not at all
 }
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test

@@ -2,7 +2,9 @@
 
 #include <cstdlib>
 
-using kelm::tin::tests::AllocationCounter;
+#ifndef KELM_TIN_FOREIGN_NEW
+
+using kelm::tin::test::AllocationCounter;
 
 // The array forms of the standard library call these.
 void* operator new(std::size_t size) {
@@ -21,3 +23,5 @@ void operator delete(void* block) noexcept {
 void operator delete(void* block, std::size_t) noexcept {
     operator delete(block);
 }
+
+#endif

@@ -8,7 +8,7 @@
 
 /// The arithmetic of triangles once more, for comparison by bits. Each step is rounded by a store
 /// to a volatile variable, so that no compiler can contract or reorder it, whatever its flags.
-namespace kelm::tin::tests::model {
+namespace kelm::tin::test::model {
 
 template <typename T>
 struct Step {
@@ -82,4 +82,4 @@ inline bool TestLine(const Corners& c, const point3_t<float>& a, const point3_t<
     return touches;
 }
 
-} // namespace kelm::tin::tests::model
+} // namespace kelm::tin::test::model

@@ -4,7 +4,7 @@
 #include <cstdlib>
 #include <numeric>
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 Random::Random()
     : mnState(std::strtoull(std::getenv("TIN_TEST_SEED") ? std::getenv("TIN_TEST_SEED") : "1",
@@ -45,10 +45,12 @@ OpenTin Mesh::MakeTin(double dfXBase, double dfYBase) const {
 Mesh MakeSheet(unsigned cells, float fJitter, Random& random) {
     Mesh mesh;
     const unsigned side = cells + 1;
-    for (unsigned i = 0; i < side * side; ++i)
-        mesh.vertices.push_back({static_cast<float>(i % side * 10) + random.Between(0, fJitter),
-                                 static_cast<float>(i / side * 10) + random.Between(0, fJitter),
+    for (unsigned i = 0; i < side * side; ++i) {
+        const unsigned x = i % side * 10, y = i / side * 10;
+        mesh.vertices.push_back({static_cast<float>(x) + random.Between(0, fJitter),
+                                 static_cast<float>(y) + random.Between(0, fJitter),
                                  random.Between(0, 50)});
+    }
     for (unsigned i = 0; i < cells * cells; ++i) {
         const unsigned a = i / cells * side + i % cells;
         mesh.ids.insert(mesh.ids.end(), {{a, a + 1, a + side + 1}, {a + side + 1, a + side, a}});
@@ -96,4 +98,4 @@ Indices Sorted(Indices list) {
     return list;
 }
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test

@@ -4,12 +4,11 @@
 #include "tin/tin.h"
 
 #include <algorithm>
-#include <cstring>
 #include <gtest/gtest.h>
 #include <limits>
 #include <memory>
 
-namespace kelm::tin::tests {
+namespace kelm::tin::test {
 
 using Point = point3_t<float>;
 using Point2 = point2_t<float>;
@@ -82,4 +81,4 @@ Indices CollectLeaves(const AabbNode* node, const Meets& meets) {
 }
 Indices Sorted(Indices list);
 
-} // namespace kelm::tin::tests
+} // namespace kelm::tin::test
