@@ -40,7 +40,7 @@ std::string WriteFile(fuzz::Bytes& rBytes) {
                                           "dxf",  "sqlite", "shp",     "gdb"};
     static const char* const SHAPE_PARTS[] = {".shp", ".shx", ".dbf", ".prj"};
     const unsigned format = rBytes.TakeFrom(0, 7);
-    const std::string name = std::string(FOLDER) + "/input." + ENDINGS[format];
+    std::string name = std::string(FOLDER) + "/input." + ENDINGS[format];
     if (format == 6)
         WriteParts(rBytes, [](unsigned id) {
             return std::string(FOLDER) + "/input" + SHAPE_PARTS[id % 4];

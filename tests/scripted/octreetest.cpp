@@ -139,7 +139,7 @@ TEST(OctreeTest, EqualCornersAreHeldOnceByTheFirst) {
     std::set<std::tuple<double, double, double>> places;
     Kept firsts;
     for (unsigned i = 0; i < 20000; ++i) {
-        corners.push_back({5e5 + below(40) * 0.1, 4e6 + below(40) * 0.1, below(3)});
+        corners.push_back({5e5 + below(100) * 0.1, 4e6 + below(100) * 0.1, below(3)});
         if (places.insert({corners[i].x, corners[i].y, corners[i].z}).second)
             firsts.push_back(i);
     }
