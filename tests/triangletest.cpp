@@ -124,6 +124,7 @@ TEST(Ray2, SlabsOfSegmentsAndBoxes) {
     EXPECT_TRUE(meets(-1, 1, 1, -1) && meets(-1, 2, 0, 2));                     // touching
     EXPECT_FALSE(meets(5, 2, 5, 2) || meets(-1, 0, -1, 4) || meets(0, 4.001F, 4, 4.001F));
     EXPECT_FALSE(meets(-3, 2, -1, 2) || meets(5, 2, 7, 2) || meets(-1, 0.5F, 1, -1));
+    EXPECT_FALSE(meets(4, -3, 4, -1) || meets(0, -3, 0, -1)); // in line with a side
 }
 
 TEST(Vector3, OrderOfSumsAndScaling) {
