@@ -72,7 +72,7 @@ std::uint32_t GetTag(std::uint64_t hash) {
 } // namespace
 
 CornerHash::CornerHash(const std::vector<Point>& rPoints) : mrPoints(rPoints) {
-    // Room for the half corner a triangle corner leaves in a closed sheet, a sixth of the list.
+    // A closed sheet keeps a sixth of its corners; other layers make the table grow.
     std::size_t slots = 64;
     while (slots < rPoints.size() / 2)
         slots *= 2;
