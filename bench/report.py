@@ -17,9 +17,11 @@ import sys
 # Why a goal is missed, by its key in get_goals(). A goal that is short and has no sentence here is
 # printed as unexplained.
 CAUSES = {
-    "random": "At millions of triangles a height waits for the memory of the nodes on its way: a "
-              "node takes 64 bytes here, and both children are looked at on each level",
-    "line-short": "Boost holds a box for every triangle and drops most of them by it; here a leaf "
+    "random": "Not proved, there are no hardware counters here: a height seems to wait for the memory "
+              "of the nodes on its way: a node takes 64 bytes here, and both children are looked at "
+              "on each level",
+    "line-short": "From reading both: Boost holds a box for every triangle and drops by it what a "
+                  "leaf here tests; here a leaf "
                   "holds up to five triangles, and each of a leaf that is met is put to the rule of "
                   "the plan, three edges in double precision, before its crossing. A 3-D index "
                   "also drops what the line passes over",
@@ -31,7 +33,7 @@ CAUSES = {
               "row and writes to the raster directly",
     "load": "The loop makes nothing. A load also carries each corner through the list, welds it, "
             "and makes vertices and triangles of them",
-    "growth": "A height waits for the memory of what it visits, for all indices in the table; at "
+    "growth": "A height seems to wait for the memory of what it visits, with all indices in the table; at "
               "equal density of the positions, the row `fine`, it does not grow as much",
 }
 
