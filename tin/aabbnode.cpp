@@ -2,6 +2,7 @@
 
 #include "services/reporting.h"
 #include "tin/detail/leafwalk.h"
+#include "tin/detail/nodeblocks.h"
 #include "tin/detail/segmentprobe.h"
 
 #include <algorithm>
@@ -98,8 +99,7 @@ class AabbNode::Builder {
         while (!moPending.empty()) {
             const Pending next = moPending.back();
             moPending.pop_back();
-            next.poParent->mpoRight = new AabbNode;
-            BuildLeftwards(*next.poParent->mpoRight, next.oSpan);
+            BuildLeftwards(*next.poNode, next.oSpan);
         }
     }
 
@@ -118,9 +118,9 @@ class AabbNode::Builder {
         }
     };
 
-    /// A right child yet to be made.
+    /// A right child yet to be built.
     struct Pending {
-        AabbNode* poParent;
+        AabbNode* poNode;
         Span oSpan;
     };
 
@@ -140,8 +140,9 @@ class AabbNode::Builder {
                 RaiseCapacity(*node, span);
                 return;
             }
-            moPending.push_back({node, right});
-            node->mpoLeft = new AabbNode;
+            node->mpoLeft = moBlocks.MakePair();
+            node->mpoRight = node->mpoLeft + 1;
+            moPending.push_back({node->mpoRight, right});
             node = node->mpoLeft;
             span = left;
         }
@@ -203,26 +204,13 @@ class AabbNode::Builder {
     std::vector<unsigned>
         moRight; ///< right side of the division at hand; as long as the first list
     std::vector<Pending> moPending;
+    Blocks moBlocks;
     AabbTree& mrTree;
 };
 
-/// Unlinks the subtree node by node, rotating left children up, so that its depth takes no stack.
 AabbNode::~AabbNode() {
-    for (AabbNode* top : {mpoLeft, mpoRight}) {
-        while (top != nullptr) {
-            AabbNode* left = top->mpoLeft;
-            if (left != nullptr) {
-                top->mpoLeft = left->mpoRight;
-                left->mpoRight = top;
-                top = left;
-            } else {
-                AabbNode* right = top->mpoRight;
-                top->mpoRight = nullptr;
-                delete top;
-                top = right;
-            }
-        }
-    }
+    if (mpoLeft != nullptr)
+        Blocks::Release(mpoLeft);
 }
 
 void AabbNode::CreateChild(const Triangle* triangles, const std::vector<unsigned>& list,

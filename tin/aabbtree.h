@@ -62,9 +62,10 @@ class KELM_TIN_EXPORT AabbTreeInfo {
 /// Node of the tree: a box around the boxes of all triangles below it and either two children or,
 /// in a leaf, a list of triangle indices, ascending.
 ///
-/// Boxes and positions are surface-local `float`. A node owns its children and its list. A copy
-/// shares the children, so of the nodes that share children only one may reach its destructor.
-/// Searches only read and may run on any number of threads; CreateChild excludes all others.
+/// Boxes and positions are surface-local `float`. A node owns its list, and the node on which
+/// CreateChild ran owns all nodes below it. A copy shares the children: of a top and its copies
+/// only one may reach its destructor, and a copy of a node below a top may not. Searches only read
+/// and may run on any number of threads; CreateChild excludes all others.
 class KELM_TIN_EXPORT AabbNode {
   public:
     AabbNode() = default;
@@ -122,6 +123,7 @@ class KELM_TIN_EXPORT AabbNode {
                 std::vector<unsigned>& right) const;
 
   private:
+    class Blocks;
     class Builder;
 
     AabbNode* mpoLeft = nullptr;

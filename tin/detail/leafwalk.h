@@ -1,6 +1,7 @@
 #pragma once
 
 #include "tin/aabbtree.h"
+#include "tin/detail/prefetch.h"
 
 #include <array>
 #include <vector>
@@ -33,24 +34,34 @@ class PendingNodes {
     std::vector<const AabbNode*> moMore;
 };
 
+/// Asks for what a walk needs next if it enters the node: most of its time is waiting for memory.
+inline void PrefetchBelow(const AabbNode* poNode) {
+    Prefetch(poNode->GetLeft());
+    Prefetch(poNode->GetRight());
+    Prefetch(poNode->GetLeaves().data());
+}
+
 /// Calls visit(list) for every leaf that can be reached from poRoot through boxes for which
-/// meets(box) holds, depth first, left before right. A null root has no leaves; neither has a
-/// child that a build stopped by a failed allocation never made.
+/// meets(box) holds, depth first, left before right. A null root has no leaves.
 template <typename Meets, typename Visit>
 void VisitLeaves(const AabbNode* poRoot, const Meets& meets, const Visit& visit) {
-    const auto enters = [&](const AabbNode* poNode) {
-        return poNode != nullptr && meets(poNode->GetBBox());
-    };
-    if (!enters(poRoot))
+    if (poRoot == nullptr || !meets(poRoot->GetBBox()))
         return;
     PendingNodes pending;
     for (const AabbNode* node = poRoot;;) {
         const AabbNode* left = node->GetLeft();
         const AabbNode* right = node->GetRight();
-        if (left == nullptr && right == nullptr)
+        bool goesLeft = false;
+        bool goesRight = false;
+        if (left == nullptr) {
             visit(node->GetLeaves());
-        const bool goesRight = enters(right);
-        if (enters(left)) {
+        } else {
+            PrefetchBelow(left);
+            PrefetchBelow(right);
+            goesLeft = meets(left->GetBBox());
+            goesRight = meets(right->GetBBox());
+        }
+        if (goesLeft) {
             if (goesRight)
                 pending.Push(right);
             node = left;

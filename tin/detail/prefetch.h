@@ -1,0 +1,12 @@
+#pragma once
+
+namespace kelm::tin::detail {
+
+/// Asks for memory ahead of its use. Any address will do.
+inline void Prefetch([[maybe_unused]] const void* p) {
+#ifdef __GNUC__
+    __builtin_prefetch(p);
+#endif
+}
+
+} // namespace kelm::tin::detail
