@@ -3,9 +3,11 @@
 #include "tin/aabbtree.h"
 #include "tin/detail/leafwalk.h"
 #include "tin/detail/parallelscan.h"
+#include "tin/detail/prefetch.h"
 #include "tin/detail/segmentprobe.h"
 #include "tin/ray2.h"
 
+#include <array>
 #include <limits>
 
 namespace kelm::tin {
@@ -22,6 +24,48 @@ void KeepHighest(const Triangle& triangle, const point3_t<float>& a, const point
         height = h;
 }
 
+/// Highest crossing of a segment with the triangles of the leaves that it meets.
+///
+/// They are tested in batches, in their order: triangles, and then their vertices, are asked for a
+/// batch ahead, since a walk over a large surface mostly waits for memory.
+class CrossingBatch {
+  public:
+    CrossingBatch(const Triangle* triangles, const point3_t<float>& a, const point3_t<float>& b)
+        : mpoTriangles(triangles), mrA(a), mrB(b) {}
+
+    void Add(const std::vector<unsigned>& leaves) {
+        for (const unsigned id : leaves) {
+            detail::Prefetch(mpoTriangles + id);
+            mao[mnSize++] = mpoTriangles + id;
+            if (mnSize == mao.size())
+                TestAll();
+        }
+    }
+
+    float GetHighest() {
+        TestAll();
+        return mfHighest;
+    }
+
+  private:
+    void TestAll() {
+        for (std::size_t i = 0; i < mnSize; ++i)
+            for (int k = 0; k < 3; ++k)
+                detail::Prefetch(mao[i]->GetVertex(k));
+        for (std::size_t i = 0; i < mnSize; ++i)
+            if (mao[i]->IsIntersectedLine(mrA.x, mrA.y, mrB.x, mrB.y))
+                KeepHighest(*mao[i], mrA, mrB, mfHighest);
+        mnSize = 0;
+    }
+
+    const Triangle* mpoTriangles;
+    const point3_t<float>& mrA;
+    const point3_t<float>& mrB;
+    std::array<const Triangle*, 32> mao;
+    std::size_t mnSize = 0;
+    float mfHighest = LOWEST;
+};
+
 } // namespace
 
 bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h,
@@ -34,13 +78,10 @@ bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>
         const auto meets = [&](const BBox<float, point2_t<float>>& box) {
             return probe.IsMet(box);
         };
-        float highest = LOWEST;
-        detail::VisitLeaves(tree->GetRoot(), meets, [&](const std::vector<unsigned>& leaves) {
-            for (const unsigned id : leaves)
-                if (mpoTriangles[id].IsIntersectedLine(a.x, a.y, b.x, b.y))
-                    KeepHighest(mpoTriangles[id], a, b, highest);
-        });
-        h = highest;
+        CrossingBatch batch(mpoTriangles, a, b);
+        detail::VisitLeaves(tree->GetRoot(), meets,
+                            [&](const std::vector<unsigned>& leaves) { batch.Add(leaves); });
+        h = batch.GetHighest();
     } else {
         std::vector<unsigned> list;
         FindTrianglesByLine(a, b, list, nullptr);

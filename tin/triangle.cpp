@@ -25,29 +25,22 @@ Vector3 Difference(const point3_t<float>& a, const point3_t<float>& b) {
 }
 
 /// Does the segment A-B cross the segment P-Q in plan? Ends count; parallel segments never cross.
-bool IsIntersectedSegment(const float& ax, const float& ay, const float& bx, const float& by,
-                          const float& px, const float& py, const float& qx, const float& qy) {
+/// Without branches: which of an edge's bounds fails cannot be predicted.
+inline bool IsIntersectedSegment(const float& ax, const float& ay, const float& bx, const float& by,
+                                 const float& px, const float& py, const float& qx,
+                                 const float& qy) {
     const double rx = Widen(bx - ax);
     const double ry = Widen(by - ay);
     const double sx = Widen(qx - px);
     const double sy = Widen(qy - py);
     const double wx = Widen(ax - px);
     const double wy = Widen(ay - py);
-    double den = rx * sy - sx * ry;
-    if (EPSILON > std::fabs(den))
-        return false;
-    const bool negative = den < 0.0;
-    double nt = wy * sx - wx * sy;
-    if (negative) {
-        den = -den;
-        nt = -nt;
-    }
-    if (0.0 > nt || nt > den)
-        return false;
-    double nu = wy * rx - wx * ry;
-    if (negative)
-        nu = -nu;
-    return nu >= 0.0 && den >= nu;
+    const double den = rx * sy - sx * ry;
+    const double sign = std::copysign(1.0, den);
+    const double size = std::fabs(den);
+    const double t = sign * (wy * sx - wx * sy);
+    const double u = sign * (wy * rx - wx * ry);
+    return !(EPSILON > size) & !(0.0 > t) & !(t > size) & (u >= 0.0) & (size >= u);
 }
 
 } // namespace
@@ -178,13 +171,13 @@ bool Triangle::IsIntersectedLine(float x1, float y1, float x2, float y2) const {
         return false;
     if (IsPointInside(x1, y1) || IsPointInside(x2, y2))
         return true;
+    bool isCrossed = false;
     for (int i = 0; i < 3; ++i) {
         const point3_t<float>& from = *vertices[i];
         const point3_t<float>& to = *vertices[(i + 1) % 3];
-        if (IsIntersectedSegment(from.x, from.y, to.x, to.y, x1, y1, x2, y2))
-            return true;
+        isCrossed |= IsIntersectedSegment(from.x, from.y, to.x, to.y, x1, y1, x2, y2);
     }
-    return false;
+    return isCrossed;
 }
 
 bool Triangle::IsIntersected(const BBox<float, point2_t<float>>& box) const {
