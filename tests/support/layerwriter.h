@@ -1,8 +1,12 @@
 #pragma once
 
-#include <ogr_core.h>
+#include "services/reporting.h"
 
-#include <cstdint>
+#include <gdal_priv.h>
+#include <ogrsf_frmts.h>
+
+#include <filesystem>
+#include <stdexcept>
 #include <string>
 #include <vector>
 
@@ -10,29 +14,56 @@ namespace kelm::test {
 
 /// A layer to be written.
 struct LayerText {
-    /// Well-known texts, one a feature; an empty text is a feature without a geometry. Rings are
-    /// written as they stand here, closed or not.
+    /// Well-known texts, whose rings need not be closed; an empty one is a feature without
+    /// geometry.
     std::vector<std::string> moGeometries;
-    /// CRS as EPSG code, or any text that GDAL takes for a CRS; empty: none.
-    std::string moCrs = "EPSG:32632";
-    std::string moName = "facets";
-    /// Feature ids; empty: those that the format gives.
-    std::vector<std::int64_t> moIds;
-    /// Declared type; any geometry with heights, unless the format knows no such layer.
     OGRwkbGeometryType meType = OGR_GT_SetZ(wkbUnknown);
-    /// Layer creation options of the driver, such as "SPATIAL_INDEX=NO".
-    std::vector<std::string> moOptions;
+    std::string moCrs = "EPSG:32632"; ///< any text that GDAL takes for a CRS; empty: none
+    std::vector<GIntBig> moIds = {};  ///< of the features; empty: those that the format gives
 };
 
-/// Writes layers into a new file. @param format short name of a GDAL driver @return path
-/// @throw std::runtime_error with GDAL's reason
-std::string WriteLayers(const std::string& path, const std::string& format,
-                        const std::vector<LayerText>& oLayers);
+inline void AddFeatures(OGRLayer& oLayer, const LayerText& oText) {
+    // One transaction where the format has such: it saves a write to disk a feature.
+    bool bDone = oLayer.StartTransaction() == OGRERR_NONE;
+    for (std::size_t n = 0; n < oText.moGeometries.size(); ++n) {
+        const char* pszText = oText.moGeometries[n].c_str();
+        OGRGeometry* poGeometry = nullptr;
+        OGRGeometryFactory::createFromWkt(pszText, nullptr, &poGeometry);
+        OGRFeature oFeature(oLayer.GetLayerDefn());
+        oFeature.SetGeometryDirectly(poGeometry);
+        oFeature.SetFID(oText.moIds.empty() ? OGRNullFID : oText.moIds[n]);
+        bDone &= poGeometry || !*pszText;
+        bDone &= oLayer.CreateFeature(&oFeature) == OGRERR_NONE;
+    }
+    if (!bDone || oLayer.CommitTransaction() != OGRERR_NONE)
+        throw std::runtime_error(CPLGetLastErrorMsg());
+}
 
-/// Writes a file of one layer.
-std::string WriteLayer(const std::string& path, const std::string& format, const LayerText& oLayer);
+/// Writes a new file of a layer "facets", and another if wanted. @param format short name of a GDAL
+/// driver @return path @throw std::runtime_error with GDAL's reason
+inline std::string WriteLayer(const std::string& path, const std::string& format,
+                              const LayerText& oText, bool bTwice = false) {
+    GDALAllRegister();
+    std::filesystem::remove_all(path);
+    GDALDriver* poDriver = GetGDALDriverManager()->GetDriverByName(format.c_str());
+    GDALDatasetUniquePtr poDataset(poDriver->Create(path.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
+    OGRSpatialReference oCrs;
+    oCrs.SetFromUserInput(oText.moCrs.c_str());
+    CPLStringList oOptions;
+    if (format == "FlatGeobuf")
+        oOptions.AddString("SPATIAL_INDEX=NO"); // or it sorts the features
+    for (int n = 0; n <= int(bTwice); ++n)
+        AddFeatures(*poDataset->CreateLayer(n == 0 ? "facets" : "others",
+                                            oText.moCrs.empty() ? nullptr : &oCrs, oText.meType,
+                                            oOptions.List()),
+                    oText);
+    return path;
+}
 
-/// @return a triangle as well-known text, with heights z, z + 1 and z + 2, at (x, y)
-std::string MakeTriangle(double dfX, double dfY, double dfZ);
+/// @return a triangle as well-known text, clockwise, with heights z, z + 1 and z + 2, at (x, y)
+inline std::string MakeTriangle(double dfX, double dfY, double dfZ) {
+    return FormatString("POLYGON Z ((%f %f %f,%f %f %f,%f %f %f,%f %f %f))", dfX, dfY, dfZ, dfX,
+                        dfY + 1, dfZ + 1, dfX + 1, dfY, dfZ + 2, dfX, dfY, dfZ);
+}
 
 } // namespace kelm::test

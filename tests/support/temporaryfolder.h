@@ -13,29 +13,24 @@ namespace kelm::test {
 class TemporaryFolder {
   public:
     TemporaryFolder() {
-        std::string name = std::filesystem::temp_directory_path() / "kelm-tin-XXXXXX";
-        if (!mkdtemp(name.data()))
-            throw std::runtime_error("cannot make a folder like " + name);
-        moPath = name;
+        if (!mkdtemp(moPath.data()))
+            throw std::runtime_error("cannot make a folder like " + moPath);
     }
     ~TemporaryFolder() {
         std::error_code oError;
         std::filesystem::remove_all(moPath, oError);
     }
-    TemporaryFolder(const TemporaryFolder&) = delete;
-    TemporaryFolder& operator=(const TemporaryFolder&) = delete;
+    TemporaryFolder(TemporaryFolder&&) = delete;
 
-    /// @return the path of a file of this name in the folder
-    std::string GetPath(const std::string& name) const { return moPath / name; }
-
+    std::string GetPath(const std::string& name) const { return moPath + '/' + name; }
     /// Writes a file of this content. @return its path
     std::string WriteFile(const std::string& name, const std::string& content) const {
-        std::ofstream(moPath / name, std::ios::binary) << content;
+        std::ofstream(GetPath(name), std::ios::binary) << content;
         return GetPath(name);
     }
 
   private:
-    std::filesystem::path moPath;
+    std::string moPath = std::filesystem::temp_directory_path() / "kelm-tin-XXXXXX";
 };
 
 } // namespace kelm::test
