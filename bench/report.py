@@ -48,6 +48,11 @@ SUBJECTS = [
     ("Memory of an index", "memory", (0, "bytes a triangle"),
      "Resident memory that a build adds at its peak and keeps, beyond what it is built over, each "
      "in a process of its own."),
+    ("Degenerate surfaces", "degenerate", (1e-6, "ms"),
+     "A million triangles, an index of ours: `same` and `crowded` as above; `vertical` triangles "
+     "in a diagonal; a `tower` of growing triangles over one point; `slivers` of 10,000 km side by "
+     "side; `far`: each spans the range of `float`. The height in the middle of the surface's box, "
+     "and the crossing of its diagonal."),
     ("Heights along scanlines", "height/scanline", (1, "ns a height"),
      "The greatest height at a million positions, row by row over the whole extent, one call a "
      "position. CGAL lists the triangles that a plumb line meets, Boost those whose box holds the "

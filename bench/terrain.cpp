@@ -7,6 +7,8 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
+#include <iterator>
+#include <limits>
 #include <stdexcept>
 
 namespace kelm::bench {
@@ -124,6 +126,43 @@ void Crowd(Terrain& rTerrain) {
     }
 }
 
+void MakeVertical(float i, point3_t<float>* poCorners) {
+    poCorners[0] = {i, i, 0.0F};
+    poCorners[1] = {i + 1.0F, i + 1.0F, 2.0F};
+    poCorners[2] = {i, i, 5.0F};
+}
+
+void MakeTower(float i, point3_t<float>* poCorners) {
+    poCorners[0] = {-i, -i, 2.0F};
+    poCorners[1] = {i, -i, 2.0F};
+    poCorners[2] = {0.0F, i, 2.0F};
+}
+
+void MakeSliver(float i, point3_t<float>* poCorners) {
+    poCorners[0] = {i, 0.0F, 1.0F};
+    poCorners[1] = {i + 1.0F, 5e6F, 1.0F};
+    poCorners[2] = {i, -5e6F, 1.0F};
+}
+
+void MakeFar(float i, point3_t<float>* poCorners) {
+    constexpr float FAR = std::numeric_limits<float>::max();
+    const float inner = i * (FAR / 1e8F);
+    poCorners[0] = {-FAR, inner, 1.0F};
+    poCorners[1] = {FAR, -FAR, 1.0F};
+    poCorners[2] = {inner, -FAR, 2.0F};
+}
+
+/// Gives every triangle three vertices of its own, by its number.
+template <void (*MakeCorners)(float, point3_t<float>*)>
+void Reshape(Terrain& rTerrain) {
+    rTerrain.oVertices.resize(3 * rTerrain.oTriangles.size());
+    for (std::size_t i = 0; i < rTerrain.oTriangles.size(); ++i) {
+        const auto id = static_cast<std::uint32_t>(3 * i);
+        rTerrain.oTriangles[i] = {id, id + 1, id + 2};
+        MakeCorners(static_cast<float>(i), &rTerrain.oVertices[id]);
+    }
+}
+
 /// Cuts an ending off a name. @return was it there?
 bool TakeEnding(std::string& rName, const std::string& sEnding) {
     if (rName.size() < sEnding.size() ||
@@ -133,12 +172,29 @@ bool TakeEnding(std::string& rName, const std::string& sEnding) {
     return true;
 }
 
+struct Change {
+    const char* pszEnding;
+    void (*Apply)(Terrain&);
+};
+
+/// What an ending of a name makes of a terrain, in the order in which endings stand and are
+/// applied.
+constexpr Change CHANGES[] = {
+    {"-shuffled", [](Terrain& rTerrain) { Shuffle(rTerrain.oTriangles); }},
+    {"-same", MakeSame},
+    {"-crowded", Crowd},
+    {"-vertical", Reshape<MakeVertical>},
+    {"-tower", Reshape<MakeTower>},
+    {"-slivers", Reshape<MakeSliver>},
+    {"-far", Reshape<MakeFar>},
+    {"-grid", StretchToGrid}};
+
 std::unique_ptr<Terrain> MakeTerrain(const std::string& sName) {
     std::string base = sName;
-    const bool isGrid = TakeEnding(base, "-grid");
-    const bool isSame = TakeEnding(base, "-same");
-    const bool isCrowded = TakeEnding(base, "-crowded");
-    const bool isShuffled = TakeEnding(base, "-shuffled");
+    std::vector<Change> changes;
+    for (auto change = std::rbegin(CHANGES); change != std::rend(CHANGES); ++change)
+        if (TakeEnding(base, change->pszEnding))
+            changes.insert(changes.begin(), *change);
     auto terrain = std::make_unique<Terrain>();
     if (base == "jacksboro") {
         *terrain = ReadReal();
@@ -150,14 +206,8 @@ std::unique_ptr<Terrain> MakeTerrain(const std::string& sName) {
             throw std::invalid_argument("there is no terrain " + sName);
         *terrain = MakeFractal(static_cast<unsigned>(count) * (sUnit == "k" ? 1000U : 1000000U));
     }
-    if (isShuffled)
-        Shuffle(terrain->oTriangles);
-    if (isSame)
-        MakeSame(*terrain);
-    if (isCrowded)
-        Crowd(*terrain);
-    if (isGrid)
-        StretchToGrid(*terrain);
+    for (const Change& change : changes)
+        change.Apply(*terrain);
     terrain->sName = sName;
     return terrain;
 }

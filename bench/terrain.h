@@ -23,7 +23,10 @@ struct Terrain {
 /// "10k", "100k", "1M", "4M" and the like (a number, `k` or `M`): about so many triangles of a
 /// fractal terrain, nodes 10 m apart with 3 m of jitter, in row order; with "-shuffled" behind it
 /// the same triangles in random order, with "-same" as many copies of one triangle, with "-crowded"
-/// vertices that crowd towards a corner of the box by powers of two. "jacksboro": the real one.
+/// vertices that crowd towards a corner of the box by powers of two; with "-vertical", "-tower",
+/// "-slivers" or "-far" as many vertical triangles in a diagonal, growing triangles over one point,
+/// slivers ten thousand kilometres long side by side, or triangles of which each spans the range of
+/// `float`. "jacksboro": the real one.
 /// With "-grid" behind any of these x and y are those of a raster of RASTER_SIDE cells a side over
 /// the whole terrain.
 /// @throw std::invalid_argument for any other name
