@@ -6,6 +6,7 @@
 #include <cassert>
 #include <limits>
 #include <memory>
+#include <utility>
 
 namespace kelm::tin {
 
@@ -88,6 +89,17 @@ Tin& Tin::operator=(const Tin& other) {
     mdfYBase = other.mdfYBase;
     moBBox = other.moBBox;
     mnThreads = other.mnThreads;
+    return *this;
+}
+
+Tin::Tin(Tin&& other) noexcept : Tin(static_cast<const Tin&>(other)) {
+    std::swap(mbOwnsArrays, other.mbOwnsArrays);
+}
+
+Tin& Tin::operator=(Tin&& other) noexcept {
+    *this = static_cast<const Tin&>(other);
+    if (&other != this && std::exchange(other.mbOwnsArrays, false))
+        mbOwnsArrays = true;
     return *this;
 }
 

@@ -28,8 +28,8 @@ class AabbTree;
 ///
 /// A surface is empty, with both arrays null, or has vertices and triangles, for life. It owns both
 /// arrays, which must come from the array form of new; what its accessors hand out stays its own.
-/// A copy shows the same arrays without owning them: only the object that took the arrays over
-/// releases them, and no copy is to be used after that.
+/// A copy shows the same arrays without owning them: only their owner releases them, and no copy is
+/// to be used after that. A move hands the ownership on; the source goes on showing the arrays.
 ///
 /// The constant operations may run on any number of threads at a time, as long as nobody writes.
 class KELM_TIN_EXPORT Tin {
@@ -53,6 +53,9 @@ class KELM_TIN_EXPORT Tin {
     /// Releases the arrays that the target owns, unless `other` shows them too: then it goes on
     /// owning them.
     Tin& operator=(const Tin& other);
+    /// Owns what the other owned, which goes on showing it.
+    Tin(Tin&& other) noexcept;
+    Tin& operator=(Tin&& other) noexcept;
     ~Tin();
 
     unsigned GetVertexCount() const { return mnVertices; }
