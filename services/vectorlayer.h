@@ -32,7 +32,8 @@ struct ZARShape {
     int vertexCount;
 };
 
-/// An open layer. A store may keep more behind these two fields.
+/// An open layer. A store may keep more behind these two fields. The bundled store refuses a null
+/// layer with a kelm::ParameterException.
 struct ZARLayer_t {
     int shapeCount;
     int shapeCountValid; ///< non-zero if shapeCount can be relied on
@@ -50,7 +51,7 @@ KELM_SERVICES_EXPORT _iobuf* ZAROpen(const char* name, const char* mode);
 /// Closes a file and ends its layers; null is let be. Does not throw.
 KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
 
-/// @return the number of segments of this type
+/// @return the number of segments of this type; a null file has none
 KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
 
 /// @return the number of the first segment of this type behind `after` (0: from the start), or 0

@@ -15,11 +15,18 @@ namespace {
 
 /// Every layer that is handed out is a StoreLayer.
 StoreLayer& Get(ZARLayer_t* layer) {
+    if (layer == nullptr)
+        throw kelm::ParameterException("layer", kelm::ParameterException::PT_Invalid, "null", "",
+                                       "A layer of an open file is needed",
+                                       "services/bundled/vectorlayer", __PRETTY_FUNCTION__,
+                                       __LINE__);
     return *static_cast<StoreLayer*>(layer);
 }
 
-int CountSegments(const _iobuf& oFile, int nType) {
-    return nType == ZAR_SEGMENT_VECTOR ? static_cast<int>(oFile.moSegments.size()) : 0;
+int CountSegments(const _iobuf* poFile, int nType) {
+    return poFile != nullptr && nType == ZAR_SEGMENT_VECTOR
+               ? static_cast<int>(poFile->moSegments.size())
+               : 0;
 }
 
 } // namespace
@@ -39,17 +46,17 @@ void ZARClose(_iobuf* file) {
 }
 
 int ZARSegCount(_iobuf* file, int type) {
-    return CountSegments(*file, type);
+    return CountSegments(file, type);
 }
 
 int ZARSegNext(_iobuf* file, int type, int after) {
     if (after < 0)
         after = 0;
-    return after < CountSegments(*file, type) ? after + 1 : 0;
+    return after < CountSegments(file, type) ? after + 1 : 0;
 }
 
 ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {
-    if (segment < 1 || segment > CountSegments(*file, ZAR_SEGMENT_VECTOR))
+    if (segment < 1 || segment > CountSegments(file, ZAR_SEGMENT_VECTOR))
         return nullptr;
     const auto nIndex = static_cast<std::size_t>(segment) - 1;
     auto& poLayer = file->moLayers[nIndex];
