@@ -53,11 +53,14 @@ bool Tin::GetHeight(const double& x, const double& y, float& height, const AabbT
 void Tin::FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,
                                const AabbTree* tree) const {
     const detail::PointProbe probe(x, y);
-    const auto holds = [this, probe, x, y](unsigned id) {
-        return probe.IsIn(mpoTriangles[id].GetBBox()) && mpoTriangles[id].IsPointInsideLT(x, y);
+    const auto isNear = [probe, triangles = mpoTriangles](unsigned id) {
+        return probe.IsIn(triangles[id].GetBBox());
+    };
+    const auto holds = [this, isNear, x, y](unsigned id) {
+        return isNear(id) && mpoTriangles[id].IsPointInsideLT(x, y);
     };
     if (tree == nullptr) {
-        detail::ParallelScan(mnTriangles, mnThreads, holds, result);
+        detail::ParallelScan(mnTriangles, mnThreads, holds, result, isNear);
         return;
     }
     tree->FindLeaves(x, y, result);
