@@ -1,149 +1,118 @@
+#include "services/exception.h"
+#include "services/interpgrid3d.h"
 #include "tests/scripted/readerfixture.h"
 
 #include <algorithm>
-#include <atomic>
-#include <set>
-#include <thread>
+#include <cmath>
 
 namespace {
 
-class LoadTest : public ReaderTest {
-  protected:
-    /// @return number of triangles; 0 for no surface
-    static unsigned Count(TinReader& reader, const Window& window) {
-        const Surface surface = Load(reader, &window);
-        return surface ? surface->GetTriangleCount() : 0;
-    }
-};
+const double NaN = std::nan("");
 
-TEST_F(LoadTest, AWindowSelectsWholePolygonsAndTouchingCounts) {
-    script.shapes = {Close({{0, 0, 0}, {10, 0, 0}, {0, 10, 0}}),
-                     Close({{30, 0, 0}, {40, 0, 0}, {40, 10, 0}, {35, 12, 0}, {30, 10, 0}})};
-    script.low = {0, 0, 0};
-    script.high = {40, 12, 0};
+TEST_F(ReaderTest, TouchingAWindowIsMeetingIt) {
+    const Window meeting[] = {{4, 4, 6, 6},  {-1, -1, 11, 11}, {-1, 4.5, 11, 5.5},
+                              {7, 2, 20, 3}, {10, 5, 20, 20},  {7.5, -9, 9, 2.5}};
+    const Window clear[] = {{7.6, -9, 9, 2.5}, {0, 0, 2, 2}, {NaN, 0, 9, 9}, {0, 0, 9, NaN}};
+    script.shapes = {Close({{5, 0, 0}, {10, 5, 0}, {5, 10, 0}, {0, 5, 0}})};
     const Reader reader = Open();
-    EXPECT_EQ(Load(*reader)->GetTriangleCount(), 4U);
-    EXPECT_EQ(Count(*reader, MakeWindow(38, 1, 50, 2)), 3U) << "one edge crosses";
-    EXPECT_EQ(Count(*reader, MakeWindow(10, -5, 30, 0)), 4U) << "touches two corners";
-    EXPECT_EQ(Count(*reader, MakeWindow(6, 6, 29, 11)), 0U) << "meets the box of one, no polygon";
-    EXPECT_EQ(Count(*reader, MakeWindow(40, 0, 50, 5)), 3U) << "touches the extents";
-    script.calls.clear();
-    for (const Window& window :
-         {MakeWindow(40.000001, 0, 50, 5), MakeWindow(-9, 0, -1, 5), MakeWindow(0, 13, 9, 14),
-          MakeWindow(0, -4, 9, -3), MakeWindow(NaN, 0, 9, 9), MakeWindow(0, NaN, 9, 9),
-          MakeWindow(0, 0, NaN, 9), MakeWindow(0, 0, 9, NaN)})
-        EXPECT_EQ(Count(*reader, window), 0U);
-    EXPECT_TRUE(script.calls.empty()) << "none of these reads the layer";
+    for (int turn = 0; turn < 2; ++turn) {
+        for (const Window& window : meeting)
+            EXPECT_NE(Load(*reader, &window), nullptr) << window.min.x;
+        for (const Window& window : clear)
+            EXPECT_EQ(Load(*reader, &window), nullptr) << window.min.x;
+        std::reverse(script.shapes[0].begin(), script.shapes[0].end());
+    }
 }
 
-TEST_F(LoadTest, AShapeOfFourVerticesIsTheTriangleOfItsFirstThree) {
-    script.shapes = {{{{1, 2, 3}, {5, 2, 4}, {5, 5, 6}, {100, 100, 100}}}, // not closed
-                     Close({{9, 0, 0}, {9, 1, 1}, {9, 2, 2}}),             // flat
-                     Close({{7, 7, 1}, {7, 7, 1}, {8, 8, 2}})};            // twice the same corner
-    const Reader reader = Open();
-    const Window window = MakeWindow(0, 0, 50, 50);
-    for (const Window* wanted : {static_cast<const Window*>(nullptr), &window}) {
-        const Surface surface = Load(*reader, wanted);
-        EXPECT_EQ(surface->GetTriangleCount(), 3U);
-        EXPECT_EQ(surface->GetVertexCount(), 8U);
-        EXPECT_EQ(surface->GetTriangle(0)->GetVertex(2), surface->GetVertex(2));
-        EXPECT_EQ(surface->GetVertex(0)->x, 0.0F);
-        EXPECT_EQ(surface->GetVertex(2)->y, 3.0F);
-        EXPECT_EQ(surface->GetVertex(2)->z, 6.0F);
-        EXPECT_EQ(surface->GetTriangle(2)->GetVertex(0), surface->GetTriangle(2)->GetVertex(1));
-    }
-    EXPECT_TRUE(script.warnings.empty());
-}
-
-TEST_F(LoadTest, WhatCannotBeUsedIsLeftOutAndNamed) {
-    const Shape good = script.shapes[0];
-    const Shape bowTie = Close({{0, 0, 0}, {9, 9, 0}, {9, 0, 0}, {0, 9, 0}});
-    const Shape flat = Close({{0, 0, 0}, {1, 1, 0}, {2, 2, 0}, {3, 3, 0}});
-    script.shapes = {good, bowTie, {good.ring, Shape::Throws}, flat, good};
-    const Reader reader = Open();
-    const Surface surface = Load(*reader);
+TEST_F(ReaderTest, AShapeOfFourVerticesIsTheTriangleOfItsFirstThree) {
+    script.shapes = {{{1, 2, -0.0}, {5, 2, 4}, {5, 5, 6}, {100, 100, 100}}, // not closed
+                     Close({{9, 0, 0}, {9, 1, 1}, {9, 2, 2}})};             // flat
+    const Surface surface = Load(*Open());
     EXPECT_EQ(surface->GetTriangleCount(), 2U);
-    EXPECT_EQ(surface->GetVertexCount(), 3U);
-    const auto text = [](int id) {
-        return "Triangulate(): Polygon# " + std::to_string(id) +
-               " is ignored becasue it is not simple.\n tin/tinreader";
-    };
-    EXPECT_EQ(script.warnings, (std::vector<std::string>{text(110), text(130)}));
-    script.shapes = {{good.ring, Shape::Null}, bowTie, {good.ring, Shape::Throws}};
-    EXPECT_EQ(Load(*reader), nullptr);
-    EXPECT_EQ(script.warnings.size(), 4U);
+    EXPECT_EQ(surface->GetTriangle(0)->GetVertex(2)->y, 3.0F);
+    EXPECT_TRUE(std::signbit(surface->GetVertex(0)->z)) << "+0 if anything is added";
+    EXPECT_FALSE(std::signbit(Load(*Open(1e-300))->GetVertex(0)->z));
 }
 
-TEST_F(LoadTest, AFailedLoadLeavesTheReaderUsable) {
-    script.shapes.push_back({{{900, 900, 0}, {901, 900, 0}, {900, 900, 0}}});
+TEST_F(ReaderTest, WhatCannotBeUsedIsLeftOutAndTheReaderLoadsOn) {
     const Reader reader = Open();
-    const Window window = MakeWindow(0, 0, 50, 50);
+    script.shapes.push_back({{}, {}, {}});
     for (int i = 0; i < 2; ++i) // a lock left behind would stop the second
-        EXPECT_STREQ(Catch<DataException>([&] { Load(*reader, &window); }).what(),
-                     "3 points could not forma polygon");
+        EXPECT_THROW(Load(*reader), kelm::DataException);
+    script.shapes = {{{}}, {}, {{0, 0, 0}, {9, 9, 0}, {9, 0, 0}, {0, 9, 0}, {}}, script.shapes[0]};
+    EXPECT_EQ(Load(*reader)->GetTriangleCount(), 1U);
     script.shapes.pop_back();
-    EXPECT_EQ(Count(*reader, window), 1U);
+    EXPECT_EQ(Load(*reader), nullptr);
 }
 
-// Of each run of repeats the first vertex gives the height.
-TEST_F(LoadTest, CornersOfACompactedRingKeepTheirHeights) {
-    script.shapes = {Close({{0, 0, 0},
-                            {0, 5e-10, 1},
-                            {10, 0, 2},
-                            {10, 0, 3},
-                            {10, 0, 4},
-                            {10, 10, 5},
-                            {10 + 9e-10, 10, 6},
-                            {10, 10 + 9e-10, 7},
-                            {0, 10, 8}})};
+TEST_F(ReaderTest, OfEachRunOfRepeatsTheFirstVertexGivesTheHeight) {
+    script.shapes = {Close({{0, 0, 0}, {0, 9e-10, -1}, {0, 18e-10, -1}, {9, 0, 0}, {0, 9, 9}})};
     const Surface surface = Load(*Open());
-    EXPECT_EQ(surface->GetTriangleCount(), 2U);
-    std::set<std::vector<float>> vertices;
-    for (unsigned i = 0; i < surface->GetVertexCount(); ++i) {
-        const point3_t<float>& v = *surface->GetVertex(i);
-        const point3_t<float>& origin = *surface->GetVertex(0); // (0, 10)
-        vertices.insert({v.x - origin.x, v.y - origin.y, v.z});
-    }
-    EXPECT_EQ(vertices,
-              (std::set<std::vector<float>>{{0, -10, 0}, {10, -10, 2}, {10, 0, 5}, {0, 0, 8}}));
+    ASSERT_EQ(surface->GetVertexCount(), 3U);
+    for (unsigned i = 0; i < 3; ++i)
+        EXPECT_EQ(surface->GetVertex(i)->z - surface->GetVertex(0)->z, surface->GetVertex(i)->y);
 }
 
-TEST_F(LoadTest, NeighboursShareVerticesUnlessTheirHeightsDiffer) {
-    script.shapes = {Close({{0, 0, 0}, {9, 0, 1}, {0, 9, 2}}),
-                     Close({{9, 0, 1}, {9, 9, 3}, {0, 9, 2.5}})};
-    const Surface surface = Load(*Open());
-    EXPECT_EQ(surface->GetVertexCount(), 5U);
-    EXPECT_EQ(surface->GetTriangle(0)->GetVertex(1), surface->GetTriangle(1)->GetVertex(0));
-    for (const unsigned triangles : {1000U, 1001U}) {
-        script.shapes = CreateStrip(triangles + 2, [](unsigned i) { return 1.0 * i; });
-        const Surface strip = Load(*Open());
-        ASSERT_EQ(strip->GetTriangleCount(), triangles);
-        ASSERT_EQ(strip->GetVertexCount(), triangles + 2);
-        for (unsigned i = 0; i < triangles; ++i)
-            for (unsigned k = 0; k < 3; ++k)
-                ASSERT_EQ(strip->GetTriangle(i)->GetVertex(int(k)), strip->GetVertex(i + k));
-    }
+TEST_F(ReaderTest, AWildCornerSpoilsNeitherTheWeldingNorTheBase) {
+    // The last corners part the first from its twins: one is left without a leaf, one with another.
+    script.shapes = {Close({{0, 0, 0}, {0.95e-9, 0, 0}, {0, 0.95e-9, 0}}),
+                     Close({{NaN, 8, 3}, {-1, 0, 0}, {1 + 1e-9, 0, 0}})};
+    const Surface welded = Load(*Open());
+    EXPECT_EQ(welded->GetVertexCount(), 4U);
+    for (const int corner : {1, 2})
+        EXPECT_EQ(welded->GetTriangle(0)->GetVertex(corner), welded->GetVertex(0));
+    script.shapes = {Close({{7, HUGE_VAL, 3}, {100, 200, NaN}, {103, 201, 5}})};
+    EXPECT_EQ(Load(*Open())->GetVertex(2)->x, 3.0F);
 }
 
-// The first load dwells on its shapes for the second to come in, which it must not.
-TEST_F(LoadTest, LoadsOfTwoThreadsRunOneAfterTheOther) {
-    script.shapes = CreateStrip(300, [](unsigned i) { return 1.0 * i; });
-    std::atomic<int> started{0}, inside{0}, most{0};
-    script.onShape = [&] {
-        most = std::max(most.load(), ++inside);
-        for (int i = 0; i < (started < 2 ? 1000 : 20); ++i)
-            std::this_thread::yield();
-        --inside;
-    };
-    const Reader reader = Open();
-    const auto load = [&] {
-        ++started;
-        EXPECT_EQ(Load(*reader)->GetVertexCount(), 300U);
-    };
-    std::thread other(load);
-    load();
-    other.join();
-    EXPECT_EQ(most, 1);
+/// Rounds where no optimiser can undo it.
+double Round(double v) {
+    const volatile float rounded = static_cast<float>(v);
+    return static_cast<double>(rounded);
+}
+
+double Elevate(double stored) {
+    return (Round(stored) + 0.3) * 0.1;
+}
+
+/// The grid in which a large surface's heights are interpolated, from the lowest to the highest.
+void FillGrid(const kelm::tin::Tin& surface, double low, double high, InterpGrid3D& rGrid) {
+    kelm::tin::BBox<double, point3_t<double>> box;
+    surface.GetRawBBox(box);
+    rGrid.SetDimension(1);
+    rGrid.LayoutGrid(box.min.x, box.min.y, low, box.max.x, box.max.y, high, 100.0, 100.0,
+                     std::max(1.0, Round(high - low)));
+    std::vector<double> p(std::size_t{3} * rGrid.GetNumGridPoints());
+    rGrid.GetGridPositions(p.data());
+    for (std::size_t i = 0; i < p.size(); i += 3)
+        rGrid.GetArray()[i / 3] = Round(scripted::Convert(p[i], p[i + 1], p[i + 2], 1));
+}
+
+TEST_F(ReaderTest, NeighboursShareVerticesWhoseHeightsAreElevatedThenConvertedThenNarrowed) {
+    for (const unsigned n : {999U, 1000U, 1003U, 10001U})
+        for (const unsigned heights : {1U, 5U, 997U}) { // for one the factor alone
+            script.shapes = CreateStrip(n, heights);
+            const Reader reader = Open(0.3, 0.1, 2001);
+            reader->SetOutputVerticalDatum(DatumType(heights == 1 ? 2001 : 2002));
+            const Surface surface = Load(*reader);
+            ASSERT_EQ(surface->GetVertexCount(), n);
+            InterpGrid3D grid;
+            FillGrid(*surface, Round(Elevate(700.0)), Round(Elevate(700.0 + 0.37 * (heights - 1))),
+                     grid);
+            for (unsigned i = 0; i < n; ++i) {
+                const point3_t<float>& v = *surface->GetVertex(i);
+                const ZARVertex stored = GetStripVertex(i, heights);
+                ASSERT_EQ(v.x, static_cast<float>(stored.x - STRIP_X));
+                double h = Elevate(stored.z);
+                if (heights > 1 && n < 1000)
+                    h = scripted::Convert(double(v.x) + STRIP_X, double(v.y) + STRIP_Y, h, 1);
+                else if (heights > 1)
+                    grid.GetVal(double(v.x) + STRIP_X, double(v.y) + STRIP_Y, h, &h);
+                ASSERT_EQ(v.z, static_cast<float>(h)) << i << " of " << n << ", " << heights;
+                for (int k = 0; k < 3 && i + 2 < n; ++k)
+                    ASSERT_EQ(surface->GetTriangle(i)->GetVertex(k), &v + k);
+            }
+        }
 }
 
 } // namespace

@@ -1,87 +1,99 @@
 #pragma once
 
-#include "services/exception.h"
 #include "tests/support/scriptedservices.h"
+#include "tin/aabbtree.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
 #include <gtest/gtest.h>
 
-#include <limits>
 #include <memory>
-#include <stdexcept>
-#include <typeinfo>
 
-using namespace kelm::ogc::cs;
-using kelm::DataException;
-using kelm::ParameterException;
-using kelm::tin::Tin;
+using kelm::ogc::cs::DatumType;
+using kelm::tin::AabbTree;
 using kelm::tin::TinReader;
-using scripted::Shape;
+using scripted::Ring;
 
-using Window = kelm::tin::BBox<double, point2_t<double>>;
-using Surface = std::unique_ptr<Tin>;
+using Surface = std::unique_ptr<kelm::tin::Tin>;
 using Reader = std::unique_ptr<TinReader>;
 
-constexpr double NaN = std::numeric_limits<double>::quiet_NaN();
+struct Window : kelm::tin::BBox<double, point2_t<double>> {
+    Window(double xMin, double yMin, double xMax, double yMax) {
+        min = {xMin, yMin};
+        max = {xMax, yMax};
+    }
+};
 
-inline Window MakeWindow(double xMin, double yMin, double xMax, double yMax) {
-    Window window;
-    window.min = {xMin, yMin};
-    window.max = {xMax, yMax};
-    return window;
-}
+constexpr double STRIP_X = 500000.25, STRIP_Y = 4600000.5;
 
 /// The ring with its first vertex repeated at the end.
-inline Shape Close(std::vector<ZARVertex> ring) {
+inline Ring Close(Ring ring) {
     ring.push_back(ring.front());
-    return {std::move(ring)};
+    return ring;
 }
 
-constexpr double STRIP_X = 500000.25;
-constexpr double STRIP_Y = 4600000.5;
+/// Vertex of a strip in two rows, which has this many different heights.
+inline ZARVertex GetStripVertex(unsigned i, unsigned heights) {
+    return {STRIP_X + 3.7 * i, STRIP_Y + 40.0 * (i % 2), 700.0 + 0.37 * (i * 7919 % heights)};
+}
 
-/// A strip of triangles over so many vertices in two rows, in the order in which they appear.
-template <typename Height>
-std::vector<Shape> CreateStrip(unsigned vertices, const Height& height) {
-    const auto at = [&](unsigned i) {
-        return ZARVertex{STRIP_X + 3.7 * i, STRIP_Y + 40.0 * (i % 2), height(i)};
-    };
-    std::vector<Shape> shapes;
+/// The triangles of a strip over so many vertices, in the order in which they appear.
+inline std::vector<Ring> CreateStrip(unsigned vertices, unsigned heights) {
+    std::vector<Ring> shapes;
     for (unsigned i = 0; i + 2 < vertices; ++i)
-        shapes.push_back(Close({at(i), at(i + 1), at(i + 2)}));
+        shapes.push_back(Close({GetStripVertex(i, heights), GetStripVertex(i + 1, heights),
+                                GetStripVertex(i + 2, heights)}));
     return shapes;
 }
 
-/// @return the exception of exactly this class that the work ends in
-template <typename E, typename Work>
-E Catch(const Work& work) {
-    try {
-        work();
-    } catch (const E& e) {
-        EXPECT_EQ(typeid(e), typeid(E));
-        return e;
+/// A number that changes with any vertex of any triangle.
+inline double Summarise(const Surface& surface) {
+    double sum = -1.0;
+    for (unsigned i = 0; surface && i < 3 * surface->GetTriangleCount(); ++i) {
+        const point3_t<float>& v = *surface->GetTriangle(i / 3)->GetVertex(int(i % 3));
+        sum = sum * 1.0000001 + double(v.x) + 3.0 * double(v.y) + 7.0 * double(v.z);
     }
-    throw std::logic_error("the work has not failed");
+    return sum;
 }
 
-/// A script with one triangle, whose first height is 5. Nothing served may be left after a test.
-class ReaderTest : public testing::Test {
-  protected:
-    ReaderTest() { script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})}; }
-    ~ReaderTest() override {
-        EXPECT_EQ(script.openFiles, 0);
-        EXPECT_EQ(script.objects, 0);
-    }
+/// Opens the searches and subsets that are not public.
+struct Opened : kelm::tin::Tin {
+    explicit Opened(const Tin& rTin) : Tin(rTin) {}
 
-    static Reader Open(double offset = 0.0, double scale = 1.0, int source = VD_Ellipsoidal,
-                       int layer = 1) {
-        return Reader(kelm::tin::TinReaderFactory::CreateTinReader("some.file", layer, offset,
-                                                                   scale, DatumType(source)));
+    /// @return a number that changes with the answer to any kind of query, at a place of a strip
+    double Ask(const AabbTree* tree, unsigned place) const {
+        const double x = STRIP_X + 11.3 * place, y = STRIP_Y + place % 41;
+        float height = -1.0F, crossing = -1.0F;
+        GetHeight(x, y, height, tree);
+        GetLineIntersectHeight(point3_t<double>{x, y, 900}, {x + 30, y, -900}, crossing, tree);
+        std::vector<unsigned> met;
+        FindTrianglesByPoint(11.3F * float(place), 20.0F, met, tree);
+        const point2_t<double> path[] = {{x, y}, {x + 20.0, y + 5.0}, {x, y + 30.0}};
+        const Surface parts[] = {Surface(SubsetByRegion(Window(x, y, x + 400, y + 9), tree)),
+                                 Surface(SubsetByLineString(path, 3, tree)),
+                                 Surface(Subset(std::vector<unsigned char>(place, 1))),
+                                 Surface(Subset(std::vector<unsigned>{5, 5, place}))};
+        std::vector<int> cells;
+        std::vector<float> heights;
+        Tin(*this).GetTriangle(place)->GetGridPoints(900, 90, cells, heights);
+        double sum = double(height) + 10.0 * double(crossing) + double(met.size() + cells.size());
+        for (const Surface& part : parts)
+            sum = 3.0 * sum + Summarise(part);
+        return sum;
+    }
+};
+
+/// A script with one triangle, whose first height is 5.
+struct ReaderTest : testing::Test {
+    ReaderTest() { script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})}; }
+
+    static Reader Open(double offset = 0.0, double scale = 1.0, int source = 2002) {
+        return Reader(kelm::tin::TinReaderFactory::CreateTinReader("some.file", 0, offset, scale,
+                                                                   DatumType(source)));
     }
     static Surface Load(TinReader& reader, const Window* window = nullptr) {
         return Surface(reader.Load(window));
     }
 
-    scripted::Script& script = scripted::NewScript();
+    scripted::Script script;
 };
