@@ -1,121 +1,77 @@
 #include "services/exception.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/aabbtree.h"
-#include "tin/tin.h"
+#include "services/reporting.h"
+#include "tests/support/sheets.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
-#include <gtest/gtest.h>
+#include <cpl_conv.h>
+#include <cpl_error.h>
 
-#include <cmath>
-#include <limits>
-#include <memory>
-
-using namespace kelm::tin;
-using kelm::DataException;
-using kelm::ogc::cs::DatumType;
-
-namespace {
+namespace kelm::tin::test {
 
 constexpr double NaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double FAR = std::numeric_limits<double>::max();
+using MapPoint = point2_t<double>;
 
-class BadArgumentsTest : public testing::Test {
-  protected:
-    static std::unique_ptr<Tin> CreateSurface() {
-        auto* vertices = new point3_t<float>[3] {
-            {0, 0, 1}, {8, 0, 2}, {
-                0, 8, 3
-            }
-        };
-        return std::make_unique<Tin>(vertices, 3, new Triangle_Id[1]{{0, 1, 2}}, 1, 10.0, 20.0);
-    }
-    static std::unique_ptr<TinReader> Open(const char* name, int layer = 1, double scale = 1.0,
-                                           int datum = 2002) {
+TEST(BadArguments, OfReadersAreRefused) {
+    const char* const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg";
+    const auto open = [](const char* name, int layer, double scale = 1, int datum = 2002) {
         return std::unique_ptr<TinReader>(
-            TinReaderFactory::CreateTinReader(name, layer, 0.0, scale, DatumType(datum)));
-    }
-};
-
-TEST_F(BadArgumentsTest, TheReaderRefusesNamesLayersAndNumbers) {
-    const kelm::test::TemporaryFolder folder;
-    kelm::test::LayerText text;
-    text.moGeometries = {kelm::test::MakeTriangle(0.0, 0.0, 5.0)};
-    const std::string path =
-        kelm::test::WriteLayer(folder.GetPath("good.geojson"), "GeoJSON", text);
-    for (const std::string& name : {std::string(), folder.GetPath(""), std::string(5000, 'x'),
-                                    std::string("%s%n%d"), std::string("/dev/null")})
-        EXPECT_THROW(Open(name.c_str()), DataException) << name;
-    EXPECT_THROW(Open(nullptr), DataException);
-    for (const int layer : {2, 1000000, std::numeric_limits<int>::max()})
-        EXPECT_THROW(Open(path.c_str(), layer), DataException) << layer;
-    EXPECT_NE(Open(path.c_str(), std::numeric_limits<int>::min()), nullptr) << "the first layer";
-    EXPECT_THROW(Open(path.c_str(), 1, 0.0), kelm::ParameterException);
-    for (const int datum : {-1, 0, 1999, 3000, std::numeric_limits<int>::max()})
-        EXPECT_THROW(Open(path.c_str(), 1, 1.0, datum), DataException) << datum;
-
-    const auto reader = Open(path.c_str());
-    EXPECT_THROW(reader->SetOutputVerticalDatum(DatumType(1000)), kelm::ParameterException);
-    for (const auto& [low, high] :
-         {std::pair{FAR, -FAR}, std::pair{NaN, 1.0}, std::pair{0.0, NaN}}) {
-        BBox<double, point2_t<double>> window;
-        window.min = {low, low};
-        window.max = {high, high};
-        EXPECT_EQ(std::unique_ptr<Tin>(reader->Load(&window)), nullptr);
-    }
-    EXPECT_NE(std::unique_ptr<Tin>(reader->Load(nullptr)), nullptr);
+            TinReaderFactory::CreateTinReader(name, layer, 0, scale, ogc::cs::DatumType(datum)));
+    };
+    for (const char* name : {"", "/", "%s%n", "/dev/null", static_cast<const char*>(nullptr)})
+        EXPECT_THROW(open(name, 1), DataException);
+    EXPECT_THROW(open(good, 2), DataException);
+    EXPECT_THROW(open(good, 1, 0), ParameterException);
+    EXPECT_THROW(open(good, 1, 1, 3000), DataException);
+    const auto reader = open(good, -9); // the first layer
+    EXPECT_THROW(reader->SetOutputVerticalDatum(ogc::cs::DatumType(1000)), ParameterException);
+    const auto window = MakeBox(MapPoint{NaN, FAR}, MapPoint{1, -FAR});
+    EXPECT_EQ(reader->Load(&window), nullptr);
 }
 
-TEST_F(BadArgumentsTest, SurfacesTrianglesAndTreesRefuseNull) {
-    point3_t<float> vertices[3] = {};
-    EXPECT_THROW(Tin(vertices, 3, static_cast<Triangle_Id*>(nullptr), 1, 0.0, 0.0), DataException);
-    EXPECT_THROW(AabbTree{nullptr}, kelm::ParameterException);
-    EXPECT_THROW(Triangle(nullptr), DataException);
-    Triangle triangle;
-    EXPECT_THROW(triangle.SetVertices(nullptr), DataException);
-    EXPECT_THROW(triangle.SetVertices(vertices, vertices, nullptr), DataException);
-    const auto surface = CreateSurface();
-    EXPECT_EQ(surface->GetVertex(3), nullptr);
-    EXPECT_EQ(surface->GetTriangle(std::numeric_limits<unsigned>::max()), nullptr);
-}
-
-TEST_F(BadArgumentsTest, QueriesOfNothingFindNothing) {
-    const auto surface = CreateSurface();
-    AabbTree tree(surface.get());
-    tree.SetCapacity(-5);
-    tree.CreateTree(surface.get());
-    const AabbTree rootless;
-    float height = 0.0F;
-    for (const AabbTree* index :
-         {static_cast<const AabbTree*>(nullptr), static_cast<const AabbTree*>(&tree), &rootless}) {
+TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
+    Mesh mesh;
+    mesh.Add({0, 0, 1}, {8, 0, 2}, {0, 8, 3});
+    const OpenTin tin = mesh.MakeTin(10, 20);
+    Triangle t = *tin.GetTriangle(0);
+    Triangle_Id ids[1] = {};
+    Point *const v = tin.GetVertex(0), *const hole[] = {v + 1, v, nullptr};
+    EXPECT_THROW(Tin(v, 3, static_cast<Triangle_Id*>(nullptr), 1, 0, 0), DataException);
+    EXPECT_THROW(Tin(nullptr, 3, ids, 1, 0, 0), DataException);
+    EXPECT_THROW(AabbTree{nullptr}, ParameterException);
+    EXPECT_THROW(Triangle{nullptr}, DataException);
+    EXPECT_THROW(t.SetVertices(hole), DataException);
+    EXPECT_TRUE(t.GetVertex(0) == v && tin.GetVertex(3) == nullptr && !tin.GetTriangle(~0U));
+    const AabbTree tree(&tin), rootless, *const indices[] = {nullptr, &tree, &rootless};
+    float h = UNTOUCHED;
+    for (const AabbTree* index : indices) {
         for (const double bad : {NaN, FAR, -FAR}) {
-            EXPECT_FALSE(surface->GetHeight(bad, 21.0, height, index));
-            EXPECT_FALSE(surface->GetHeight(11.0, bad, height, index));
-            BBox<double, point2_t<double>> region;
-            region.min = {bad, bad};
-            region.max = {-bad, bad};
+            EXPECT_FALSE(tin.GetHeight(bad, 21.0, h, index) || tin.GetHeight(11.0, bad, h, index));
+            const auto box = MakeBox(MapPoint{bad, bad}, MapPoint{-bad, bad});
+            const std::unique_ptr<Tin> subset(tin.SubsetByRegion(box, index));
             // Without an index a NaN leaves its side of the region open.
-            const std::unique_ptr<Tin> subset(surface->SubsetByRegion(region, index));
             EXPECT_TRUE(subset == nullptr || (std::isnan(bad) && index == nullptr));
         }
-        for (const unsigned count : {0U, 1U, 2U}) {
-            EXPECT_EQ(
-                surface->SubsetByLineString(static_cast<point2_t<double>*>(nullptr), count, index),
-                nullptr);
-            EXPECT_EQ(
-                surface->SubsetByLineString(static_cast<point2_t<float>*>(nullptr), count, index),
-                nullptr);
-        }
+        EXPECT_EQ(tin.SubsetByLineString(static_cast<MapPoint*>(nullptr), 2, index), nullptr);
+        EXPECT_EQ(tin.SubsetByLineString(static_cast<Point2*>(nullptr), 2, index), nullptr);
     }
-    EXPECT_FALSE(surface->GetHeight(11.0, 21.0, height, &rootless));
-    std::vector<int> cells;
-    std::vector<float> heights;
-    for (const int size : {0, -1, std::numeric_limits<int>::min()}) {
-        EXPECT_EQ(surface->GetTriangle(0)->GetGridPoints(size, 9, cells, heights), 0U);
-        EXPECT_EQ(surface->GetTriangle(0)->GetGridPointsNum(9, size), 0U);
-    }
-    EXPECT_GT(EstimateAabbTreeBytes(std::numeric_limits<unsigned>::max()), 0U);
+    EXPECT_TRUE(h == UNTOUCHED && !tin.GetHeight(11.0, 21.0, h, &rootless));
+    EXPECT_EQ(t.GetGridPointsNum(9, 0) + t.GetGridPointsNum(-9, 9), 0U);
 }
 
-} // namespace
+TEST(BadArguments, ATextForTheHostIsNoFormat) {
+    static std::string last;
+    const std::string text = FormatString("%d %s%%s%%n", 7, std::string(20000, 'x').c_str());
+    EXPECT_EQ(text, "7 " + std::string(20000, 'x') + "%s%n");
+    CPLPushErrorHandler([](CPLErr, int, const char* pszText) { last = pszText; });
+    CPLSetThreadLocalConfigOption("CPL_DEBUG", "TIN");
+    tellus::Warning::Warn(text, "tin/tinreader", 12);
+    EXPECT_EQ(last, text + " (tin/tinreader:12)");
+    tellus::Report::AddInfo(text);
+    EXPECT_EQ(last, "TIN: " + text);
+    CPLSetThreadLocalConfigOption("CPL_DEBUG", nullptr);
+    CPLPopErrorHandler();
+}
+
+} // namespace kelm::tin::test

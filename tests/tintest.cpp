@@ -1,76 +1,158 @@
-#include "services/exception.h"
 #include "tests/support/sheets.h"
+#include "tin/ray2.h"
+
+#include <cstring>
+#include <omp.h>
+#include <set>
 
 namespace kelm::tin::test {
+namespace {
+
+std::size_t CountMissing(const Indices& list, const Indices& wanted) {
+    return static_cast<std::size_t>(std::count_if(wanted.begin(), wanted.end(), [&](unsigned i) {
+        return !std::binary_search(list.begin(), list.end(), i);
+    }));
+}
+
+/// Compares the searches for a segment, for the next float from its start and for the region that
+/// it spans with a loop over all triangles. @return how many line and region miss with the tree
+std::size_t ExpectFound(const OpenTin& tin, const AabbTree& tree, const Point& a, const Point& b) {
+    const Point2 p{a.x, a.y}, q{b.x, b.y}, at{std::nextafter(a.x, b.x), std::nextafter(a.y, b.y)};
+    const Box region = MakeBox(Point2{std::min(p.x, q.x), std::min(p.y, q.y)},
+                               Point2{std::max(p.x, q.x), std::max(p.y, q.y)});
+    Indices held, touched, met;
+    float h, height = TestInside(tin.GetBBox(), at.x, at.y) ? LOWEST : UNTOUCHED;
+    float crossing = IsIntersectedBBox(tin.GetBBox(), a, b) ? LOWEST : UNTOUCHED;
+    for (const unsigned i : tin.GetAll()) {
+        const Triangle& t = *tin.GetTriangle(i);
+        const bool holds = t.IsPointInside(at.x, at.y);
+        const bool isTouched = t.IsIntersectedLine(p.x, p.y, q.x, q.y);
+        held.insert(held.end(), holds, i);
+        touched.insert(touched.end(), isTouched, i);
+        met.insert(met.end(), t.IsIntersected(region), i);
+        if (holds && t.GetHeight(at.x, at.y, h) && h > height)
+            height = h;
+        if (isTouched && t.GetLineIntersectHeight(a, b, h) == IR_Inside && h > crossing)
+            crossing = h;
+    }
+    Indices byPoint[2], byLine[2], byRegion[2];
+    for (const int k : {0, 1}) {
+        const AabbTree* index = k == 0 ? nullptr : &tree;
+        tin.FindTrianglesByPoint(at.x, at.y, byPoint[k], index);
+        tin.FindTrianglesByLine(a, b, byLine[k], index);
+        tin.FindTrianglesByRegion(region, byRegion[k], index);
+        const bool isFound = tin.GetHeight(at.x, at.y, h = UNTOUCHED, index);
+        EXPECT_TRUE(h == height && isFound == (h != LOWEST && h != UNTOUCHED));
+        const bool isCrossed = tin.GetLineIntersectHeight(a, b, h = UNTOUCHED, index);
+        EXPECT_EQ(isCrossed, h != LOWEST && h != UNTOUCHED);
+        EXPECT_TRUE(h == crossing || byLine[k].size() < touched.size());
+    }
+    EXPECT_TRUE(byPoint[0] == held && byLine[0] == touched && byRegion[0] == met);
+    for (Indices* list : {&byPoint[1], &byLine[1], &byRegion[1]})
+        std::sort(list->begin(), list->end());
+    EXPECT_TRUE(byPoint[1] == held && CountMissing(touched, byLine[1]) == 0);
+    return CountMissing(byLine[1], touched) + CountMissing(byRegion[1], met);
+}
+
+/// Compares a subset, and releases it, with the triangles of a list.
+void ExpectSubset(const Mesh& mesh, const Indices& list, const Tin* poSubset) {
+    const std::unique_ptr<const Tin> subset(poSubset);
+    ASSERT_EQ(subset == nullptr, list.empty());
+    if (list.empty())
+        return;
+    std::set<unsigned> used;
+    for (const unsigned i : list)
+        used.insert({mesh.ids[i].id0, mesh.ids[i].id1, mesh.ids[i].id2});
+    ASSERT_EQ(subset->GetVertexCount(), used.size());
+    for (unsigned k = 0; k < list.size(); ++k) {
+        const Triangle_Id& t = mesh.ids[list[k]];
+        for (const auto& [i, id] : {std::pair(0, t.id0), {1, t.id1}, {2, t.id2}}) {
+            const Point* corner = subset->GetTriangle(k)->GetVertex(i);
+            ASSERT_EQ(corner - subset->GetVertex(0), std::distance(used.begin(), used.find(id)));
+            ASSERT_EQ(std::memcmp(corner, &mesh.vertices[id], sizeof *corner), 0);
+        }
+    }
+}
+
+TEST(TinSearch, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
+    Random random;
+    std::size_t missed = 0;
+    for (const int nThreads : {1, 2, 8})
+        for (const Mesh& mesh : MakeMeshes(random)) {
+            omp_set_num_threads(nThreads);
+            const OpenTin tin = mesh.MakeTin();
+            omp_set_num_threads(nThreads % 3 + 1); // raised, too
+            const AabbTree tree(&tin);
+            const auto position = [&] { // often a vertex, or on an edge
+                const Point& v = *tin.GetVertex(random.Below(tin.GetVertexCount()));
+                const float steps[] = {0, 0, 5, random.Between(-12, 12)};
+                return Point{v.x + steps[random.Below(4)], v.y + steps[random.Below(4)], v.z};
+            };
+            for (int i = 0; i < 2000 / nThreads && !testing::Test::HasFailure(); ++i) {
+                const Point a = position(), b = position();
+                const Point ends[] = {{b.x, b.y, a.z}, {a.x, b.y, 9}, {a.x, a.y, a.z - 30}};
+                missed += ExpectFound(tin, tree, a, ends[random.Below(3)]);
+            }
+        }
+    EXPECT_LT(missed, 300U); // a box test may lose what ends at the rim of a box
+}
+
+TEST(TinSubset, RenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
+    Random random;
+    for (const Mesh& mesh : MakeMeshes(random))
+        for (unsigned i = 0; i < 20; ++i) {
+            const OpenTin tin = mesh.MakeTin(500, -3);
+            const AabbTree tree(&tin), *const index = i % 2 == 0 ? &tree : nullptr;
+            Indices list, selected, line, met;
+            std::vector<unsigned char> mask;
+            for (const unsigned id : tin.GetAll()) {
+                list.push_back(random.Below(tin.GetTriangleCount())); // repeats too
+                mask.push_back(static_cast<unsigned char>(list[id] % 3));
+                selected.insert(selected.end(), mask[id] == 1, id);
+            }
+            ExpectSubset(mesh, list, tin.Subset(list));
+            ExpectSubset(mesh, selected, tin.Subset(mask));
+            std::vector<Point2> local;
+            std::vector<point2_t<double>> map;
+            for (unsigned k = 0; k < 2 + i % 5; ++k) { // whole, so that both frames hold them
+                const unsigned x = random.Below(120), y = random.Below(120);
+                local.push_back({static_cast<float>(x), static_cast<float>(y)});
+                map.push_back({x + 500.0, y - 3.0});
+                if (k > 0) // a scan appends
+                    tin.FindTrianglesByLine(local[k - 1], local[k], line, nullptr);
+            }
+            const std::set<unsigned> once(line.begin(), line.end());
+            ExpectSubset(mesh, {once.begin(), once.end()},
+                         tin.SubsetByLineString(map.data(), 2 + i % 5, index));
+            tin.FindTrianglesByRegion(MakeBox(local[0], local[1]), met, index);
+            ExpectSubset(mesh, met, tin.SubsetByRegion(MakeBox(map[0], map[1]), index));
+        }
+}
 
 // Leaks and double releases show under the address sanitizer.
-
-TEST(Tin, IsEmptyAndTakesNothingOverIfACountIsZero) {
+TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     Point vertices[3] = {{1, 2, 3}, {4, 5, 6}, {7, 9, 9}};
     Triangle triangle;
     for (const unsigned n : {0U, 1U}) {
         const Tin tin(vertices, 3 * n, new Triangle_Id[1]{{0, 1, 2}}, 1 - n, 10.5, 20);
         const Tin ready(vertices, 3 * n, &triangle, 1 - n, 10.5, 20);
-        double x, y;
-        ready.GetXYBase(x, y);
-        EXPECT_TRUE(x == 10.5 && y == 20 && ready.GetObjBytes() == 88 && tin.GetObjBytes() == 88);
-        EXPECT_TRUE(tin.GetVertex(0) == nullptr && ready.GetTriangle(0) == nullptr);
-        EXPECT_TRUE(tin.GetBBox().min.x == 0 && tin.GetBBox().max.y == 0);
+        EXPECT_TRUE(ready.GetObjBytes() == 88 && tin.GetObjBytes() == 88);
+        EXPECT_TRUE(tin.GetVertex(0) == nullptr && tin.GetBBox().max.y == 0);
     }
-    Triangle_Id ids[1] = {};
-    EXPECT_THROW(Tin(nullptr, 3, ids, 1, 0, 0), DataException);
-}
-
-TEST(Tin, MakesTheTrianglesOfTheTriples) {
-    for (const unsigned count : {1U, 1000U, 1001U, 5000U}) {
-        Mesh mesh;
-        for (unsigned i = 0; i < count + 2; ++i)
-            mesh.vertices.push_back({0, static_cast<float>(i), 0});
-        for (unsigned i = 0; i < count; ++i)
-            mesh.ids.push_back({i + 2, i, i + 1});
-        OpenTin tin = mesh.MakeTin();
-        EXPECT_EQ(tin.GetTriangle(count - 1)->GetBBox().max.y, static_cast<float>(count + 1));
-        for (unsigned i = 0; i < count + 2; ++i)
-            tin.GetVertex(i)->y += 10;
-        tin.ComputeTriBBox();
-        for (unsigned i = 0; i < count; ++i) {
-            Point* corners[3];
-            tin.GetTriangle(i)->GetVertexList(corners);
-            ASSERT_TRUE(corners[0] == tin.GetVertex(i + 2) && corners[1] == corners[0] - 2 &&
-                        corners[2] == corners[0] - 1);
-            ASSERT_EQ(tin.GetTriangle(i)->GetBBox().max.y, static_cast<float>(i + 12));
-        }
-        EXPECT_TRUE(tin.GetVertex(count + 2) == nullptr && tin.GetTriangle(count) == nullptr);
-        EXPECT_EQ(tin.GetObjBytes(), 12 * (count + 2) + 48 * count + 88);
-    }
-    EXPECT_EQ(Tin::EstimateObjBytes(4000000000, 4000000000), 240000000088U);
-}
-
-TEST(Tin, BoxOfAllVerticesInBothFrames) {
     Mesh mesh;
     mesh.Add({3, 7, NOT_A_NUMBER}, {NOT_A_NUMBER, 2, -3}, {1.5F, NOT_A_NUMBER, 8});
     mesh.vertices.push_back({2, 50, 4}); // no triangle uses it
-    OpenTin tin = mesh.MakeTin(100000000.25, -0.5);
-    tin.SetHeightRange(tin.GetBBox().max.z, tin.GetBBox().min.z);
+    OpenTin tin = mesh.MakeTin(100000000.25, -0.5), copy(tin);
     BBox<double, point3_t<double>> box;
     tin.GetRawBBox(box);
-    EXPECT_TRUE(box.min.x == 100000001.75 && box.min.y == 1.5 && box.min.z == 8);
-    EXPECT_TRUE(box.max.x == 100000003.25 && box.max.y == 49.5 && box.max.z == -3);
+    EXPECT_TRUE(box.min.x == 100000001.75 && box.min.y == 1.5 && box.min.z == -3);
+    EXPECT_TRUE(box.max.x == 100000003.25 && box.max.y == 49.5 && box.max.z == 8);
+    tin = copy; // goes on owning
+    EXPECT_TRUE(copy.GetVertex(3) == tin.GetVertex(3) && tin.GetObjBytes() == 4 * 12 + 48 + 88);
+    const OpenTin other = mesh.MakeTin();
+    tin = other; // releases its own
+    EXPECT_EQ(tin.GetTriangle(0), other.GetTriangle(0));
 }
 
-TEST(Tin, CopiesShowTheSameArraysAndReleaseNothing) {
-    Random random;
-    OpenTin first = MakeSheet(2, 0, random).MakeTin(), second = MakeSheet(2, 0, random).MakeTin();
-    {
-        OpenTin copy(first);
-        EXPECT_EQ(copy.GetTriangle(3), first.GetTriangle(3));
-        first = copy; // goes on owning
-        copy = second;
-        EXPECT_EQ(copy.GetVertex(1), second.GetVertex(1));
-    }
-    EXPECT_EQ(first.GetVertex(8)->x, 20);
-    first = second; // releases its own
-    EXPECT_EQ(first.GetTriangle(0), second.GetTriangle(0));
-}
-
+} // namespace
 } // namespace kelm::tin::test

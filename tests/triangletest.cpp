@@ -1,139 +1,143 @@
-#include "services/exception.h"
-#include "tests/support/model.h"
 #include "tests/support/sheets.h"
-#include "tin/ray2.h"
 #include "tin/vector3.h"
 
-#include <cmath>
-
 namespace kelm::tin::test {
-
 namespace {
 
-/// Legs of 4 along both axes from the origin, heights 10, 20 and 30.
-class RightTriangle : public testing::Test {
-  protected:
-    RightTriangle() { triangle.SetVertices(&v[0], &v[1], &v[2]); }
-    Point v[3] = {{0, 0, 10}, {4, 0, 20}, {0, 4, 30}};
-    Triangle triangle;
+using Corners = std::vector<Point>;
+
+struct OwnTriangle : Triangle {
+    using Triangle::GetGridPointIdx;
+    explicit OwnTriangle(const Corners& v) : corners(v) {
+        SetVertices(&corners[0], &corners[1], &corners[2]);
+    }
+    Corners corners;
 };
 
-bool IsSame(float a, float b) {
-    return a == b && std::signbit(a) == std::signbit(b);
+/// Twice the area that three points span in plan. All oracles are exact for quarters.
+float GetArea(const Point& a, const Point& b, const Point& c) {
+    return (b.x - a.x) * (c.y - a.y) - (b.y - a.y) * (c.x - a.x);
 }
 
-/// Whole numbers so small that edges and triangles without area are met, a large square, or a place
-/// far from the origin.
-Point MakePoint(Random& random, unsigned kind) {
-    const auto digit = [&] { return static_cast<float>(random.Below(5)); };
-    const auto wide = [&] { return random.Between(kind == 1 ? -4410.0F : 4400.0F, 4410.0F); };
-    return kind == 0 ? Point{digit(), digit(), digit()} : Point{wide(), wide(), wide() / 99};
+/// Do two convex polygons, segments or points share a point in plan? By separating lines.
+bool IsMet(const Corners& v, const Corners& w) {
+    std::vector<std::pair<Point, Point>> lines = {{{}, {1, 0, 0}}, {{}, {0, 1, 0}}};
+    for (const Corners& c : {v, w})
+        for (std::size_t i = 0; i < c.size(); ++i)
+            lines.emplace_back(c[i], c[(i + 1) % c.size()]);
+    return std::none_of(lines.begin(), lines.end(), [&](const auto& line) {
+        const auto isLess = [&](const Point& p, const Point& q) {
+            return GetArea(line.first, line.second, p) < GetArea(line.first, line.second, q);
+        };
+        const auto [lowV, highV] = std::minmax_element(v.begin(), v.end(), isLess);
+        const auto [lowW, highW] = std::minmax_element(w.begin(), w.end(), isLess);
+        return isLess(*highV, *lowW) || isLess(*highW, *lowV);
+    });
+}
+
+TEST(Triangle, JudgesAsExactArithmeticDoes) {
+    Random random;
+    const auto digit = [&] { return static_cast<float>(random.Below(6)); };
+    const auto part = [&] { return static_cast<float>(random.Below(7)) / 4 - 0.25F; };
+    const auto make = [&] { return Point{digit(), digit(), digit()}; };
+    const auto move = [](const Point& p, float by, const Point& d) {
+        return Point{p.x + by * d.x, p.y + by * d.y, p.z + by * d.z};
+    };
+    for (int i = 0; i < 60000; ++i) {
+        const Point o = move(make(), 99, {0, 0, 1}), d1 = make(), d2 = make(), d = make();
+        const OwnTriangle t({o, move(o, 1, d1), move(o, -1, d2)}), other({make(), make(), make()});
+        const Corners &v = t.corners, &w = other.corners;
+        const float l1 = part(), l2 = part(), at = part();
+        const Point p = move(move(o, l1, d1), -l2, d2), q = move(move(o, part(), d1), -part(), d2);
+        const bool isInside = l1 >= 0 && l2 >= 0 && l1 + l2 <= 1;
+        // The segment along d meets the plane at p, after a part of its length.
+        const bool isReached = (Vector3(d1) ^ Vector3(d2)) * Vector3(d) != 0 && at >= 0 && at <= 1;
+        float h = UNTOUCHED;
+        const auto relation = isInside ? IR_Inside : IR_Outside;
+        ASSERT_EQ(t.GetLineIntersectHeight(move(p, -at, d), move(p, 1 - at, d), h),
+                  isReached ? relation : IR_Disjoint);
+        ASSERT_EQ(h, isReached && isInside ? p.z : UNTOUCHED);
+        const bool isFlat = GetArea(v[0], v[1], v[2]) == 0, holds = isInside && !isFlat;
+        ASSERT_EQ(t.GetHeight(p.x, p.y, h = UNTOUCHED), holds);
+        ASSERT_EQ(h, holds ? p.z : UNTOUCHED);
+        ASSERT_EQ(t.IsPointInside(p.x, p.y), holds);
+        if (isFlat || GetArea(w[0], w[1], w[2]) == 0)
+            continue;
+        ASSERT_EQ(t.IsIntersectedLine(p.x, p.y, q.x, q.y), IsMet(v, {p, q}));
+        ASSERT_EQ(t.IsIntersected(other), IsMet(v, w));
+        // Slabs divide by the steps of an edge, which is exact for powers of two.
+        const Point b = move(o, std::exp2(digit()), {1, 0, 0}), c = move(o, -4, {0, 1, 0});
+        const Box box = MakeBox(Point2{w[0].x, w[0].y}, Point2{w[1].x, w[1].y});
+        const Corners rim = {w[0], {w[1].x, w[0].y, 0}, w[1], {w[0].x, w[1].y, 0}};
+        const bool meetsEdge = IsMet(rim, {o, b}) || IsMet(rim, {b, c}) || IsMet(rim, {c, o});
+        ASSERT_EQ(OwnTriangle({o, b, c}).IsIntersected(box),
+                  w[0].x <= w[1].x && w[0].y <= w[1].y && meetsEdge);
+    }
+}
+
+TEST(Triangle, SumsInItsOrderAndLetsNotANumberPass) {
+    float h;
+    const OwnTriangle steep({{0, 0, 0x1p60F}, {4, 0, -0x1p60F}, {0, 4, 1}});
+    EXPECT_TRUE(steep.GetHeight(1, 2, h) && h == 0.5F); // the third term last
+    const OwnTriangle far({{0x1p24F, 0x1p24F, 0}, {1, 1, 0}, {-0x1p24F, -0x1p24F, 0}});
+    EXPECT_TRUE(far.GetCenterAt(AX_X) == 0 && far.GetCenterAt(AX_Y) == 0);
+    EXPECT_EQ(Vector3(1e16, -1e16, 1) * Vector3(1, 1, 1), 1); // the z term last
+    const OwnTriangle low({{0, 0, -1}, {4, 0, -1}, {0, 4, -1}});
+    // 2^24 + 1 is no float: the difference is 2^24, and the segment's end counts as 0.
+    EXPECT_TRUE(low.GetLineIntersectHeight({1, 1, 0x1p24F}, {1, 1, -1}, h) == IR_Inside && h == 0);
+    EXPECT_EQ(low.GetLineIntersectHeight({1, 1, NOT_A_NUMBER}, {1, 1, 0}, h), IR_Inside);
+    // So little below the edge that the weights do not show it; the box does.
+    EXPECT_TRUE(low.IsPointInsideLT(2, -1e-45F) && !low.IsPointInside(2, -1e-45F));
+    EXPECT_TRUE(low.GetHeight(NOT_A_NUMBER, 1, h) && !low.IsPointInside(NOT_A_NUMBER, 1));
+    const OwnTriangle huge({{-3e9F, -3e9F, 0}, {3e9F, -3e9F, 0}, {0, 3e9F, 0}}); // beyond any int
+    EXPECT_EQ(huge.GetGridPointsNum(4, 4), 16U);
+}
+
+TEST(TriangleGrid, ListsTheCellsThatExactArithmeticFinds) {
+    Random random;
+    for (int i = 0; i < 20000; ++i) {
+        const auto quarter = [&] { return static_cast<float>(random.Below(64)) / 4 - 3; };
+        const auto make = [&] { return Point{quarter(), quarter(), quarter()}; };
+        const OwnTriangle t({make(), make(), make()});
+        const int cols = static_cast<int>(random.Below(14)) - 1, rows = 11 - cols;
+        const Box& box = t.GetBBox();
+        const bool isOneColumn = std::max(0.0F, std::ceil(box.min.x)) ==
+                                 std::min(static_cast<float>(cols - 1), std::floor(box.max.x));
+        std::vector<int> expected, confirmed, cells; // column and row in turn
+        std::vector<float> expectedHeights, heights;
+        for (int row = 0; row < rows; ++row)
+            for (int col = 0; col < cols; ++col) {
+                const Point p{static_cast<float>(col), static_cast<float>(row), 0};
+                float h;
+                const bool isInside = t.GetHeight(p.x, p.y, h);
+                // The row of the lowest corner is left out, but not in an extent of one column.
+                if (isOneColumn ? !isInside : p.y <= box.min.y || !IsMet(t.corners, {p}))
+                    continue;
+                expected.insert(expected.end(), {col, row});
+                if (!isInside)
+                    continue;
+                confirmed.insert(confirmed.end(), {col, row});
+                expectedHeights.push_back(h);
+            }
+        ASSERT_EQ(t.GetGridPoints(cols, rows, cells, heights), expectedHeights.size());
+        ASSERT_TRUE(cells == confirmed && heights == expectedHeights) << i;
+        cells.resize(2 * t.GetGridPointsNum(cols, rows));
+        t.GetGridPointsCR(cells.data(), cols, rows);
+        ASSERT_EQ(cells, expected) << i;
+    }
+}
+
+TEST(TriangleGrid, ThreadsMarkOneGrid) {
+    const OwnTriangle triangle({{0, 0, 0}, {4, 0, 0}, {0, 4, 0}});
+    unsigned counts[64] = {};
+    int sums[64] = {}; // in another cache line
+#pragma omp parallel for num_threads(4)
+    for (int i = 0; i < 4000000; ++i) {
+        double bary[3];
+        triangle.GetGridPointIdx(1, 2, 5, 7, counts, sums, bary);
+    }
+    EXPECT_TRUE(counts[11] == 4000000 && sums[11] == 28000000);
 }
 
 } // namespace
-
-TEST_F(RightTriangle, BoundsAreInclusiveAndNotANumberPassesThem) {
-    float h = UNTOUCHED;
-    EXPECT_FALSE(triangle.GetHeight(3, 3, h));
-    EXPECT_EQ(triangle.GetLineIntersectHeight({0, 0, 20}, {2, 2, 40}, h), IR_Disjoint);
-    EXPECT_EQ(triangle.GetLineIntersectHeight({5, 5, 99}, {5, 5, 0}, h), IR_Outside);
-    EXPECT_EQ(h, UNTOUCHED);
-    for (const Point& p : v)
-        EXPECT_TRUE(triangle.GetHeight(p.x, p.y, h) && h == p.z);
-    EXPECT_FALSE(triangle.IsPointInsideLT(2, std::nextafter(2.0F, 3.0F)));
-    // So little below the edge that the weights do not show it; the box does.
-    EXPECT_TRUE(triangle.IsPointInsideLT(2, -1e-45F) && !triangle.IsPointInside(2, -1e-45F));
-    EXPECT_FALSE(triangle.IsPointInside(NOT_A_NUMBER, 1));
-    EXPECT_TRUE(triangle.GetHeight(NOT_A_NUMBER, 1, h) && std::isnan(h));
-    EXPECT_EQ(triangle.GetLineIntersectHeight({1, 1, NOT_A_NUMBER}, {1, 1, 0}, h = 0), IR_Inside);
-    EXPECT_TRUE(std::isnan(h));
-    Point* list[3] = {&v[2], &v[1], nullptr};
-    EXPECT_THROW(Triangle{list}, DataException);
-    EXPECT_THROW(triangle.SetVertices(list), DataException);
-    EXPECT_EQ(triangle.GetVertex(0), &v[0]);
-}
-
-TEST_F(RightTriangle, MeetsBoxesByItsEdgesAndTrianglesInPlan) {
-    const auto meetsBox = [&](float left, float right, float bottom, float top) {
-        Box box;
-        box.min = {left, bottom};
-        box.max = {right, top};
-        return triangle.IsIntersected(box);
-    };
-    EXPECT_TRUE(meetsBox(1, 2, -1, 0) && meetsBox(2, 3, 2, 3) && meetsBox(-1, 0, 1, 2));
-    EXPECT_FALSE(meetsBox(0.5F, 1, 0.5F, 1) || meetsBox(3, 4, 3, 4) || meetsBox(5, -1, 5, -1));
-    const auto meets = [&](Point a, Point b, Point c) {
-        Triangle other;
-        other.SetVertices(&a, &b, &c);
-        return triangle.IsIntersected(other) + other.IsIntersected(triangle);
-    };
-    EXPECT_EQ(meets(v[0], v[1], v[2]) + meets({4, 0, 0}, {9, 1, 0}, {9, 9, 0}), 4);
-    EXPECT_EQ(meets({1, 1, 0}, {2, 1, 0}, {1, 2, 0}) + meets({-1, 3, 0}, {3, 3, 0}, {-1, 4, 0}), 4);
-    EXPECT_EQ(meets({3, 3, 0}, {9, 1, 0}, {9, 9, 0}), 0);
-}
-
-TEST(Triangle, EveryStepIsRoundedAsWritten) {
-    Random random;
-    unsigned inside = 0, crossed = 0, touched = 0;
-    for (unsigned i = 0; i < 150000; ++i) {
-        const auto make = [&] { return MakePoint(random, i % 3); };
-        model::Corners c = {make(), make(), make()};
-        Point a = make(), b = make();
-        if (i % 2 == 0) // near an edge
-            a = {(c[0].x + c[1].x) / 2, (c[0].y + c[1].y) / 2, a.z};
-        if (i % 4 == 0) // on level 0 each step shows
-            c[0].z = c[1].z = c[2].z = 0;
-        Triangle t;
-        t.SetVertices(&c[0], &c[1], &c[2]);
-        const auto height = model::GetHeight(c, a.x, a.y);
-        float h = UNTOUCHED;
-        ASSERT_EQ(t.GetHeight(a.x, a.y, h), height.has_value()) << i;
-        ASSERT_TRUE(IsSame(h, height.value_or(UNTOUCHED))) << i;
-        const model::F x = (model::F(c[0].x) + c[1].x) + c[2].x;
-        const model::F y = (model::F(c[0].y) + c[1].y) + c[2].y;
-        ASSERT_TRUE(IsSame(static_cast<float>(t.GetCenterAt(AX_X)), (x / 3.0F).v)) << i;
-        ASSERT_TRUE(IsSame(static_cast<float>(t.GetCenterAt(AX_Y)), (y / 3.0F).v)) << i;
-        float crossing = UNTOUCHED;
-        const IntersectRelation relation = model::GetCrossing(c, a, b, crossing);
-        ASSERT_EQ(t.GetLineIntersectHeight(a, b, h = UNTOUCHED), relation) << i;
-        ASSERT_TRUE(IsSame(h, crossing)) << i;
-        const bool touches = model::TestLine(c, a, b);
-        ASSERT_EQ(t.IsIntersectedLine(a.x, a.y, b.x, b.y), touches) << i;
-        inside += height.has_value();
-        crossed += relation == IR_Inside;
-        touched += touches;
-    }
-    EXPECT_GT(std::min({inside, crossed, touched}), 9999U);
-}
-
-TEST(Ray2, SlabsOfSegmentsAndBoxes) {
-    const Ray2<float> ray(Point{1, 2, 9}, Point{-0.0F, 4, 9});
-    EXPECT_TRUE(ray.GetSign(0) == 1 && ray.GetSign(1) == 0 && ray.GetDirInv().y == 0.25F);
-    BBox<float, Point> box, inverted;
-    box.max = inverted.min = {4, 4, 0};
-    Box flat;
-    flat.max = {4, 4};
-    const auto meets = [&](float x1, float y1, float x2, float y2) {
-        const Point a{x1, y1, 50}, b{x2, y2, 60};
-        const bool result = IsIntersectedBBox(box, a, b);
-        EXPECT_TRUE(IsIntersectedBBox(flat, b, a) == result && !IsIntersectedBBox(inverted, a, b));
-        return result && IsIntersectedBBox(flat, Point2{x1, y1}, Point2{x2, y2});
-    };
-    EXPECT_TRUE(meets(2, 2, 2, 2) && meets(4, 4, 4, 4) && meets(1, 1, 3, 2));   // points, within
-    EXPECT_TRUE(meets(0, -1, 0, 5) && meets(-1, 4, 5, 4) && meets(4, 1, 4, 3)); // along a side
-    EXPECT_TRUE(meets(-1, 1, 1, -1) && meets(-1, 2, 0, 2));                     // touching
-    EXPECT_FALSE(meets(5, 2, 5, 2) || meets(-1, 0, -1, 4) || meets(0, 4.001F, 4, 4.001F));
-    EXPECT_FALSE(meets(-3, 2, -1, 2) || meets(5, 2, 7, 2) || meets(-1, 0.5F, 1, -1));
-    EXPECT_FALSE(meets(4, -3, 4, -1) || meets(0, -3, 0, -1)); // in line with a side
-}
-
-TEST(Vector3, OrderOfSumsAndScaling) {
-    EXPECT_EQ(Vector3(1e16, -1e16, 1) * Vector3(1, 1, 1), 1.0); // the z term last
-    EXPECT_TRUE(std::isinf(Vector3(1e200, 0, 0).Length()) && std::signbit((-Vector3(0, 0, 0)).x));
-    Vector3 v(0, 0, 49), tiny(1e-310, 0, 0);
-    v.Normalize();
-    tiny.Normalize();
-    EXPECT_TRUE(v.z < 1.0 && tiny.x == 1e-310); // by the reciprocal; not at all
-}
-
 } // namespace kelm::tin::test

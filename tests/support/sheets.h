@@ -4,9 +4,12 @@
 #include "tin/tin.h"
 
 #include <algorithm>
+#include <cmath>
+#include <cstdlib>
 #include <gtest/gtest.h>
 #include <limits>
-#include <memory>
+#include <numeric>
+#include <random>
 
 namespace kelm::tin::test {
 
@@ -17,68 +20,87 @@ using Indices = std::vector<unsigned>;
 
 constexpr float LOWEST = -std::numeric_limits<float>::max();
 constexpr float NOT_A_NUMBER = std::numeric_limits<float>::quiet_NaN();
-constexpr float UNTOUCHED = -7.0F;
+constexpr float UNTOUCHED = -7;
 
-/// Linear congruential generator (Knuth, The Art of Computer Programming, volume 2, section 3.3.4).
+template <typename P>
+auto MakeBox(const P& low, const P& high) {
+    BBox<decltype(P::x), P> box;
+    box.min = low;
+    box.max = high;
+    return box;
+}
+inline const Box EVERYWHERE = MakeBox(Point2{LOWEST, LOWEST}, Point2{-LOWEST, -LOWEST});
+
 /// Each failure prints the seed, which TIN_TEST_SEED changes.
-class Random {
-  public:
-    Random();
+struct Random {
     /// @return an integer from 0 to n - 1
-    unsigned Below(unsigned n);
-    float Between(float low, float high);
-
-  private:
-    std::uint64_t mnState;
-    testing::ScopedTrace moTrace;
+    unsigned Below(std::size_t n) { return static_cast<unsigned>(moEngine() % n); }
+    float Between(float low, float high) {
+        return low + (high - low) * (static_cast<float>(moEngine()) * 0x1p-32F);
+    }
+    const char* mpszSeed = std::getenv("TIN_TEST_SEED");
+    std::mt19937 moEngine{mpszSeed == nullptr ? 1U : static_cast<unsigned>(std::atoi(mpszSeed))};
+    testing::ScopedTrace moTrace{__FILE__, __LINE__, mpszSeed == nullptr ? "seed 1" : mpszSeed};
 };
 
 struct OpenTin : Tin {
-    using Tin::FindTrianglesByLine;
-    using Tin::FindTrianglesByPoint;
-    using Tin::FindTrianglesByRegion;
-    using Tin::Subset;
-    using Tin::Tin;
-    Indices GetAll() const;
+    using Tin::FindTrianglesByLine, Tin::FindTrianglesByPoint, Tin::FindTrianglesByRegion;
+    using Tin::Subset, Tin::Tin;
+    Indices GetAll() const {
+        Indices all(GetTriangleCount());
+        std::iota(all.begin(), all.end(), 0U);
+        return all;
+    }
 };
 
-/// What a surface is made from.
 struct Mesh {
     std::vector<Point> vertices;
     std::vector<Triangle_Id> ids;
     /// Adds a triangle with vertices of its own.
-    void Add(const Point& a, const Point& b, const Point& c);
-    OpenTin MakeTin(double dfXBase = 0, double dfYBase = 0) const;
+    void Add(const Point& a, const Point& b, const Point& c) {
+        const auto first = static_cast<unsigned>(vertices.size());
+        vertices.insert(vertices.end(), {a, b, c});
+        ids.push_back({first, first + 1, first + 2});
+    }
+    OpenTin MakeTin(double dfXBase = 0, double dfYBase = 0) const {
+        auto* points = new Point[vertices.size()];
+        std::copy(vertices.begin(), vertices.end(), points);
+        auto* triples = new Triangle_Id[ids.size()];
+        std::copy(ids.begin(), ids.end(), triples);
+        return OpenTin(points, static_cast<unsigned>(vertices.size()), triples,
+                       static_cast<unsigned>(ids.size()), dfXBase, dfYBase);
+    }
 };
 
-/// cells by cells squares of 10 by 10, two triangles each; each node moves by up to fJitter.
-Mesh MakeSheet(unsigned cells, float fJitter, Random& random);
-/// One triangle; a regular sheet; a jittered one; one with holes, repeats, walls, points, slivers,
-/// a second sheet, a large triangle over all and a NaN height.
-std::vector<Mesh> MakeMeshes(Random& random);
-/// A vertex, the nearest float to a point of an edge, a step beside a vertex, a whole number, or
-/// any position in the box and a margin.
-Point2 MakePosition(const Tin& tin, Random& random);
-
-/// The triangles of a list that pass a test, in its order.
-template <typename Test>
-Indices Filter(const Tin& tin, Indices list, const Test& test) {
-    const auto fails = [&](unsigned i) { return !test(*tin.GetTriangle(i)); };
-    list.erase(std::remove_if(list.begin(), list.end(), fails), list.end());
-    return list;
+/// 23 by 23 squares of 10 by 10, work for a team of threads; each node moves by up to fJitter.
+inline Mesh MakeSheet(float fJitter, Random& random) {
+    Mesh mesh;
+    for (unsigned i = 0; i < 576; ++i) {
+        const auto x = static_cast<float>(i % 24 * 10), y = static_cast<float>(i / 24 * 10);
+        mesh.vertices.push_back({x + random.Between(0, fJitter), y + random.Between(0, fJitter),
+                                 random.Between(0, 50)});
+        if (i % 24 < 23 && i < 552)
+            mesh.ids.insert(mesh.ids.end(), {{i, i + 1, i + 25}, {i + 25, i + 24, i}});
+    }
+    return mesh;
 }
 
-/// What a walk must deliver, in order: the lists of the leaves reached through boxes that pass.
-template <typename Meets>
-Indices CollectLeaves(const AabbNode* node, const Meets& meets) {
-    if (node == nullptr || !meets(node->GetBBox()))
-        return {};
-    Indices list = node->GetLeaves();
-    for (const AabbNode* child : {node->GetLeft(), node->GetRight()})
-        for (const unsigned i : CollectLeaves(child, meets))
-            list.push_back(i);
-    return list;
+/// A regular sheet; one with holes, repeats, walls, points, slivers, a large triangle over all and
+/// a NaN height; wide triangles in a column, which only the axis that is not the longest divides.
+inline std::vector<Mesh> MakeMeshes(Random& random) {
+    Mesh wild = MakeSheet(3, random), column;
+    for (float y = 0; y < 20; ++y) {
+        Triangle_Id& id = wild.ids[random.Below(wild.ids.size())];
+        const Point a = wild.vertices[id.id0], b = wild.vertices[id.id1];
+        id = wild.ids[0];
+        wild.Add(a, b, {b.x, b.y, b.z + 30});
+        wild.Add(a, a, a);
+        wild.Add(a, b, {b.x, std::nextafter(b.y, 1e9F), 70});
+        column.Add({-50, y, 1}, {50, y, 2}, {0, y + 3, 3});
+    }
+    wild.Add({0, 0, 20}, {200, 0, 20}, {0, 200, 20});
+    wild.Add({20, 20, NOT_A_NUMBER}, {50, 20, 20}, {20, 50, 20});
+    return {MakeSheet(0, random), wild, column};
 }
-Indices Sorted(Indices list);
 
 } // namespace kelm::tin::test
