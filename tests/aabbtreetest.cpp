@@ -56,6 +56,8 @@ TEST(AabbTree, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
                 ExpectDivided(tree.GetRoot(), tin, tin.GetAll(), eType == DT_BestAxis, nCapacity,
                               nodes, leaves);
                 tree.FindLeaves(EVERYWHERE, walked);
+                tree.FindLeaves(EVERYWHERE, walked); // behind what stands in the list
+                leaves.insert(leaves.end(), leaves.begin(), leaves.end());
                 EXPECT_EQ(walked, leaves);
                 EXPECT_EQ(static_cast<int>(tree.GetCapacity()), nCapacity);
                 EXPECT_EQ(tree.GetObjBytes(), 64 * nodes + 4 * tin.GetTriangleCount() + 32);

@@ -1,5 +1,6 @@
 #include "services/exception.h"
 #include "services/reporting.h"
+#include "services/vectorlayer.h"
 #include "tests/support/sheets.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
@@ -26,6 +27,8 @@ TEST(BadArguments, OfReadersAreRefused) {
     EXPECT_THROW(open(good, 1, 1, 3000), DataException);
     const auto reader = open(good, -9); // the first layer
     EXPECT_THROW(reader->SetOutputVerticalDatum(ogc::cs::DatumType(1000)), ParameterException);
+    EXPECT_THROW(ZARGetNext(nullptr, -1), ParameterException);
+    EXPECT_EQ(ZARSegNext(nullptr, 116, 0), 0);
     const auto window = MakeBox(MapPoint{NaN, FAR}, MapPoint{1, -FAR});
     EXPECT_EQ(reader->Load(&window), nullptr);
 }

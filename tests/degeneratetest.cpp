@@ -33,6 +33,12 @@ void* BuildSearchAndDestroy(void* pKind) {
         tree.FindLeaves(EVERYWHERE, all);
         std::sort(all.begin(), all.end());
         EXPECT_EQ(all, tin.GetAll());
+        float h = LOWEST, wanted = LOWEST;
+        EXPECT_EQ(tin.GetHeight(2.0F, 2.0F, h, &tree), tin.GetHeight(2.0F, 2.0F, wanted, nullptr));
+        EXPECT_EQ(h, wanted);
+        tin.GetLineIntersectHeight(Point{0, 0, 0}, Point{5, 5, 5}, h, &tree);
+        tin.GetLineIntersectHeight(Point{0, 0, 0}, Point{5, 5, 5}, wanted, nullptr);
+        EXPECT_EQ(h, wanted);
     }
     return nullptr;
 }

@@ -152,6 +152,9 @@ TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     const OpenTin other = mesh.MakeTin();
     tin = other; // releases its own
     EXPECT_EQ(tin.GetTriangle(0), other.GetTriangle(0));
+    const auto kept = std::make_unique<OpenTin>(mesh.MakeTin()); // a temporary hands them on
+    tin = mesh.MakeTin();
+    EXPECT_TRUE(tin.GetVertex(3)->y == 50 && kept->GetVertex(3)->y == 50);
 }
 
 } // namespace

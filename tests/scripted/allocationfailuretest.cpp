@@ -75,6 +75,11 @@ TEST_F(AllocationFailureTest, SurfaceTreeCopiesSearchesAndSubsets) {
     });
     for (const bool isIndexed : {false, true})
         FailEach([&] { return surface.Ask(isIndexed ? &tree : nullptr, 7); });
+    const kelm::tin::test::AllocationCounter counter;
+    float h;
+    surface.GetHeight(30.0F, 20.0F, h, &tree);
+    surface.GetLineIntersectHeight(point3_t<float>{0, 0, 0}, {900, 30, 900}, h, &tree);
+    EXPECT_EQ(kelm::tin::test::AllocationCounter::mnRequests, 0) << "a query needs no memory";
 }
 
 } // namespace

@@ -62,4 +62,23 @@ TEST(PolygonTest, ARingIsTurnedUnlessItIsAsAskedAndItsBoxHoldsRepeats) {
     EXPECT_FALSE(Make(SQUARE).IsPointInside(0, 1));
 }
 
+// A comb blocks almost every ear, again and again.
+TEST(PolygonTest, ARingOfBlockedEarsIsCoveredExactly) {
+    Ring comb;
+    for (int i = 0; i < 2000; ++i)
+        comb.push_back({10.0 * i, i % 2 == 0 ? 0.0 : 1000.0});
+    for (int i = 2000; i-- > 0;)
+        comb.push_back({10.0 * i, i % 2 == 0 ? 1.0 : 1001.0});
+    std::vector<Triangle_Id> ids;
+    EXPECT_EQ(Triangulate(Make(comb), ids), 0);
+    ASSERT_EQ(ids.size(), comb.size() - 2);
+    double area = 0;
+    for (const auto& [a, b, c] : ids) {
+        const double part = Make({comb[a], comb[b], comb[c]}).GetSignedArea();
+        EXPECT_GT(part, 0);
+        area += part;
+    }
+    EXPECT_EQ(area, Make(comb).GetSignedArea());
+}
+
 } // namespace

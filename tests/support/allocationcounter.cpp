@@ -14,20 +14,31 @@ const bool Counter::IS_ACTIVE = false;
 #ifndef KELM_TIN_FOREIGN_NEW
 const bool Counter::IS_ACTIVE = true;
 // Each form must come from here, or a block made by one is freed by another, a sanitizer's for one.
-void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
-    if (!Counter::mbCounts)
-        return std::malloc(size);
-    const long request = ++Counter::mnRequests;
-    const bool fails = request >= Counter::mnFailFrom && request <= Counter::mnFailTo;
-    void* const block = fails ? nullptr : std::malloc(size);
-    Counter::mnBalance += block != nullptr;
+static void* Allocate(std::size_t size, std::size_t alignment) {
+    const bool counts = Counter::mbCounts;
+    const long request = counts ? ++Counter::mnRequests : 0;
+    if (counts && request >= Counter::mnFailFrom && request <= Counter::mnFailTo)
+        return nullptr;
+    void* const block =
+        alignment == 0
+            ? std::malloc(size)
+            : std::aligned_alloc(alignment, (size + alignment - 1) / alignment * alignment);
+    Counter::mnBalance += counts && block != nullptr;
     return block;
 }
-void* operator new(std::size_t size) {
-    void* const block = operator new(size, std::nothrow);
+static void* Need(void* block) {
     if (block == nullptr)
         throw std::bad_alloc();
     return block;
+}
+void* operator new(std::size_t size, const std::nothrow_t&) noexcept {
+    return Allocate(size, 0);
+}
+void* operator new(std::size_t size) {
+    return Need(Allocate(size, 0));
+}
+void* operator new(std::size_t size, std::align_val_t alignment) {
+    return Need(Allocate(size, std::size_t(alignment)));
 }
 void* operator new[](std::size_t size) {
     return operator new(size);
@@ -40,6 +51,9 @@ void operator delete(void* block) noexcept {
     std::free(block);
 }
 void operator delete(void* block, std::size_t) noexcept {
+    operator delete(block);
+}
+void operator delete(void* block, std::align_val_t) noexcept {
     operator delete(block);
 }
 void operator delete[](void* block) noexcept {
