@@ -92,8 +92,8 @@ Tin& Tin::operator=(const Tin& other) {
     return *this;
 }
 
-Tin::Tin(Tin&& other) noexcept : Tin(static_cast<const Tin&>(other)) {
-    std::swap(mbOwnsArrays, other.mbOwnsArrays);
+Tin::Tin(Tin&& other) noexcept {
+    *this = std::move(other);
 }
 
 Tin& Tin::operator=(Tin&& other) noexcept {
