@@ -7,7 +7,6 @@ namespace {
 using Corners = std::vector<Point>;
 
 struct OwnTriangle : Triangle {
-    using Triangle::GetGridPointIdx;
     explicit OwnTriangle(const Corners& v) : corners(v) {
         SetVertices(&corners[0], &corners[1], &corners[2]);
     }
@@ -129,18 +128,6 @@ TEST(TriangleGrid, ListsTheCellsThatExactArithmeticFinds) {
         t.GetGridPointsCR(cells.data(), cols, rows);
         ASSERT_EQ(cells, expected) << i;
     }
-}
-
-TEST(TriangleGrid, ThreadsMarkOneGrid) {
-    const OwnTriangle triangle({{0, 0, 0}, {4, 0, 0}, {0, 4, 0}});
-    unsigned counts[64] = {};
-    int sums[64] = {}; // in another cache line
-#pragma omp parallel for num_threads(4)
-    for (int i = 0; i < 4000000; ++i) {
-        double bary[3];
-        triangle.GetGridPointIdx(1, 2, 5, 7, counts, sums, bary);
-    }
-    EXPECT_TRUE(counts[11] == 4000000 && sums[11] == 28000000);
 }
 
 } // namespace

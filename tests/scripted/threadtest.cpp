@@ -60,4 +60,24 @@ TEST_F(ThreadTest, LoadsOnOneReaderAndOnSeveral) {
     EXPECT_EQ(mnDifferent, 0);
 }
 
+struct Marker : kelm::tin::Triangle {
+    using Triangle::GetGridPointIdx;
+};
+
+// Without the sanitizer a lost update shows now and then only.
+TEST_F(ThreadTest, TrianglesMarkOneGrid) {
+    constexpr unsigned ROUNDS = 100000;
+    point3_t<float> corners[] = {{0, 0, 0}, {4, 0, 0}, {0, 4, 0}};
+    Marker triangle;
+    triangle.SetVertices(&corners[0], &corners[1], &corners[2]);
+    unsigned counts[64] = {};
+    int sums[64] = {}; // in another cache line
+    RunOnThreads([&](unsigned) {
+        double bary[3];
+        for (unsigned i = 0; i < ROUNDS; ++i)
+            triangle.GetGridPointIdx(1, 2, 5, 7, counts, sums, bary);
+    });
+    EXPECT_TRUE(counts[11] == 8 * ROUNDS && sums[11] == int(7 * 8 * ROUNDS));
+}
+
 } // namespace
