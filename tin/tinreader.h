@@ -34,8 +34,8 @@ class KELM_TIN_EXPORT TinReader {
     /// Usually called by TinReaderFactory::CreateTinReader.
     /// @param poLayer taken over, with its file, unless the constructor throws; a reader on null
     /// loads nothing @param dfOffset,dfScale elevation factor: a stored height h counts as
-    /// (h + dfOffset) * dfScale @param eSourceDatum vertical datum of the stored heights, and the
-    /// first output datum
+    /// (h + dfOffset) * dfScale; both finite @param eSourceDatum vertical datum of the stored
+    /// heights, and the first output datum
     /// @throw kelm::ParameterException if dfScale is zero, the datum is not a vertical one or the
     /// layer's CRS is not two-dimensional; what the store and the reference services throw
     TinReader(ZARLayer_t*& poLayer, const double& dfOffset, const double& dfScale,
@@ -60,7 +60,7 @@ class KELM_TIN_EXPORT TinReader {
     Tin* Load(const BBox<double, point2_t<double>>* poWindow);
 
     /// Chooses the vertical datum in which later loads deliver heights. Heights of a local CRS are
-    /// never transformed, whatever the datums.
+    /// never transformed, whatever the datums; a warning says so.
     /// @throw kelm::ParameterException if the code is not in 2000 to 2999, or if just one of source
     /// and output is VD_Other; what the reference services throw, for one if the grid of the datum
     /// is not installed. The reader then keeps its former output datum
