@@ -55,7 +55,7 @@ ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {
 }
 
 int ZARGetLayerType(ZARLayer_t*, int) {
-    return 2;
+    return 2; // polygons
 }
 
 int ZARGetProjectionInfo(ZARLayer_t*, ProjInfo_t* info) {
