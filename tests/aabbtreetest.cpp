@@ -69,5 +69,24 @@ TEST(AabbTree, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
     EXPECT_GE(tree.EstimateObjBytes(4294967295U), 4294967295U * std::uint64_t{4});
 }
 
+// Wrong releases show under the address sanitizer.
+TEST(AabbNode, OnlyTheTopOfABuildReleasesIt) {
+    Random random;
+    const OpenTin tin = MakeSheet(3, random).MakeTin();
+    AabbTree tree(&tin);
+    AabbNode* const left = tree.GetRoot()->GetLeft();
+    const AabbNode copy = *left;
+    EXPECT_EQ(copy.GetLeft(), left->GetLeft());
+    *tree.GetRoot()->GetRight() = *left->GetLeft(); // now names nodes that lie before it
+    AabbNode* leaf = left;
+    while (leaf->GetLeft() != nullptr)
+        leaf = leaf->GetLeft();
+    *leaf = AabbNode();
+    leaf->CreateChild(tin.GetTriangle(0), tin.GetAll(), &tree); // a top among the nodes of another
+    Indices all;
+    leaf->FindLeaves(EVERYWHERE, all);
+    EXPECT_EQ(all.size(), tin.GetTriangleCount());
+}
+
 } // namespace
 } // namespace kelm::tin::test

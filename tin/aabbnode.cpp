@@ -210,7 +210,7 @@ class AabbNode::Builder {
 
 AabbNode::~AabbNode() {
     if (mpoLeft != nullptr)
-        Blocks::Release(mpoLeft);
+        Blocks::ReleaseBelow(mpoLeft);
 }
 
 void AabbNode::CreateChild(const Triangle* triangles, const std::vector<unsigned>& list,

@@ -62,10 +62,12 @@ class KELM_TIN_EXPORT AabbTreeInfo {
 /// Node of the tree: a box around the boxes of all triangles below it and either two children or,
 /// in a leaf, a list of triangle indices, ascending.
 ///
-/// Boxes and positions are surface-local `float`. A node owns its list, and the node on which
-/// CreateChild ran owns all nodes below it. A copy shares the children: of a top and its copies
-/// only one may reach its destructor, and a copy of a node below a top may not. Searches only read
-/// and may run on any number of threads; CreateChild excludes all others.
+/// Boxes and positions are surface-local `float`. A node owns its list. The node on which
+/// CreateChild ran, the top, owns all nodes below it. A copy shares the children: of a top and its
+/// copies only one may reach its destructor. A copy of a node below owns no node, and its children
+/// end with the top.
+///
+/// Searches only read and may run on any number of threads; CreateChild excludes all others.
 class KELM_TIN_EXPORT AabbNode {
   public:
     AabbNode() = default;
@@ -97,7 +99,7 @@ class KELM_TIN_EXPORT AabbNode {
     void AddLeaves(std::vector<unsigned>& list, float x, float y) const;
     void AddLeaves(std::vector<unsigned>& list, const BBox<float, point2_t<float>>& box) const;
 
-    /// @return the child, owned by this node; null in a leaf
+    /// @return the child, owned by the top of its tree; null in a leaf
     AabbNode* GetLeft() const { return mpoLeft; }
     AabbNode* GetRight() const { return mpoRight; }
     const BBox<float, point2_t<float>>& GetBBox() const { return moBBox; }

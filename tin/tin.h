@@ -53,8 +53,9 @@ class KELM_TIN_EXPORT Tin {
     /// Releases the arrays that the target owns, unless `other` shows them too: then it goes on
     /// owning them.
     Tin& operator=(const Tin& other);
-    /// Owns what the other owned, which goes on showing it.
+    /// Takes over what the other owns; the other goes on showing the arrays, as a copy does.
     Tin(Tin&& other) noexcept;
+    /// The same. Releases as the assignment of a copy does.
     Tin& operator=(Tin&& other) noexcept;
     ~Tin();
 

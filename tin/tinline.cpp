@@ -26,8 +26,8 @@ void KeepHighest(const Triangle& triangle, const point3_t<float>& a, const point
 
 /// Highest crossing of a segment with the triangles of the leaves that it meets.
 ///
-/// They are tested in batches, in their order: triangles, and then their vertices, are asked for a
-/// batch ahead, since a walk over a large surface mostly waits for memory.
+/// They are tested in batches, in their order: a batch once its triangles, and then their vertices,
+/// have been asked for, since a walk over a large surface mostly waits for memory.
 class CrossingBatch {
   public:
     CrossingBatch(const Triangle* triangles, const point3_t<float>& a, const point3_t<float>& b)
@@ -42,6 +42,7 @@ class CrossingBatch {
         }
     }
 
+    /// Tests what is left first.
     float GetHighest() {
         TestAll();
         return mfHighest;

@@ -42,7 +42,8 @@ inline void PrefetchBelow(const AabbNode* poNode) {
 }
 
 /// Calls visit(list) for every leaf that can be reached from poRoot through boxes for which
-/// meets(box) holds, depth first, left before right. A null root has no leaves.
+/// meets(box) holds, depth first, left before right. A null root has no leaves; a node has both
+/// children or none.
 template <typename Meets, typename Visit>
 void VisitLeaves(const AabbNode* poRoot, const Meets& meets, const Visit& visit) {
     if (poRoot == nullptr || !meets(poRoot->GetBBox()))

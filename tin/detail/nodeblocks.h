@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <cstring>
 #include <new>
 
 #ifdef __linux__
@@ -14,9 +15,10 @@ namespace kelm::tin {
 
 /// Memory of the nodes that one build makes below its top.
 ///
-/// Children are made in pairs, each on two cache lines of its own, since a search that looks at one
-/// looks at the other; on a large tree a block fills one huge page. The blocks hang together behind
-/// the first pair, which are the children of the top, and are released as a whole.
+/// Siblings lie side by side, aligned to both, since a search that looks at one looks at the other;
+/// the blocks of a large tree lie on huge pages. The first block's header stands right before the
+/// first pair, the children of the top, so that the top finds all blocks by its left child. The
+/// object itself owns nothing.
 class AabbNode::Blocks {
   public:
     /// @return the left of two new default nodes side by side
@@ -30,24 +32,27 @@ class AabbNode::Blocks {
         return pair;
     }
 
-    /// @param poFirst the left child of a top
-    static void Release(AabbNode* poFirst) {
-        Block* next;
-        for (Block* block = reinterpret_cast<Block*>(poFirst) - 1; block != nullptr; block = next) {
-            next = block->poNext;
-            for (AabbNode* node = block->GetNodes(); node != block->GetNodes() + block->nNodes;
-                 ++node) {
-                node->mpoLeft = nullptr;
-                node->~AabbNode();
-            }
+    /// Releases all blocks of a build if `poLeft` is the left child of its top. The children of
+    /// other nodes lie in these blocks too, and go with them.
+    static void ReleaseBelow(AabbNode* poLeft) {
+        Block* first = FindFirst(poLeft);
+        // All nodes go before any block, for a node may have been assigned another's children.
+        for (Block* block = first; block != nullptr; block = block->poNext)
+            std::for_each(block->GetNodes(), block->GetNodes() + block->nNodes,
+                          [](AabbNode& rNode) { rNode.~AabbNode(); });
+        while (first != nullptr) {
+            Block* block = first;
+            first = block->poNext;
             ::operator delete(block, GetAlignment(block->nCapacity));
         }
     }
 
   private:
-    static constexpr std::size_t HUGE_PAGE = 2 << 20;
+    static constexpr std::size_t HUGE_PAGE = std::size_t{2} << 20;
+    static constexpr std::size_t LARGEST = 16 * HUGE_PAGE;
 
     struct alignas(2 * sizeof(AabbNode)) Block {
+        Block* poSelf; ///< null in a block that is not the first
         Block* poNext;
         std::size_t nNodes;
         std::size_t nCapacity;
@@ -55,33 +60,42 @@ class AabbNode::Blocks {
         AabbNode* GetNodes() { return reinterpret_cast<AabbNode*>(this + 1); }
     };
 
-    /// Nodes of a block of so many bytes; room for the allocator's own is left, so that aligned
-    /// blocks can lie end to end.
-    static constexpr std::size_t GetCapacity(std::size_t nBytes) {
-        return (nBytes - 2 * sizeof(Block)) / sizeof(AabbNode);
+    static constexpr std::size_t GetBytes(std::size_t nCapacity) {
+        return sizeof(Block) + nCapacity * sizeof(AabbNode);
     }
 
     static std::align_val_t GetAlignment(std::size_t nCapacity) {
-        return std::align_val_t{nCapacity == GetCapacity(HUGE_PAGE) ? HUGE_PAGE : alignof(Block)};
+        return std::align_val_t{GetBytes(nCapacity) < HUGE_PAGE ? alignof(Block) : HUGE_PAGE};
+    }
+
+    /// @return the header of the first block if it stands before the pair, else null. Before any
+    /// other pair stands a pair, whose first word is null or leads to yet another one, or the
+    /// header of a later block.
+    static Block* FindFirst(AabbNode* poLeft) {
+        Block* before = reinterpret_cast<Block*>(poLeft) - 1;
+        const Block* self;
+        std::memcpy(&self, before, sizeof self);
+        return self == before ? before : nullptr;
     }
 
     void AddBlock() {
-        mnBytes = std::min(2 * mnBytes, HUGE_PAGE);
-        const std::size_t capacity = GetCapacity(mnBytes);
-        const std::size_t bytes = sizeof(Block) + capacity * sizeof(AabbNode);
-        void* memory = ::operator new(bytes, GetAlignment(capacity));
+        mnBytes = std::min(2 * mnBytes, LARGEST);
+        const std::size_t capacity = (mnBytes - sizeof(Block)) / sizeof(AabbNode);
+        void* memory = ::operator new(mnBytes, GetAlignment(capacity));
 #ifdef MADV_HUGEPAGE
-        if (mnBytes == HUGE_PAGE)
-            madvise(memory, bytes, MADV_HUGEPAGE); // a refusal costs speed only
+        if (mnBytes >= HUGE_PAGE)
+            madvise(memory, mnBytes, MADV_HUGEPAGE); // a refusal costs speed only
 #endif
-        Block* block = new (memory) Block{nullptr, 0, capacity};
+        Block* block = new (memory) Block{nullptr, nullptr, 0, capacity};
         if (mpoLast != nullptr)
             mpoLast->poNext = block;
+        else
+            block->poSelf = block;
         mpoLast = block;
     }
 
     Block* mpoLast = nullptr;
-    std::size_t mnBytes = 512;
+    std::size_t mnBytes = 2 * sizeof(Block); ///< of the last block
 };
 
 } // namespace kelm::tin

@@ -16,8 +16,10 @@ struct NoFilter {
 /// threads: each thread lists those of its own block, and the lists are joined in thread order.
 ///
 /// @param lists number of lists; the team stays within it, also if the thread setting has been
-/// raised since it was noted @param filter lets pass all that pass the test, and most others not;
-/// put to four items without a branch in between @throw std::bad_alloc, from a worker too
+/// raised since it was noted
+/// @param filter cheap; passes whatever passes the test. It is put to four items without a branch
+/// in between, and if one passes the test is put to all four
+/// @throw std::bad_alloc, from a worker too
 template <typename Test, typename Filter = NoFilter>
 void ParallelScan(unsigned count, int lists, const Test& test, std::vector<unsigned>& result,
                   const Filter& filter = {}) {

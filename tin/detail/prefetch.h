@@ -2,7 +2,7 @@
 
 namespace kelm::tin::detail {
 
-/// Asks for memory ahead of its use. Any address will do.
+/// Asks for memory ahead of its use. A hint: nothing is read, and any address will do.
 inline void Prefetch([[maybe_unused]] const void* p) {
 #ifdef __GNUC__
     __builtin_prefetch(p);
