@@ -49,7 +49,7 @@ SUBJECTS = [
      "Resident memory that a build adds at its peak and keeps, beyond what it is built over, each "
      "in a process of its own."),
     ("Degenerate surfaces", "degenerate", (1e-6, "ms"),
-     "A million triangles, an index of ours: `same` and `crowded` as above; `vertical` triangles "
+     "A million triangles (100k if `quick`), an index of ours, each figure one call: `same` and `crowded` as above; `vertical` triangles "
      "in a diagonal; a `tower` of growing triangles over one point; `slivers` of 10,000 km side by "
      "side; `far`: each spans the range of `float`. The height in the middle of the surface's box, "
      "and the crossing of its diagonal."),

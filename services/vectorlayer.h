@@ -54,10 +54,11 @@ KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
 /// @return the number of segments of this type; a null file has none
 KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
 
-/// @return the number of the first segment of this type behind `after` (0: from the start), or 0
+/// @return the number of the first segment of this type behind `after` (0: from the start), or 0,
+/// as for a null file
 KELM_SERVICES_EXPORT int ZARSegNext(_iobuf* file, int type, int after);
 
-/// @return the layer of a segment, owned by the file, or null if there is no such layer
+/// @return the layer of a segment, owned by the file, or null if there is no such layer or no file
 /// @throw any exception, if the layer cannot be read
 KELM_SERVICES_EXPORT ZARLayer_t* ZARGetLayer(_iobuf* file, int segment);
 
