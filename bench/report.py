@@ -17,14 +17,12 @@ import sys
 # Why a goal is missed, by its key in get_goals(). A goal that is short and has no sentence here is
 # printed as unexplained.
 CAUSES = {
-    "random": "Not proved, there are no hardware counters here: a height seems to wait for the memory "
-              "of the nodes on its way: a node takes 64 bytes here, and both children are looked at "
-              "on each level",
-    "line-short": "From reading both: Boost holds a box for every triangle and drops by it what a "
-                  "leaf here tests; here a leaf "
-                  "holds up to five triangles, and each of a leaf that is met is put to the rule of "
-                  "the plan, three edges in double precision, before its crossing. A 3-D index "
-                  "also drops what the line passes over",
+    "random": "Not proved, there are no hardware counters here: a height seems to wait for memory. It "
+              "follows the nodes down, then reads a leaf's list, its triangles and their vertices, "
+              "each at an address that the one before tells",
+    "line-short": "Not proved, as above: on the larger terrains next to all that a short segment "
+                  "reads is out of cache, and a leaf reads each of up to five triangles where "
+                  "Boost's node holds their boxes side by side",
     "line-long": "As for short segments; the higher the line, the more a 3-D index drops",
     "scan": "While the triangles fit the cache, the time is that of testing each box, a load and "
             "six operations a triangle; beyond it, that of the memory alone",
@@ -33,8 +31,8 @@ CAUSES = {
               "row and writes to the raster directly",
     "load": "The loop makes nothing. A load also carries each corner through the list, welds it, "
             "and makes vertices and triangles of them",
-    "growth": "A height seems to wait for the memory of what it visits, with all indices in the table; at "
-              "equal density of the positions, the row `fine`, it does not grow as much",
+    "growth": "At 100k all that a build or a height visits lies in the cache, at 4M next to nothing. At "
+              "equal density of the positions, the row `fine`, a height does not grow as much",
 }
 
 # Title, key, unit of a figure (factor on nanoseconds an item, text), workload in words.
