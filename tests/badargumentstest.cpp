@@ -63,6 +63,23 @@ TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     EXPECT_EQ(t.GetGridPointsNum(9, 0) + t.GetGridPointsNum(-9, 9), 0U);
 }
 
+TEST(BadArguments, ARefusalTellsWhereAndWhatWasExpected) {
+    ParameterException kept("", ParameterException::PT_Invalid, "", "", "", "", "", 0);
+    DataException plain("", "", "", 0);
+    try {
+        AabbTree().CreateTree(nullptr);
+    } catch (const ParameterException& refusal) {
+        kept = refusal;
+        plain = refusal;
+    }
+    EXPECT_TRUE(kept.GetParameter() == "poTin" && kept.GetActual() + kept.GetExpected() == "");
+    EXPECT_EQ(kept.GetType(), ParameterException::PT_Invalid);
+    EXPECT_EQ(plain.GetMessage(), "The TIN used to create AabbTree cannot be empty");
+    EXPECT_TRUE(plain.what() == kept.GetMessage() && plain.GetSourcePath() == "tin/aabbtree");
+    EXPECT_NE(DataException(plain).GetFunction().find("CreateTree"), std::string::npos);
+    EXPECT_GT(ParameterException(kept).GetLine(), 0U);
+}
+
 TEST(BadArguments, ATextForTheHostIsNoFormat) {
     static std::string last;
     const std::string text = FormatString("%d %s%%s%%n", 7, std::string(20000, 'x').c_str());

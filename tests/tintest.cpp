@@ -147,6 +147,12 @@ TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     tin.GetRawBBox(box);
     EXPECT_TRUE(box.min.x == 100000001.75 && box.min.y == 1.5 && box.min.z == -3);
     EXPECT_TRUE(box.max.x == 100000003.25 && box.max.y == 49.5 && box.max.z == 8);
+    float low, high;
+    tin.SetHeightRange(4, -4);
+    tin.GetHeightRange(low, high);
+    tin.GetVertex(0)->x = -9;
+    tin.ComputeTriBBox();
+    EXPECT_TRUE(low == 4 && high == -4 && tin.GetTriangle(0)->GetBBox().min.x == -9);
     tin = copy; // goes on owning
     EXPECT_TRUE(copy.GetVertex(3) == tin.GetVertex(3) && tin.GetObjBytes() == 4 * 12 + 48 + 88);
     const OpenTin other = mesh.MakeTin();
