@@ -96,14 +96,6 @@ TEST(AabbNode, StepsByHandDivideAsABuildDoes) {
         left.insert(left.begin(), 9);
         EXPECT_EQ(built, left);
     }
-    AabbTreeInfo info;
-    info.SetMaxTreeDeep(3);
-    info.AddDeep();
-    EXPECT_FALSE(info.TestDeep());
-    info.AddDeep();
-    EXPECT_TRUE(info.TestDeep() && info.GetDeep() == 2);
-    tree.SetInfo(info);
-    EXPECT_TRUE(tree.GetDivisionType() == DT_LongestAxis && tree.GetCapacity() == 5);
 }
 
 // Wrong releases show under the address sanitizer.
