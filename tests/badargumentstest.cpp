@@ -72,7 +72,8 @@ TEST(BadArguments, ARefusalTellsWhereAndWhatWasExpected) {
         kept = refusal;
         plain = refusal;
     }
-    EXPECT_TRUE(kept.GetParameter() == "poTin" && kept.GetActual() + kept.GetExpected() == "");
+    EXPECT_EQ(kept.GetParameter(), "poTin");
+    EXPECT_TRUE(kept.GetActual().empty() && kept.GetExpected().empty());
     EXPECT_EQ(kept.GetType(), ParameterException::PT_Invalid);
     EXPECT_EQ(plain.GetMessage(), "The TIN used to create AabbTree cannot be empty");
     EXPECT_TRUE(plain.what() == kept.GetMessage() && plain.GetSourcePath() == "tin/aabbtree");

@@ -73,9 +73,9 @@ class AabbNode::Blocks {
     /// header of a later block.
     static Block* FindFirst(AabbNode* poLeft) {
         Block* before = reinterpret_cast<Block*>(poLeft) - 1;
-        const Block* self;
-        std::memcpy(&self, before, sizeof self);
-        return self == before ? before : nullptr;
+        Block head;
+        std::memcpy(&head, before, sizeof head);
+        return head.poSelf == before ? before : nullptr;
     }
 
     void AddBlock() {
