@@ -27,8 +27,9 @@ struct Opened : Tin {
     using Tin::Tin;
 };
 
+/// Of +0 and -0 the first one found stands, which a tree and a scan find in their own order.
 bool IsSame(float a, float b) {
-    return std::memcmp(&a, &b, sizeof a) == 0;
+    return std::memcmp(&a, &b, sizeof a) == 0 || (a == 0.0F && b == 0.0F);
 }
 
 List Sorted(List list) {
