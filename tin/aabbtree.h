@@ -175,7 +175,8 @@ class KELM_TIN_EXPORT AabbTree {
     AabbTreeInfo* GetInfo() { return &moInfo; }
     void SetInfo(const AabbTreeInfo& oInfo) { moInfo = oInfo; }
 
-    /// @return bytes held by the built tree
+    /// @return bytes of the built tree: its own, 64 a node and 4 a triangle; nodes are made in
+    /// blocks, which reserve more
     std::uint64_t GetObjBytes() const;
     /// @return bytes that a tree over n triangles will hold with the present capacity. A capacity
     /// of 0 has no meaning here and gives the highest node count

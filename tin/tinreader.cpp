@@ -146,10 +146,9 @@ void TinReader::SetOutputVerticalDatum(DatumType eType) {
     TestDatum(meSourceDatum, eType);
     const bool unknown = meSourceDatum == VD_Other && eType == VD_Other;
     if (mpoCRS != nullptr && mbLocalCRS && meSourceDatum != eType && eType != VD_Other)
-        tellus::Warning::Warn(
-            "The layer has a local CRS, or none: its heights are the same in every "
-            "vertical datum.",
-            "tin/tinreader", __LINE__);
+        tellus::Warning::Warn("The layer has a local CRS, or none: its heights are the same in "
+                              "every vertical datum.",
+                              "tin/tinreader", __LINE__);
     // A reader on null has no CRS, and no heights to convert.
     if (mpoCRS != nullptr && (unknown || mpoOutput3DCRS == nullptr || eType != meOutputDatum)) {
         // Both are made before the old ones go, so that a failure changes nothing.
