@@ -1,6 +1,6 @@
 #include "bench/suite.h"
 #include "bench/weld.h"
-#include "tin/detail/cornerhash.h"
+#include "tin/load/cornerhash.h"
 #include "tin/octree2.h"
 #include "tin/tinreader.h"
 
@@ -48,7 +48,7 @@ StandIns WeldByOctree(Corners& rCorners) {
 /// As a load does it: the octree is asked where the hash cannot tell.
 StandIns WeldAsLoad(Corners& rCorners) {
     StandIns standIns(rCorners.size());
-    return tin::detail::CornerHash::FindStandIns(rCorners, standIns) ? standIns
+    return tin::load::CornerHash::FindStandIns(rCorners, standIns) ? standIns
                                                                      : WeldByOctree(rCorners);
 }
 

@@ -18,10 +18,12 @@ install(TARGETS kelm_headers kelm_services kelm_tin EXPORT kelm-tin
         LIBRARY COMPONENT runtime NAMELINK_COMPONENT development
         ARCHIVE COMPONENT development)
 
-# Polygons are what the public triangulation takes; nothing else of tin/detail is public.
-install(DIRECTORY tin containers services DESTINATION ${include_root} COMPONENT development
-        FILES_MATCHING PATTERN "*.h" PATTERN bundled EXCLUDE PATTERN detail EXCLUDE)
-install(FILES tin/detail/polygon.h DESTINATION ${include_root}/tin/detail COMPONENT development)
+# The folders within are rooms of the implementation, but for tin/detail: its polygons are what the
+# public triangulation takes.
+foreach(public IN ITEMS tin tin/detail containers services)
+  file(GLOB headers CONFIGURE_DEPENDS ${PROJECT_SOURCE_DIR}/${public}/*.h)
+  install(FILES ${headers} DESTINATION ${include_root}/${public} COMPONENT development)
+endforeach()
 
 install(DIRECTORY examples DESTINATION ${CMAKE_INSTALL_DATADIR}/kelm-tin COMPONENT development
         FILES_MATCHING PATTERN "*.h" PATTERN "*.cpp" PATTERN CMakeLists.txt)

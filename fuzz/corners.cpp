@@ -1,7 +1,7 @@
 // Corner lists: the octree holds or has a twin of each, and the hash, where it decides, agrees.
 
 #include "fuzz/bytes.h"
-#include "tin/detail/cornerhash.h"
+#include "tin/load/cornerhash.h"
 #include "tin/octree2.h"
 
 #include <numeric>
@@ -33,7 +33,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const Octree2 tree(corners, keys);
 
     std::vector<unsigned> standIns(corners.size());
-    const bool decided = kelm::tin::detail::CornerHash::FindStandIns(corners, standIns);
+    const bool decided = kelm::tin::load::CornerHash::FindStandIns(corners, standIns);
     unsigned kept = 0;
     for (unsigned i = 0; i < corners.size(); ++i) {
         Require(keys[i] <= 1);

@@ -7,6 +7,7 @@
 #include <limits>
 #include <memory>
 #include <numeric>
+#include <utility>
 
 namespace kelm::tin {
 
@@ -25,6 +26,18 @@ AabbTree::AabbTree(const Tin* poTin) {
         delete mpoRoot;
         throw;
     }
+}
+
+AabbTree::AabbTree(AabbTree&& other) noexcept {
+    *this = std::move(other);
+}
+
+AabbTree& AabbTree::operator=(AabbTree&& other) noexcept {
+    std::swap(mpoRoot, other.mpoRoot);
+    std::swap(mnNodeCount, other.mnNodeCount);
+    std::swap(moInfo, other.moInfo);
+    std::swap(mnTriangleCount, other.mnTriangleCount);
+    return *this;
 }
 
 AabbTree::~AabbTree() {
@@ -50,7 +63,7 @@ void AabbTree::CreateTree(const Tin* poTin) {
     std::vector<unsigned> list(count);
     std::iota(list.begin(), list.end(), 0U);
     mpoRoot = new AabbNode;
-    mpoRoot->CreateChild(triangles, list, this);
+    mpoRoot->Build(triangles, std::move(list), *this);
 }
 
 void AabbTree::FindLeaves(float x, float y, std::vector<unsigned>& list) const {

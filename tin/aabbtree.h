@@ -12,6 +12,10 @@ namespace kelm::tin {
 class AabbTree;
 class Tin;
 
+namespace index {
+struct NodeBlock;
+}
+
 /// Side of a triangle at a split.
 enum DivisionSide : int {
     DS_Left = 0, ///< the centre is at or beyond the triangle's centroid
@@ -59,13 +63,16 @@ class KELM_TIN_EXPORT AabbTreeInfo {
     DivisionType meDivisionType = DT_LongestAxis;
 };
 
-/// Node of the tree: a box around the boxes of all triangles below it and either two children or,
-/// in a leaf, a list of triangle indices, ascending.
+/// Node of the tree. It has a box around the boxes of all triangles below it. It has two children,
+/// or it is a leaf with a list of triangle indices, ascending.
 ///
-/// Boxes and positions are surface-local `float`. A node owns its list. The node on which
-/// CreateChild ran, the top, owns all nodes below it. A copy shares the children: of a top and its
-/// copies only one may reach its destructor. A copy of a node below owns no node, and its children
-/// end with the top.
+/// Boxes and positions are surface-local `float`. Every node owns its list. The node on which
+/// CreateChild ran is the top; it owns all nodes below it, and no other node owns any.
+///
+/// A copy has a list of its own and the same children. A copy of a top owns the nodes below as the
+/// top itself does, so only one of the two may be destroyed. A copy of a node below the top owns no
+/// node. It may be destroyed at any time; its children may not be used after the top is gone. A
+/// move exchanges the contents of both nodes.
 ///
 /// Searches only read and may run on any number of threads; CreateChild excludes all others.
 class KELM_TIN_EXPORT AabbNode {
@@ -74,12 +81,16 @@ class KELM_TIN_EXPORT AabbNode {
     AabbNode(const AabbNode&) = default;
     /// Releases nothing that the target held.
     AabbNode& operator=(const AabbNode&) = default;
+    /// Leaves a default node behind.
+    AabbNode(AabbNode&& other) noexcept;
+    AabbNode& operator=(AabbNode&& other) noexcept;
     ~AabbNode();
 
-    /// Makes this default node the top of a tree over the triangles of `list`, left before right.
+    /// Makes this node, which must be a default one, the top of a tree over the triangles of
+    /// `list`. Nodes are built depth first, left before right.
     ///
     /// A node of more triangles than the tree's capacity is divided at the mean of the centroids.
-    /// A set that cannot be divided on either axis becomes one leaf, a note says so, and the
+    /// A set that cannot be divided on either axis becomes one leaf. A note says so, and the
     /// tree's capacity rises to its size for all nodes built afterwards.
     /// @param triangles the surface's array; boxes are read as stored @param list ascending
     /// indices into it @param tree the tree that holds this node
@@ -101,7 +112,7 @@ class KELM_TIN_EXPORT AabbNode {
 
     /// @return the child, owned by the top of its tree; null in a leaf
     AabbNode* GetLeft() const { return mpoLeft; }
-    AabbNode* GetRight() const { return mpoRight; }
+    AabbNode* GetRight() const { return mpoLeft == nullptr ? nullptr : mpoLeft + 1; }
     const BBox<float, point2_t<float>>& GetBBox() const { return moBBox; }
     /// @return the triangle indices of a leaf; empty in an inner node
     const std::vector<unsigned>& GetLeaves() const { return moLeaves; }
@@ -125,20 +136,29 @@ class KELM_TIN_EXPORT AabbNode {
                 std::vector<unsigned>& right) const;
 
   private:
-    class Blocks;
-    class Builder;
+    friend class AabbTree;
+    struct Site;
 
-    AabbNode* mpoLeft = nullptr;
-    AabbNode* mpoRight = nullptr;
+    void Build(const Triangle* triangles, std::vector<unsigned> order, AabbTree& rTree);
+
+    AabbNode* mpoLeft = nullptr;           ///< the right child stands right behind the left one
+    index::NodeBlock* mpoBlocks = nullptr; ///< memory of all nodes below; null but in a top
     BBox<float, point2_t<float>> moBBox;
     std::vector<unsigned> moLeaves;
 };
 
 /// Index of a surface: a binary tree of boxes over its triangles.
 ///
-/// The tree holds triangle indices and no link to the surface: the caller keeps both together and
-/// passes the tree to the surface's queries. Searches, GetObjBytes and EstimateObjBytes may run on
-/// any number of threads; a build or a change of parameters excludes all others.
+/// The tree holds triangle indices and the number of triangles, but no link to the surface. The
+/// caller keeps both together and passes the tree to the surface's queries, which refuse a tree of
+/// another number of triangles. A tree of another surface with the same number leads to wrong
+/// answers.
+///
+/// A copy names the same nodes. Of the trees that name the same nodes only one may be destroyed or
+/// built anew. A move exchanges the contents of both trees.
+///
+/// Searches, GetObjBytes and EstimateObjBytes may run on any number of threads; a build or a change
+/// of parameters excludes all others.
 class KELM_TIN_EXPORT AabbTree {
   public:
     /// An empty tree with the default parameters.
@@ -146,15 +166,19 @@ class KELM_TIN_EXPORT AabbTree {
     /// Builds over a surface with the default parameters. Fails as CreateTree does.
     explicit AabbTree(const Tin* poTin);
     AabbTree(const AabbTree&) = default;
-    /// Copies the fields as they stand and releases nothing: of the trees that then name the same
-    /// nodes only one may reach its destructor.
+    /// Copies the fields as they stand and releases nothing.
     AabbTree& operator=(const AabbTree&) = default;
+    /// Leaves an empty tree with the default parameters behind.
+    AabbTree(AabbTree&& other) noexcept;
+    AabbTree& operator=(AabbTree&& other) noexcept;
     ~AabbTree();
 
     /// Releases the old nodes and builds anew, with the present parameters. A surface without
     /// triangles gives a tree without a root, which answers every search with nothing.
-    /// @throw kelm::ParameterException if poTin is null, with nothing changed; std::bad_alloc, the
-    /// tree is then partly built and of no use but to be built anew or destroyed
+    ///
+    /// At its peak a build holds, besides the tree, two arrays of one index a triangle.
+    /// @throw kelm::ParameterException if poTin is null, with nothing changed; std::bad_alloc, and
+    /// the tree is then partly built: build it anew or destroy it
     void CreateTree(const Tin* poTin);
 
     /// As the searches of the root.
@@ -167,6 +191,8 @@ class KELM_TIN_EXPORT AabbTree {
     /// @return nodes of the last build, inner nodes and leaves
     unsigned GetNodeCount() const { return mnNodeCount; }
     void IncreaseNodeCount() { ++mnNodeCount; }
+    /// @return triangles of the last build
+    unsigned GetTriangleCount() const { return mnTriangleCount; }
     unsigned GetCapacity() const { return moInfo.GetCapacity(); }
     void SetCapacity(int nCapacity) { moInfo.SetCapacity(static_cast<unsigned>(nCapacity)); }
     bool TestCapacity(int n) const { return moInfo.TestCapacity(n); }

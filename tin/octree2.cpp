@@ -1,8 +1,8 @@
 #include "tin/octree2.h"
 
-#include "tin/detail/parallelblocks.h"
+#include "tin/parallel/parallelblocks.h"
+#include "tin/rules/extent.h"
 
-#include <algorithm>
 #include <array>
 
 namespace kelm::tin {
@@ -16,10 +16,23 @@ constexpr int BOUNDS_THREADS = 4;
 /// Keeps the finite points of the root's cell off its faces.
 constexpr double MARGIN = 1.0;
 
-void Extend(containers::OctoTreeNode<double, unsigned>::Box& box, const KeyPoint<double>& p) {
-    box.min = {std::min(box.min.x, p.x), std::min(box.min.y, p.y), std::min(box.min.z, p.z)};
-    box.max = {std::max(box.max.x, p.x), std::max(box.max.y, p.y), std::max(box.max.z, p.z)};
-}
+/// Range of the finite points on each axis.
+struct Extent3 {
+    rules::Range<double> x;
+    rules::Range<double> y;
+    rules::Range<double> z;
+
+    void Add(const KeyPoint<double>& p) {
+        x.Add(p.x);
+        y.Add(p.y);
+        z.Add(p.z);
+    }
+    void Add(const Extent3& other) {
+        x.Add(other.x.low, other.x.high);
+        y.Add(other.y.low, other.y.high);
+        z.Add(other.z.low, other.z.high);
+    }
+};
 
 } // namespace
 
@@ -30,23 +43,20 @@ Octree2::Octree2(std::vector<KeyPoint<double>>& points, std::vector<unsigned>& k
 }
 
 Octree2::Box Octree2::ComputeBounds(const std::vector<KeyPoint<double>>& points) {
-    const auto first = std::find_if(points.begin(), points.end(), IsFinite);
-    const KeyPoint<double> start = first == points.end() ? KeyPoint<double>{} : *first;
-    std::array<Box, BOUNDS_THREADS> boxes;
-    boxes.fill({start, start});
-    detail::ParallelBlocks(static_cast<unsigned>(points.size()), BOUNDS_THREADS,
-                           [&](unsigned thread, unsigned begin, unsigned end) {
-                               for (unsigned i = begin; i < end; ++i)
-                                   if (IsFinite(points[i]))
-                                       Extend(boxes[thread], points[i]);
-                           });
-    for (const Box& box : boxes) {
-        Extend(boxes[0], box.min);
-        Extend(boxes[0], box.max);
-    }
-    const auto& [low, high] = boxes[0];
-    return {{low.x - MARGIN, low.y - MARGIN, low.z - MARGIN},
-            {high.x + MARGIN, high.y + MARGIN, high.z + MARGIN}};
+    std::array<Extent3, BOUNDS_THREADS> extents;
+    parallel::ParallelBlocks(static_cast<unsigned>(points.size()), BOUNDS_THREADS,
+                             [&](unsigned thread, unsigned begin, unsigned end) {
+                                 for (unsigned i = begin; i < end; ++i)
+                                     if (IsFinite(points[i]))
+                                         extents[thread].Add(points[i]);
+                             });
+    for (const Extent3& extent : extents)
+        extents[0].Add(extent);
+    const auto& [x, y, z] = extents[0];
+    if (x.low > x.high) // no point is finite
+        return {{-MARGIN, -MARGIN, -MARGIN}, {MARGIN, MARGIN, MARGIN}};
+    return {{x.low - MARGIN, y.low - MARGIN, z.low - MARGIN},
+            {x.high + MARGIN, y.high + MARGIN, z.high + MARGIN}};
 }
 
 } // namespace kelm::tin

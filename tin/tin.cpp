@@ -1,7 +1,9 @@
 #include "tin/tin.h"
 
 #include "services/exception.h"
-#include "tin/detail/parallelblocks.h"
+#include "tin/parallel/parallelblocks.h"
+#include "tin/rules/extent.h"
+#include "tin/rules/frame.h"
 
 #include <cassert>
 #include <limits>
@@ -15,22 +17,14 @@ namespace {
 /// Triangle count above which a loop over the triangles is worth a team.
 constexpr unsigned PARALLEL_ABOVE = 1000;
 
-constexpr float HIGHEST = std::numeric_limits<float>::max();
-
-/// Range of one coordinate over all vertices. A NaN fails both tests.
+/// Range of one coordinate over all vertices.
 template <float point3_t<float>::*Coordinate>
 void ComputeRange(const point3_t<float>* vertices, unsigned count, float& low, float& high) {
-    float lowest = HIGHEST;
-    float highest = -HIGHEST;
-    for (unsigned i = 0; i < count; ++i) {
-        const float value = vertices[i].*Coordinate;
-        if (lowest > value)
-            lowest = value;
-        if (value > highest)
-            highest = value;
-    }
-    low = lowest;
-    high = highest;
+    rules::Range<float> range;
+    for (unsigned i = 0; i < count; ++i)
+        range.Add(vertices[i].*Coordinate);
+    low = range.low;
+    high = range.high;
 }
 
 void SetTriangles(Triangle* triangles, unsigned triangleCount, point3_t<float>* vertices,
@@ -42,8 +36,15 @@ void SetTriangles(Triangle* triangles, unsigned triangleCount, point3_t<float>* 
             triangles[i].SetVertices(&vertices[id.id0], &vertices[id.id1], &vertices[id.id2]);
         }
     };
-    detail::ParallelBlocks(triangleCount, detail::GetTeamAbove(PARALLEL_ABOVE, triangleCount),
-                           fill);
+    parallel::ParallelBlocks(triangleCount, parallel::GetTeamAbove(PARALLEL_ABOVE, triangleCount),
+                             fill);
+}
+
+/// @param cells triangles, or the index triples of them
+void TestArrays(const void* vertices, unsigned vertexCount, const void* cells,
+                unsigned triangleCount, const char* expected, unsigned line) {
+    if (vertexCount > 0 && triangleCount > 0 && (vertices == nullptr || cells == nullptr))
+        throw DataException(expected, "tin/tin", __PRETTY_FUNCTION__, line);
 }
 
 } // namespace
@@ -51,11 +52,10 @@ void SetTriangles(Triangle* triangles, unsigned triangleCount, point3_t<float>* 
 Tin::Tin(point3_t<float>* const vertices, unsigned vertexCount, Triangle_Id* const ids,
          unsigned triangleCount, const double& xBase, const double& yBase)
     : mdfXBase(xBase), mdfYBase(yBase) {
-    if (triangleCount > 0 && (ids == nullptr || (vertices == nullptr && vertexCount > 0)))
-        throw DataException("vertices and index triples must be non-null", "tin/tin",
-                            __PRETTY_FUNCTION__, __LINE__);
-    std::unique_ptr<Triangle[]> triangles(new Triangle[triangleCount]);
+    TestArrays(vertices, vertexCount, ids, triangleCount,
+               "vertices and index triples must be non-null", __LINE__);
     // Without vertices a triple leads nowhere, and the array is released unread.
+    std::unique_ptr<Triangle[]> triangles(new Triangle[vertexCount > 0 ? triangleCount : 0]);
     if (vertexCount > 0)
         SetTriangles(triangles.get(), triangleCount, vertices, vertexCount, ids);
     delete[] ids;
@@ -67,6 +67,8 @@ Tin::Tin(point3_t<float>* const vertices, unsigned vertexCount, Triangle_Id* con
 Tin::Tin(point3_t<float>* const vertices, unsigned vertexCount, Triangle* const triangles,
          unsigned triangleCount, const double& xBase, const double& yBase)
     : mdfXBase(xBase), mdfYBase(yBase) {
+    TestArrays(vertices, vertexCount, triangles, triangleCount,
+               "vertices and triangles must be non-null", __LINE__);
     Init(vertices, vertexCount, triangles, triangleCount);
 }
 
@@ -76,11 +78,7 @@ Tin::Tin(const Tin& other)
       mdfYBase(other.mdfYBase), moBBox(other.moBBox), mnThreads(other.mnThreads) {}
 
 Tin& Tin::operator=(const Tin& other) {
-    if (mbOwnsArrays && mpoTriangles != other.mpoTriangles) {
-        delete[] mpoTriangles;
-        delete[] mpoVertices;
-        mbOwnsArrays = false;
-    }
+    mbOwnsArrays = mbOwnsArrays && mpoTriangles == other.mpoTriangles;
     mpoTriangles = other.mpoTriangles;
     mnTriangles = other.mnTriangles;
     mpoVertices = other.mpoVertices;
@@ -92,18 +90,26 @@ Tin& Tin::operator=(const Tin& other) {
     return *this;
 }
 
-Tin::Tin(Tin&& other) noexcept {
-    *this = std::move(other);
+Tin::Tin(Tin&& other) noexcept : Tin(static_cast<const Tin&>(other)) {
+    mbOwnsArrays = std::exchange(other.mbOwnsArrays, false);
 }
 
 Tin& Tin::operator=(Tin&& other) noexcept {
+    if (&other == this)
+        return *this;
+    const bool isShared = mpoTriangles == other.mpoTriangles;
+    if (!isShared)
+        Release();
     *this = static_cast<const Tin&>(other);
-    if (&other != this && std::exchange(other.mbOwnsArrays, false))
-        mbOwnsArrays = true;
+    mbOwnsArrays = std::exchange(other.mbOwnsArrays, false) || mbOwnsArrays;
     return *this;
 }
 
 Tin::~Tin() {
+    Release();
+}
+
+void Tin::Release() noexcept {
     if (!mbOwnsArrays)
         return;
     delete[] mpoTriangles;
@@ -138,11 +144,12 @@ void Tin::ComputeBBox() {
 }
 
 void Tin::ComputeTriBBox() {
-    detail::ParallelBlocks(mnTriangles, detail::GetTeamAbove(PARALLEL_ABOVE, mnTriangles),
-                           [this](unsigned, unsigned first, unsigned last) {
-                               for (unsigned i = first; i < last; ++i)
-                                   mpoTriangles[i].ComputeBBox();
-                           });
+    const auto compute = [this](unsigned, unsigned first, unsigned last) {
+        for (unsigned i = first; i < last; ++i)
+            mpoTriangles[i].ComputeBBox();
+    };
+    parallel::ParallelBlocks(mnTriangles, parallel::GetTeamAbove(PARALLEL_ABOVE, mnTriangles),
+                             compute);
 }
 
 point3_t<float>* Tin::GetVertex(unsigned i) const {
@@ -169,12 +176,9 @@ void Tin::GetXYBase(double& x, double& y) const {
 }
 
 void Tin::GetRawBBox(BBox<double, point3_t<double>>& box) const {
-    const auto toMap = [this](const point3_t<float>& p) {
-        return point3_t<double>{static_cast<double>(p.x) + mdfXBase,
-                                static_cast<double>(p.y) + mdfYBase, static_cast<double>(p.z)};
-    };
-    box.min = toMap(moBBox.min);
-    box.max = toMap(moBBox.max);
+    const rules::Frame frame(mdfXBase, mdfYBase);
+    box.min = frame.ToMap(moBBox.min);
+    box.max = frame.ToMap(moBBox.max);
 }
 
 void Tin::SetHeightRange(float low, float high) {

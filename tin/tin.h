@@ -4,16 +4,10 @@
 #include "tin/point.h"
 #include "tin/tinexport.h"
 #include "tin/triangle.h"
+#include "tin/triangleid.h"
 
 #include <cstdint>
 #include <vector>
-
-/// Positions in a vertex array of the three corners of a triangle.
-struct Triangle_Id {
-    std::uint32_t id0;
-    std::uint32_t id1;
-    std::uint32_t id2;
-};
 
 namespace kelm::tin {
 
@@ -22,14 +16,16 @@ class AabbTree;
 /// A surface: an array of vertices, an array of triangles over them, and the XY base that leads
 /// from surface-local to map coordinates.
 ///
-/// A `float` argument is surface-local, a `double` argument a map coordinate; map x is local x plus
-/// the base's x, and likewise y. Heights have no base. A surface knows no file, no datum and no
-/// index: a caller that wants its queries fast builds an AabbTree over it and passes that along.
+/// A `float` argument is surface-local, a `double` argument is a map coordinate. Map x is local x
+/// plus the base's x; the same holds for y. Heights have no base. A surface knows no file, no datum
+/// and no index. To make its queries fast, build an AabbTree over it and pass it along.
 ///
-/// A surface is empty, with both arrays null, or has vertices and triangles, for life. It owns both
-/// arrays, which must come from the array form of new; what its accessors hand out stays its own.
-/// A copy shows the same arrays without owning them: only their owner releases them, and no copy is
-/// to be used after that. A move hands the ownership on; the source goes on showing the arrays.
+/// A surface is empty, with both arrays null, or has vertices and triangles; this never changes. It
+/// owns both arrays, which must come from the array form of new. What its accessors hand out stays
+/// its own.
+///
+/// A copy refers to the same arrays but does not own them. Do not use it after the owner is gone. A
+/// move hands the ownership on; the source still refers to the arrays, as a copy does.
 ///
 /// The constant operations may run on any number of threads at a time, as long as nobody writes.
 class KELM_TIN_EXPORT Tin {
@@ -40,22 +36,24 @@ class KELM_TIN_EXPORT Tin {
     /// below vertexCount, which is not tested
     /// @param vertexCount,triangleCount if one is zero the surface is empty; at most 2^31 - 1
     /// @param xBase,yBase map coordinates of the local origin
-    /// @throw kelm::DataException if vertices or ids is null where it is needed, std::bad_alloc;
-    /// nothing has been taken over or released then
+    /// @throw kelm::DataException if both counts are above zero and an array is null;
+    /// std::bad_alloc. Nothing has been taken over or released then
     Tin(point3_t<float>* const vertices, unsigned vertexCount, Triangle_Id* const ids,
         unsigned triangleCount, const double& xBase, const double& yBase);
     /// Takes ready triangles, whose vertices lie in `vertices` and whose boxes are set. Both arrays
     /// are taken over if both counts are above zero; else both stay the caller's.
+    /// @throw kelm::DataException as above
     Tin(point3_t<float>* const vertices, unsigned vertexCount, Triangle* const triangles,
         unsigned triangleCount, const double& xBase, const double& yBase);
     /// The copy owns nothing.
     Tin(const Tin& other);
-    /// Releases the arrays that the target owns, unless `other` shows them too: then it goes on
-    /// owning them.
+    /// Copies as the constructor does. Arrays that the target owned are not released: take their
+    /// addresses before, and delete them, or move another surface into the target instead. The
+    /// target goes on owning arrays that `other` refers to as well.
     Tin& operator=(const Tin& other);
-    /// Takes over what the other owns; the other goes on showing the arrays, as a copy does.
+    /// Takes over what the other owns.
     Tin(Tin&& other) noexcept;
-    /// The same. Releases as the assignment of a copy does.
+    /// The same. Releases arrays that the target owned, unless the other refers to them as well.
     Tin& operator=(Tin&& other) noexcept;
     ~Tin();
 
@@ -86,32 +84,34 @@ class KELM_TIN_EXPORT Tin {
     /// @return bytes that a surface of these counts will hold
     static std::uint64_t EstimateObjBytes(unsigned vertexCount, unsigned triangleCount);
 
-    /// The greatest height of the triangles at a position, surface-local or in map coordinates;
-    /// a map position is narrowed to `float` once the base is subtracted.
-    /// @param tree an index of this surface, or null to scan all triangles
+    // The queries. `tree` is an index of this surface, or null to scan all triangles. An index of
+    // another number of triangles is refused with a kelm::ParameterException; one without a root
+    // finds nothing. All of them can throw std::bad_alloc.
+
+    /// The greatest height of the triangles at a position, surface-local or in map coordinates. A
+    /// map position is narrowed to `float` once the base is subtracted. A NaN finds no height.
     /// @param height untouched if the position lies outside the surface's box; the lowest finite
     /// `float` if it lies inside the box but in no triangle
-    /// @return is there a height? @throw std::bad_alloc
+    /// @return is there a height?
     bool GetHeight(const float& x, const float& y, float& height, const AabbTree* tree) const;
     bool GetHeight(const double& x, const double& y, float& height, const AabbTree* tree) const;
 
     /// The highest crossing of the segment from a to b with the surface, as the segment's own
     /// height there.
-    /// @param tree an index of this surface, or null to scan all triangles
     /// @param h untouched if the segment misses the surface's box in plan; the lowest finite
-    /// `float` if it meets the box but crosses no triangle
-    /// @return is there a crossing? @throw std::bad_alloc
+    /// `float` if it meets the box but crosses no triangle. It may be a coordinate of a or b
+    /// @return is there a crossing?
     bool GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h,
                                 const AabbTree* tree) const;
     bool GetLineIntersectHeight(const point3_t<double>& a, const point3_t<double>& b, float& h,
                                 const AabbTree* tree) const;
 
-    /// A new surface of the triangles that meet a region, with the vertices they use; the caller
-    /// deletes it. It shares nothing with this one.
-    /// @param tree null: triangles of which an edge meets the region, in ascending order. An index
-    /// of this surface: every triangle of each leaf whose box meets the region, in tree order
-    /// @return null if there is none. A NaN bound leaves its side open without an index
-    /// and meets no box of one @throw std::bad_alloc
+    /// A new surface of the triangles that meet a region, with the vertices that they use; the
+    /// caller deletes it. It shares nothing with this one. Without an index it takes the triangles
+    /// of which an edge meets the region, in ascending order. With one it takes all triangles of
+    /// each leaf whose box meets the region, in tree order.
+    /// @return null if there is none. A NaN bound leaves its side open without an index, and meets
+    /// no box of one
     Tin* SubsetByRegion(const BBox<float, point2_t<float>>& region, const AabbTree* tree) const;
     Tin* SubsetByRegion(const BBox<double, point2_t<double>>& region, const AabbTree* tree) const;
     /// The same for the triangles that the segments between consecutive points touch in plan, in
@@ -130,9 +130,9 @@ class KELM_TIN_EXPORT Tin {
     void Init(point3_t<float>* const vertices, unsigned vertexCount, Triangle* const triangles,
               unsigned triangleCount);
 
-    /// Triangles that hold a position, surface-local. Without a tree ascending and appended to
-    /// `result`; with one in tree order, and entries that stood in `result` are put to the same
-    /// test. @throw std::bad_alloc
+    /// Triangles that hold a position, surface-local. Without a tree they are ascending and
+    /// appended to `result`. With one they are in tree order, and entries that stood in `result`
+    /// are put to the same test.
     void FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,
                               const AabbTree* tree) const;
     /// Triangles of a region, surface-local, as SubsetByRegion tells; appended to `result`.
@@ -145,13 +145,18 @@ class KELM_TIN_EXPORT Tin {
     void FindTrianglesByLine(const P& a, const P& b, std::vector<unsigned>& out,
                              const AabbTree* tree) const;
 
-    /// A new surface of the triangles whose byte in the mask is 1, as SubsetByRegion gives it.
+    /// A new surface of the triangles whose byte in the mask is 1, as SubsetByRegion gives it. A
+    /// mask of another length than the triangles selects by what it has.
     Tin* Subset(const std::vector<unsigned char>& mask) const;
     /// A new surface of the listed triangles, in list order, repeats included. Vertices keep the
     /// order they have here. @return null if the list is empty
+    /// @throw kelm::ParameterException if an index is not below the triangle count
     Tin* Subset(const std::vector<unsigned>& indices) const;
 
   private:
+    void Release() noexcept;
+    void TestTree(const AabbTree* tree) const;
+
     Triangle* mpoTriangles = nullptr;
     std::uint32_t mnTriangles = 0;
     point3_t<float>* mpoVertices = nullptr;
@@ -159,7 +164,7 @@ class KELM_TIN_EXPORT Tin {
     double mdfXBase;
     double mdfYBase;
     BBox<float, point3_t<float>> moBBox;
-    std::int32_t mnThreads; ///< lists of a scan; the thread setting at construction
+    std::int32_t mnThreads; ///< most threads of a scan; the thread setting at construction
     bool mbOwnsArrays = false;
 };
 

@@ -1,123 +1,109 @@
 #include "tin/tin.h"
 
 #include "tin/aabbtree.h"
-#include "tin/detail/leafwalk.h"
-#include "tin/detail/parallelscan.h"
-#include "tin/detail/prefetch.h"
-#include "tin/detail/segmentprobe.h"
+#include "tin/index/leafwalk.h"
+#include "tin/index/prefetch.h"
+#include "tin/index/search.h"
+#include "tin/index/segmentprobe.h"
 #include "tin/ray2.h"
+#include "tin/rules/frame.h"
 
 #include <array>
-#include <limits>
 
 namespace kelm::tin {
 
 namespace {
 
-constexpr float LOWEST = -std::numeric_limits<float>::max();
-
-/// The crossing rule: the highest wins, and a NaN replaces nothing.
-void KeepHighest(const Triangle& triangle, const point3_t<float>& a, const point3_t<float>& b,
-                 float& height) {
+/// Adds the height at which a segment crosses a triangle, if it does.
+void AddCrossing(const Triangle& triangle, const point3_t<float>& a, const point3_t<float>& b,
+                 rules::Highest& highest) {
     float h;
-    if (triangle.GetLineIntersectHeight(a, b, h) == IR_Inside && h > height)
-        height = h;
+    if (triangle.IsIntersectedLine(a.x, a.y, b.x, b.y) &&
+        triangle.GetLineIntersectHeight(a, b, h) == IR_Inside)
+        highest.Add(h);
 }
 
-/// Highest crossing of a segment with the triangles of the leaves that it meets.
+/// Crossings of a segment with the triangles of the leaves that it meets.
 ///
-/// They are tested in batches, in their order: a batch once its triangles, and then their vertices,
-/// have been asked for, since a walk over a large surface mostly waits for memory.
+/// Triangles are tested in batches, in their order. Those of a batch, and then their vertices, are
+/// asked for ahead, since a walk over a large surface mostly waits for memory.
 class CrossingBatch {
   public:
-    CrossingBatch(const Triangle* triangles, const point3_t<float>& a, const point3_t<float>& b)
-        : mpoTriangles(triangles), mrA(a), mrB(b) {}
+    CrossingBatch(const Triangle* triangles, const point3_t<float>& a, const point3_t<float>& b,
+                  rules::Highest& rHighest)
+        : mpoTriangles(triangles), mrA(a), mrB(b), mrHighest(rHighest) {}
 
     void Add(const std::vector<unsigned>& leaves) {
         for (const unsigned id : leaves) {
-            detail::Prefetch(mpoTriangles + id);
-            mao[mnSize++] = mpoTriangles + id;
-            if (mnSize == mao.size())
+            index::Prefetch(mpoTriangles + id);
+            maoBatch[mnSize++] = mpoTriangles + id;
+            if (mnSize == maoBatch.size())
                 TestAll();
         }
     }
 
-    /// Tests what is left first.
-    float GetHighest() {
-        TestAll();
-        return mfHighest;
-    }
-
-  private:
     void TestAll() {
         for (std::size_t i = 0; i < mnSize; ++i)
             for (int k = 0; k < 3; ++k)
-                detail::Prefetch(mao[i]->GetVertex(k));
+                index::Prefetch(maoBatch[i]->GetVertex(k));
         for (std::size_t i = 0; i < mnSize; ++i)
-            if (mao[i]->IsIntersectedLine(mrA.x, mrA.y, mrB.x, mrB.y))
-                KeepHighest(*mao[i], mrA, mrB, mfHighest);
+            AddCrossing(*maoBatch[i], mrA, mrB, mrHighest);
         mnSize = 0;
     }
 
+  private:
     const Triangle* mpoTriangles;
     const point3_t<float>& mrA;
     const point3_t<float>& mrB;
-    std::array<const Triangle*, 32> mao;
+    rules::Highest& mrHighest;
+    std::array<const Triangle*, 32> maoBatch;
     std::size_t mnSize = 0;
-    float mfHighest = LOWEST;
 };
 
 } // namespace
 
 bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h,
                                  const AabbTree* tree) const {
+    TestTree(tree);
     if (!IsIntersectedBBox(moBBox, a, b))
         return false;
-    h = LOWEST;
-    if (tree != nullptr) {
-        const detail::SegmentProbe probe(a, b);
+    const auto walk = [&](const AabbNode* root, rules::Highest& highest) {
+        const index::SegmentProbe probe(a, b);
         const auto meets = [&](const BBox<float, point2_t<float>>& box) {
             return probe.IsMet(box);
         };
-        CrossingBatch batch(mpoTriangles, a, b);
-        detail::VisitLeaves(tree->GetRoot(), meets,
-                            [&](const std::vector<unsigned>& leaves) { batch.Add(leaves); });
-        h = batch.GetHighest();
-    } else {
-        std::vector<unsigned> list;
-        FindTrianglesByLine(a, b, list, nullptr);
-        for (const unsigned id : list)
-            KeepHighest(mpoTriangles[id], a, b, h);
-    }
-    return h > LOWEST;
+        CrossingBatch batch(mpoTriangles, a, b, highest);
+        index::VisitLeaves(root, meets,
+                           [&](const std::vector<unsigned>& leaves) { batch.Add(leaves); });
+        batch.TestAll();
+    };
+    const auto ask = [&](rules::Highest& highest, unsigned id) {
+        AddCrossing(mpoTriangles[id], a, b, highest);
+    };
+    // h may be a coordinate of a or b, so it is written last.
+    const rules::Highest highest =
+        index::Search(tree, mnTriangles, mnThreads).FindHighest(walk, ask);
+    h = highest.Get();
+    return highest.IsFound();
 }
 
 bool Tin::GetLineIntersectHeight(const point3_t<double>& a, const point3_t<double>& b, float& h,
                                  const AabbTree* tree) const {
-    const auto toLocal = [this](const point3_t<double>& p) {
-        return point3_t<float>{static_cast<float>(p.x - mdfXBase),
-                               static_cast<float>(p.y - mdfYBase), static_cast<float>(p.z)};
-    };
-    return GetLineIntersectHeight(toLocal(a), toLocal(b), h, tree);
+    const rules::Frame frame(mdfXBase, mdfYBase);
+    return GetLineIntersectHeight(frame.ToLocal(a), frame.ToLocal(b), h, tree);
 }
 
 template <typename P>
 void Tin::FindTrianglesByLine(const P& a, const P& b, std::vector<unsigned>& out,
                               const AabbTree* tree) const {
+    TestTree(tree);
     const auto touches = [&](unsigned id) {
         return mpoTriangles[id].IsIntersectedLine(a.x, a.y, b.x, b.y);
     };
-    if (tree == nullptr) {
-        detail::ParallelScan(mnTriangles, mnThreads, touches, out);
-        return;
-    }
-    if (tree->GetRoot() != nullptr)
-        tree->GetRoot()->FindLeavesByLine(a, b, out);
-    std::vector<unsigned> touched;
-    for (const unsigned id : out)
-        if (touches(id))
-            touched.push_back(id);
-    out.swap(touched);
+    const auto findLeaves = [&](const AabbNode& root, std::vector<unsigned>& list) {
+        root.FindLeavesByLine(a, b, list);
+    };
+    index::Search(tree, mnTriangles, mnThreads).List(findLeaves, touches, touches, out);
 }
 
 template KELM_TIN_EXPORT void Tin::FindTrianglesByLine(const point2_t<float>&,

@@ -3,7 +3,7 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
-#include "tin/detail/shapecount.h"
+#include "tin/load/shapecount.h"
 
 #include <algorithm>
 #include <cstdint>
@@ -95,7 +95,7 @@ void TinReader::SetUp(double dfOffset, double dfScale) {
     static_cast<void>(crs.release());
     SetElFactor(dfOffset, dfScale);
     SetOutputVerticalDatum(meSourceDatum);
-    mnShapeCount = detail::GetShapeCount(*mpLayer);
+    mnShapeCount = load::GetShapeCount(*mpLayer);
     ZARVertex low{};
     ZARVertex high{};
     ZARGetExtents(mpLayer, &low, &high);
@@ -138,8 +138,6 @@ void TinReader::SetElFactor(const double dfOffset, const double dfScale) {
                                   "The scale parameter may not be zero");
     mdfElOffset = dfOffset;
     mdfElScale = dfScale;
-    mpfnElevation =
-        dfOffset == 0.0 && dfScale == 1.0 ? &TinReader::CopyHeight : &TinReader::ApplyElFactor;
 }
 
 void TinReader::SetOutputVerticalDatum(DatumType eType) {
@@ -164,14 +162,6 @@ void TinReader::SetOutputVerticalDatum(DatumType eType) {
     mpfnHeightConvert = meSourceDatum == eType || eType == VD_Other || mbLocalCRS
                             ? &TinReader::HeightConvertSimple
                             : &TinReader::HeightConvert;
-}
-
-double TinReader::ApplyElFactor(float h) const {
-    return (static_cast<double>(h) + mdfElOffset) * mdfElScale;
-}
-
-double TinReader::CopyHeight(float h) const {
-    return static_cast<double>(h);
 }
 
 std::size_t TinReader::EstimateObjBytes_Tin() const {

@@ -17,12 +17,18 @@ struct ZARLayer_t;
 
 namespace kelm::tin {
 
+namespace load {
+class CornerList;
+struct ElevationFactor;
+struct HeightColumn;
+} // namespace load
+
 /// Reads surfaces from the polygon layer of a file.
 ///
-/// A reader keeps its file open for its whole life. It knows the layer's count, extents and
-/// coordinate reference from construction on; each Load walks the layer afresh and makes a new
-/// surface, which does not depend on the reader. A stored height passes through two stages on its
-/// way: the elevation factor, then the change from the source to the output vertical datum.
+/// A reader keeps its file open for its whole life. It knows the layer's count, extents and CRS
+/// from construction on. Each Load walks the layer afresh and makes a new surface, which does not
+/// depend on the reader. A stored height first gets the elevation factor; then it is changed from
+/// the source to the output vertical datum.
 ///
 /// Loads on one reader run one after the other, whatever threads ask for them. The accessors and
 /// estimates may run during a load; SetOutputVerticalDatum and the destructor may not. Readers
@@ -32,7 +38,7 @@ class KELM_TIN_EXPORT TinReader {
     using DatumType = ogc::cs::DatumType;
 
     /// Usually called by TinReaderFactory::CreateTinReader.
-    /// @param poLayer taken over, with its file, unless the constructor throws; a reader on null
+    /// @param poLayer taken over, with its file, unless the constructor throws. A reader on null
     /// loads nothing @param dfOffset,dfScale elevation factor: a stored height h counts as
     /// (h + dfOffset) * dfScale; both finite @param eSourceDatum vertical datum of the stored
     /// heights, and the first output datum
@@ -48,15 +54,17 @@ class KELM_TIN_EXPORT TinReader {
 
     /// Loads the layer, or those of its polygons that meet a window.
     ///
-    /// A shape of four vertices is a triangle as it stands; a larger one is cut into triangles, or
+    /// A shape of four vertices is a triangle as it stands. A larger one is cut into triangles, or
     /// left out with a warning that names it. Corners that agree within 1e-9 map units on all three
     /// axes become one vertex. A polygon that meets the window enters whole. A corner that is not
-    /// finite is never welded; nor are corners so far out that doubles no longer resolve 1 unit.
+    /// finite is never welded; nor are corners so far out that a `double` no longer resolves 1
+    /// unit.
     /// @param poWindow in the map coordinates of the layer; null for the whole layer
     /// @return a new surface, which the caller deletes; null if no polygon gave a triangle
     /// @throw kelm::DataException for a shape of fewer than four vertices or heights that cannot be
-    /// converted; kelm::Exception if welding fails; what the store throws; std::bad_alloc. The
-    /// reader stays usable
+    /// converted; kelm::Exception if welding fails; std::length_error beyond 2147483647 corners,
+    /// which are 715827882 triangles; what the store throws; std::bad_alloc. The reader stays
+    /// usable
     Tin* Load(const BBox<double, point2_t<double>>* poWindow);
 
     /// Chooses the vertical datum in which later loads deliver heights. Heights of a local CRS are
@@ -92,7 +100,7 @@ class KELM_TIN_EXPORT TinReader {
   protected:
     /// Takes the CRS over, unless it throws, and joins it with the source datum.
     void SetDbmCRS(ogc::cs::ICRS* poCRS);
-    /// Stores the elevation factor and chooses the function that applies it.
+    /// Stores the elevation factor. @throw kelm::ParameterException if dfScale is zero
     void SetElFactor(const double dfOffset, const double dfScale);
     double ApplyElFactor(float h) const;
     double CopyHeight(float h) const;
@@ -122,16 +130,16 @@ class KELM_TIN_EXPORT TinReader {
                                   InterpGrid3D& oGrid) const;
 
   private:
-    class Corners;
-    using ElevationFunction = double (TinReader::*)(float) const;
     using HeightFunction = bool (TinReader::*)(const aabb_t<point2_t<float>>*, point3_t<float>*,
                                                unsigned int) const;
 
     void Init();
     void SetUp(double dfOffset, double dfScale);
     void ReleaseCRS();
-    void ReadShape(int id, const BBox<double, point2_t<double>>* poWindow, Corners& rCorners) const;
-    double GetElevation(float h) const { return (this->*mpfnElevation)(h); }
+    void ReadShape(int id, const BBox<double, point2_t<double>>* poWindow,
+                   load::CornerList& rCorners) const;
+    load::ElevationFactor GetElevationFactor() const;
+    load::HeightColumn GetColumn(point3_t<float>* poPoints, unsigned int nCount) const;
 
     ZARLayer_t* mpLayer;
     int mnShapeCount = 0;
@@ -144,7 +152,6 @@ class KELM_TIN_EXPORT TinReader {
     ogc::ct::IMathTransform* mpoTransform = nullptr;
     bool mbLocalCRS = true;
     threading::Mutex moMutex;
-    ElevationFunction mpfnElevation = &TinReader::CopyHeight;
     HeightFunction mpfnHeightConvert = &TinReader::HeightConvertSimple;
     double mdfElOffset = 0.0;
     double mdfElScale = 1.0;

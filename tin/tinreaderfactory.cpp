@@ -3,7 +3,7 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
-#include "tin/detail/shapecount.h"
+#include "tin/load/shapecount.h"
 #include "tin/tinreader.h"
 
 #include <exception>
@@ -54,7 +54,7 @@ TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int 
         THROW_DATA_EXCEPTION(FormatString(
             "The provided vector layer %d in the input file %s must be defined by polygons.",
             layerNumber, pszFilename));
-    if (detail::GetShapeCount(*layer) <= 0)
+    if (load::GetShapeCount(*layer) <= 0)
         THROW_DATA_EXCEPTION(
             FormatString("The provided vector layer %d in the input file %s is empty.", layerNumber,
                          pszFilename));

@@ -1,12 +1,15 @@
 #include "tin/tinreader.h"
 
+#include "services/exception.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
 #include "tin/detail/polygon.h"
+#include "tin/load/assembly.h"
+#include "tin/load/cornerlist.h"
+#include "tin/load/weld.h"
 #include "tin/triangulate.h"
 
-#include <algorithm>
-#include <stdexcept>
+#include <memory>
 
 namespace kelm::tin {
 
@@ -43,67 +46,17 @@ const ZARShape* FindShape(ZARLayer_t* layer, int id) {
 
 } // namespace
 
-/// Corners and triangles that a load has gathered; no corner is shared yet. The lists grow by a
-/// fixed step rather than by a factor, since the first reservation fits a layer of triangles.
-class TinReader::Corners {
-  public:
-    explicit Corners(int nShapeCount) {
-        moIds.reserve(static_cast<std::size_t>(nShapeCount));
-        moPoints.reserve(3 * static_cast<std::size_t>(nShapeCount));
-    }
-
-    /// The triangle of a shape's first three vertices.
-    void AddTriangle(const ZARShape& oShape) {
-        if (moPoints.size() + 3 > moPoints.capacity())
-            moPoints.reserve(moPoints.capacity() + POINT_STEP);
-        if (moIds.size() >= moIds.capacity())
-            moIds.reserve(moIds.capacity() + ID_STEP);
-        Add(oShape.vertices[0], oShape.vertices[1], oShape.vertices[2]);
-    }
-
-    /// Triangles over the ring of a shape, whose point numbers lead to shape vertices by
-    /// `vertices`.
-    void AddTriangles(const ZARShape& oShape, const std::vector<Triangle_Id>& oTriangles,
-                      const std::vector<unsigned>& vertices) {
-        const std::size_t n = oTriangles.size();
-        if (moPoints.size() + 3 * n > moPoints.capacity())
-            moPoints.reserve(moPoints.capacity() + std::max(3 * n, POINT_STEP));
-        if (moIds.size() + n >= moIds.capacity())
-            moIds.reserve(moIds.capacity() + std::max(n, ID_STEP));
-        for (const Triangle_Id& id : oTriangles)
-            Add(oShape.vertices[vertices[id.id0]], oShape.vertices[vertices[id.id1]],
-                oShape.vertices[vertices[id.id2]]);
-    }
-
-    std::vector<KeyPoint<double>> moPoints;
-    std::vector<Triangle_Id> moIds;
-
-  private:
-    static constexpr std::size_t POINT_STEP = 10000;
-    static constexpr std::size_t ID_STEP = 5000;
-    static constexpr std::size_t MOST_CORNERS = 2147483647;
-
-    void Add(const ZARVertex& a, const ZARVertex& b, const ZARVertex& c) {
-        if (moPoints.size() > MOST_CORNERS - 3)
-            throw std::length_error("the corners of a load are limited to 2147483647");
-        const auto first = static_cast<std::uint32_t>(moPoints.size());
-        for (const ZARVertex* vertex : {&a, &b, &c})
-            moPoints.push_back({vertex->x, vertex->y, vertex->z});
-        moIds.push_back({first, first + 1, first + 2});
-    }
-};
-
 Tin* TinReader::Load(const Window* poWindow) {
     if (mnShapeCount < 1 || (poWindow != nullptr && !TestOverlap(*poWindow, moBBox)))
         return nullptr;
     const ScopedLock lock(moMutex);
-    Corners corners(mnShapeCount);
+    load::CornerList corners(mnShapeCount);
     for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id))
         ReadShape(id, poWindow, corners);
-    return CreateTin(corners.moPoints, corners.moIds);
+    return CreateTin(corners.GetPoints(), corners.GetIds());
 }
 
-void TinReader::ReadShape(int id, const Window* poWindow, Corners& rCorners) const {
+void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCorners) const {
     const ZARShape* shape = FindShape(mpLayer, id);
     if (shape == nullptr)
         return;
@@ -122,6 +75,29 @@ void TinReader::ReadShape(int id, const Window* poWindow, Corners& rCorners) con
         return;
     }
     rCorners.AddTriangles(*shape, triangles, detail::FindRingVertices(*shape));
+}
+
+Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds) {
+    if (oPoints.empty() || oIds.empty())
+        return nullptr;
+    std::vector<unsigned> oKeys(oPoints.size());
+    unsigned nVertices;
+    try {
+        nVertices = load::Weld(oPoints, oIds, oKeys);
+    } catch (...) {
+        throw Exception("Octree2 error", "tin/tinreader", __PRETTY_FUNCTION__, __LINE__);
+    }
+    load::Assembly parts = load::Assemble(oPoints, oIds, oKeys, nVertices);
+    mdfXBase = parts.base.x;
+    mdfYBase = parts.base.y;
+    const aabb_t<point2_t<float>> oBox = load::ComputeBox(parts);
+    (this->*mpfnHeightConvert)(&oBox, parts.vertices.get(), nVertices);
+    auto surface =
+        std::make_unique<Tin>(parts.vertices.get(), parts.vertexCount, parts.triangles.get(),
+                              parts.triangleCount, mdfXBase, mdfYBase);
+    static_cast<void>(parts.vertices.release());
+    static_cast<void>(parts.triangles.release());
+    return surface.release();
 }
 
 } // namespace kelm::tin

@@ -1,84 +1,89 @@
 #include "tin/tin.h"
 
+#include "services/exception.h"
+#include "services/reporting.h"
 #include "tin/aabbtree.h"
-#include "tin/detail/leafwalk.h"
-#include "tin/detail/parallelscan.h"
-#include "tin/detail/pointprobe.h"
-
-#include <limits>
+#include "tin/index/leafwalk.h"
+#include "tin/index/pointprobe.h"
+#include "tin/index/search.h"
+#include "tin/rules/frame.h"
 
 namespace kelm::tin {
 
 namespace {
 
-constexpr float LOWEST = -std::numeric_limits<float>::max();
-
-/// The height rule: the greatest wins, and a NaN replaces nothing.
-void KeepHighest(const Triangle& triangle, float x, float y, float& height) {
-    float h;
-    if (triangle.GetHeight(x, y, h) && h > height)
-        height = h;
-}
+using index::Search;
 
 } // namespace
 
+/// A tree without a root leads to no triangle, so it needs no refusal.
+void Tin::TestTree(const AabbTree* tree) const {
+    if (tree == nullptr || tree->GetTriangleCount() == mnTriangles || tree->GetRoot() == nullptr)
+        return;
+    throw ParameterException(
+        "tree", ParameterException::PT_Invalid, FormatString("%u", tree->GetTriangleCount()),
+        FormatString("%u", mnTriangles),
+        FormatString("The tree is not of this surface: it was built over %u triangles and the "
+                     "surface has %u",
+                     tree->GetTriangleCount(), mnTriangles),
+        "tin/tin", __PRETTY_FUNCTION__, __LINE__);
+}
+
 bool Tin::GetHeight(const float& x, const float& y, float& height, const AabbTree* tree) const {
+    TestTree(tree);
     if (!TestInside(moBBox, x, y))
         return false;
-    float highest = LOWEST;
-    if (tree != nullptr) {
-        const detail::PointProbe probe(x, y);
+    const index::PointProbe probe(x, y);
+    const auto isNear = [probe, triangles = mpoTriangles](unsigned id) {
+        return probe.IsIn(triangles[id].GetBBox());
+    };
+    const auto ask = [&](rules::Highest& highest, unsigned id) {
+        float h;
+        if (isNear(id) && mpoTriangles[id].GetHeight(x, y, h))
+            highest.Add(h);
+    };
+    const auto walk = [&](const AabbNode* root, rules::Highest& highest) {
         const auto holds = [=](const BBox<float, point2_t<float>>& box) { return probe.IsIn(box); };
-        detail::VisitLeaves(tree->GetRoot(), holds, [&](const std::vector<unsigned>& leaves) {
+        index::VisitLeaves(root, holds, [&](const std::vector<unsigned>& leaves) {
             for (const unsigned id : leaves)
-                if (holds(mpoTriangles[id].GetBBox()))
-                    KeepHighest(mpoTriangles[id], x, y, highest);
+                ask(highest, id);
         });
-    } else {
-        std::vector<unsigned> list;
-        FindTrianglesByPoint(x, y, list, nullptr);
-        for (const unsigned id : list)
-            KeepHighest(mpoTriangles[id], x, y, highest);
-    }
-    height = highest;
-    return height > LOWEST;
+    };
+    const rules::Highest highest =
+        Search(tree, mnTriangles, mnThreads).FindHighest(walk, ask, isNear);
+    height = highest.Get();
+    return highest.IsFound();
 }
 
 bool Tin::GetHeight(const double& x, const double& y, float& height, const AabbTree* tree) const {
-    const float xf = static_cast<float>(x - mdfXBase);
-    const float yf = static_cast<float>(y - mdfYBase);
-    return GetHeight(xf, yf, height, tree);
+    const point2_t<float> local = rules::Frame(mdfXBase, mdfYBase).ToLocal(point2_t<double>{x, y});
+    return GetHeight(local.x, local.y, height, tree);
 }
 
 void Tin::FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,
                                const AabbTree* tree) const {
-    const detail::PointProbe probe(x, y);
+    TestTree(tree);
+    const index::PointProbe probe(x, y);
     const auto isNear = [probe, triangles = mpoTriangles](unsigned id) {
         return probe.IsIn(triangles[id].GetBBox());
     };
-    const auto holds = [this, isNear, x, y](unsigned id) {
+    const auto holds = [&](unsigned id) {
         return isNear(id) && mpoTriangles[id].IsPointInsideLT(x, y);
     };
-    if (tree == nullptr) {
-        detail::ParallelScan(mnTriangles, mnThreads, holds, result, isNear);
-        return;
-    }
-    tree->FindLeaves(x, y, result);
-    std::vector<unsigned> inside;
-    for (const unsigned id : result)
-        if (holds(id))
-            inside.push_back(id);
-    result.swap(inside);
+    const auto findLeaves = [&](const AabbNode& root, std::vector<unsigned>& list) {
+        root.FindLeaves(x, y, list);
+    };
+    Search(tree, mnTriangles, mnThreads).List(findLeaves, holds, holds, result, isNear);
 }
 
 void Tin::FindTrianglesByRegion(const BBox<float, point2_t<float>>& region,
                                 std::vector<unsigned>& result, const AabbTree* tree) const {
-    if (tree != nullptr)
-        tree->FindLeaves(region, result);
-    else
-        detail::ParallelScan(
-            mnTriangles, mnThreads,
-            [&](unsigned id) { return mpoTriangles[id].IsIntersected(region); }, result);
+    TestTree(tree);
+    const auto meets = [&](unsigned id) { return mpoTriangles[id].IsIntersected(region); };
+    const auto findLeaves = [&](const AabbNode& root, std::vector<unsigned>& list) {
+        root.FindLeaves(region, list);
+    };
+    Search(tree, mnTriangles, mnThreads).List(findLeaves, index::KeepAll(), meets, result);
 }
 
 } // namespace kelm::tin

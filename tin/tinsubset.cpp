@@ -1,6 +1,8 @@
 #include "tin/tin.h"
 
-#include "tin/aabbtree.h"
+#include "services/exception.h"
+#include "services/reporting.h"
+#include "tin/rules/frame.h"
 
 #include <algorithm>
 #include <memory>
@@ -22,25 +24,44 @@ unsigned MarkUsed(const Triangle* triangles, const std::vector<unsigned>& indice
     return count;
 }
 
+using Vertices = std::unique_ptr<point3_t<float>[]>;
+using Triangles = std::unique_ptr<Triangle[]>;
+
+/// Copies the marked vertices in their order. The marks turn into positions in the new array.
+Vertices CopyUsed(const point3_t<float>* source, unsigned count, std::vector<unsigned>& used) {
+    Vertices vertices(new point3_t<float>[count]);
+    unsigned position = 0;
+    for (std::size_t i = 0; i < used.size(); ++i) {
+        const unsigned mark = used[i];
+        if (mark == 1)
+            vertices[position] = source[i];
+        used[i] = position;
+        position += mark;
+    }
+    return vertices;
+}
+
+void TestIndices(const std::vector<unsigned>& indices, unsigned count) {
+    for (const unsigned id : indices)
+        if (id >= count)
+            throw ParameterException(
+                "indices", ParameterException::PT_Invalid, FormatString("%u", id),
+                FormatString("below %u", count),
+                FormatString("Subset: there is no triangle %u: the surface has %u", id, count),
+                "tin/tin", __PRETTY_FUNCTION__, __LINE__);
+}
+
 } // namespace
 
 Tin* Tin::Subset(const std::vector<unsigned>& indices) const {
+    TestIndices(indices, mnTriangles);
     if (indices.empty())
         return nullptr;
     std::vector<unsigned> used(mnVertices, 0U);
     const unsigned vertexCount = MarkUsed(mpoTriangles, indices, mpoVertices, used);
-    std::unique_ptr<point3_t<float>[]> vertices(new point3_t<float>[vertexCount]);
-    // The marks turn into the positions of the used vertices in the new array.
-    unsigned position = 0;
-    for (unsigned i = 0; i < mnVertices; ++i) {
-        const unsigned mark = used[i];
-        if (mark == 1)
-            vertices[position] = mpoVertices[i];
-        used[i] = position;
-        position += mark;
-    }
+    Vertices vertices = CopyUsed(mpoVertices, vertexCount, used);
     const auto triangleCount = static_cast<unsigned>(indices.size());
-    std::unique_ptr<Triangle[]> triangles(new Triangle[triangleCount]);
+    Triangles triangles(new Triangle[triangleCount]);
     for (unsigned k = 0; k < triangleCount; ++k) {
         const Triangle& source = mpoTriangles[indices[k]];
         const auto renumbered = [&](int corner) {
@@ -74,11 +95,10 @@ Tin* Tin::SubsetByRegion(const BBox<float, point2_t<float>>& region, const AabbT
 }
 
 Tin* Tin::SubsetByRegion(const BBox<double, point2_t<double>>& region, const AabbTree* tree) const {
+    const rules::Frame frame(mdfXBase, mdfYBase);
     BBox<float, point2_t<float>> local;
-    local.min = {static_cast<float>(region.min.x - mdfXBase),
-                 static_cast<float>(region.min.y - mdfYBase)};
-    local.max = {static_cast<float>(region.max.x - mdfXBase),
-                 static_cast<float>(region.max.y - mdfYBase)};
+    local.min = frame.ToLocal(region.min);
+    local.max = frame.ToLocal(region.max);
     return SubsetByRegion(local, tree);
 }
 
@@ -103,10 +123,10 @@ Tin* Tin::SubsetByLineString(const point2_t<double>* points, unsigned count,
                              const AabbTree* tree) const {
     if (points == nullptr)
         return nullptr;
+    const rules::Frame frame(mdfXBase, mdfYBase);
     std::vector<point2_t<float>> local(count);
     for (unsigned i = 0; i < count; ++i)
-        local[i] = {static_cast<float>(points[i].x - mdfXBase),
-                    static_cast<float>(points[i].y - mdfYBase)};
+        local[i] = frame.ToLocal(points[i]);
     return SubsetByLineString(local.data(), count, tree);
 }
 

@@ -1,13 +1,14 @@
 #include "tin/triangle.h"
 
 #include "services/exception.h"
-#include "tin/detail/barycentric.h"
 #include "tin/ray2.h"
+#include "tin/rules/barycentric.h"
 #include "tin/vector3.h"
 
 #include <algorithm>
 #include <cfloat>
 #include <cmath>
+#include <limits>
 
 static_assert(FLT_EVAL_METHOD == 0, "a float expression must be rounded to float at each step");
 
@@ -15,9 +16,9 @@ namespace kelm::tin {
 
 namespace {
 
-using detail::EPSILON;
-using detail::IsDegenerate;
-using detail::Widen;
+using rules::EPSILON;
+using rules::IsDegenerate;
+using rules::Widen;
 
 /// Difference in `float`, component by component, then widened.
 Vector3 Difference(const point3_t<float>& a, const point3_t<float>& b) {
@@ -25,7 +26,7 @@ Vector3 Difference(const point3_t<float>& a, const point3_t<float>& b) {
 }
 
 /// Does the segment A-B cross the segment P-Q in plan? Ends count; parallel segments never cross.
-/// Without branches: which of an edge's bounds fails cannot be predicted.
+/// There is no branch, since no processor can predict which bound of an edge fails.
 inline bool IsIntersectedSegment(const float& ax, const float& ay, const float& bx, const float& by,
                                  const float& px, const float& py, const float& qx,
                                  const float& qy) {
@@ -40,6 +41,7 @@ inline bool IsIntersectedSegment(const float& ax, const float& ay, const float& 
     const double size = std::fabs(den);
     const double t = sign * (wy * sx - wx * sy);
     const double u = sign * (wy * rx - wx * ry);
+    // A NaN passes the first three tests and fails the last two: the segments do not cross.
     return !(EPSILON > size) & !(0.0 > t) & !(t > size) & (u >= 0.0) & (size >= u);
 }
 
@@ -68,6 +70,8 @@ void Triangle::SetVertices(point3_t<float>* const* const list) {
 }
 
 void Triangle::ComputeBBox() {
+    if (!IsSet())
+        return;
     const point3_t<float>& v0 = *vertices[0];
     const point3_t<float>& v1 = *vertices[1];
     const point3_t<float>& v2 = *vertices[2];
@@ -92,6 +96,9 @@ double Triangle::GetCenterAt(Axis axis) const {
 }
 
 void Triangle::GetCenterXY(float* out) const {
+    out[AX_X] = out[AX_Y] = std::numeric_limits<float>::quiet_NaN();
+    if (!IsSet())
+        return;
     const point3_t<float>& v0 = *vertices[0];
     const point3_t<float>& v1 = *vertices[1];
     const point3_t<float>& v2 = *vertices[2];
@@ -106,7 +113,9 @@ void Triangle::GetCenterXY(point2_t<float>* out) const {
 }
 
 int Triangle::GetBarycentricCoord(float x, float y, double& l0, double& l1, double& l2) const {
-    detail::Barycentric barycentric(*vertices[0], *vertices[1], *vertices[2]);
+    if (!IsSet())
+        return -1;
+    rules::Barycentric barycentric(*vertices[0], *vertices[1], *vertices[2]);
     if (barycentric.IsFlat())
         return -1;
     barycentric.SetRow(y);
@@ -141,6 +150,8 @@ bool Triangle::IsPointInsideLT(float x, float y) const {
 
 IntersectRelation Triangle::GetLineIntersectHeight(const point3_t<float>& a,
                                                    const point3_t<float>& b, float& h) const {
+    if (!IsSet())
+        return IR_Disjoint;
     const point3_t<float>& v0 = *vertices[0];
     const Vector3 e1 = Difference(*vertices[1], v0);
     const Vector3 e2 = Difference(*vertices[2], v0);
@@ -167,7 +178,7 @@ IntersectRelation Triangle::GetLineIntersectHeight(const point3_t<float>& a,
 
 bool Triangle::IsIntersectedLine(float x1, float y1, float x2, float y2) const {
     if (bbox.min.x > std::max(x1, x2) || std::min(x1, x2) > bbox.max.x ||
-        bbox.min.y > std::max(y1, y2) || std::min(y1, y2) > bbox.max.y)
+        bbox.min.y > std::max(y1, y2) || std::min(y1, y2) > bbox.max.y || !IsSet())
         return false;
     if (IsPointInside(x1, y1) || IsPointInside(x2, y2))
         return true;
@@ -181,12 +192,14 @@ bool Triangle::IsIntersectedLine(float x1, float y1, float x2, float y2) const {
 }
 
 bool Triangle::IsIntersected(const BBox<float, point2_t<float>>& box) const {
-    return IsIntersectedBBox(box, *vertices[0], *vertices[1]) ||
-           IsIntersectedBBox(box, *vertices[1], *vertices[2]) ||
-           IsIntersectedBBox(box, *vertices[2], *vertices[0]);
+    return IsSet() && (IsIntersectedBBox(box, *vertices[0], *vertices[1]) ||
+                       IsIntersectedBBox(box, *vertices[1], *vertices[2]) ||
+                       IsIntersectedBBox(box, *vertices[2], *vertices[0]));
 }
 
 bool Triangle::IsIntersected(const Triangle& other) const {
+    if (!IsSet() || !other.IsSet())
+        return false;
     if (IsPointInside(other.vertices[0]->x, other.vertices[0]->y) ||
         other.IsPointInside(vertices[0]->x, vertices[0]->y))
         return true;

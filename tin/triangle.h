@@ -15,15 +15,22 @@ enum IntersectRelation : int {
 
 namespace kelm::tin {
 
+namespace rules {
+class Barycentric;
+}
+
 /// Selects a coordinate by its index among the components of a vertex.
 enum Axis : int { AX_X = 0, AX_Y = 1 };
 
-/// Cell of a surface: three vertices by reference, and their box in plan.
+/// Triangle of a surface: three vertices by reference, and their box in plan.
 ///
 /// All coordinates are surface-local `float`. The vertices belong to whoever made them and must
-/// outlive the triangle. The winding has no meaning. Predicates on position take part in plan only
-/// and have no tolerance: an edge or a vertex is inside as soon as its computed weights stay within
-/// 0 and 1. A triangle without area in plan holds no point. Queries need the vertices to be set.
+/// outlive the triangle. The winding has no meaning. Predicates on a position work in plan and
+/// without tolerance: a position is inside while its computed weights lie from 0 to 1, so edges and
+/// vertices are inside as far as `float` arithmetic tells. A triangle without area in plan holds no
+/// position. Weights let a NaN pass: only the tests that start with a box refuse a NaN position.
+///
+/// A default triangle has no vertices. It holds no position, meets nothing, and its centre is NaN.
 ///
 /// Any number of threads may query one triangle; setting vertices or box excludes all others.
 class KELM_TIN_EXPORT Triangle {
@@ -41,13 +48,15 @@ class KELM_TIN_EXPORT Triangle {
     /// triangle then stays as it was
     void SetVertices(point3_t<float>* const a, point3_t<float>* const b, point3_t<float>* const c);
     void SetVertices(point3_t<float>* const* const list);
-    /// Computes the box anew, after a vertex has moved.
+    /// Computes the box anew, after a vertex has moved. A default triangle keeps its box.
     void ComputeBBox();
 
     BBox<float, point2_t<float>>& GetBBox() { return bbox; }
     const BBox<float, point2_t<float>>& GetBBox() const { return bbox; }
-    /// @param i 0, 1 or 2
-    point3_t<float>* GetVertex(int i) const { return vertices[i]; }
+    /// @param i 0, 1 or 2 @return the vertex; null for any other i, and in a default triangle
+    point3_t<float>* GetVertex(int i) const {
+        return static_cast<unsigned>(i) < 3 ? vertices[i] : nullptr;
+    }
     void GetVertices(point3_t<float>*& a, point3_t<float>*& b, point3_t<float>*& c) const;
     /// @param list three entries of the caller's
     void GetVertexList(point3_t<float>** const list) const;
@@ -58,12 +67,13 @@ class KELM_TIN_EXPORT Triangle {
     void GetCenterXY(float* out) const;
     void GetCenterXY(point2_t<float>* out) const;
 
-    /// Height of the plane at a position inside the triangle. @return false, with h untouched, if
-    /// the position lies outside
+    /// Height of the plane at a position, if the weights say that it is inside. A NaN position
+    /// counts as inside and has the height NaN. @return false, with h untouched, if it is outside
     bool GetHeight(float x, float y, float& h) const;
-    /// Is the position inside, by the box first and then by the weights?
+    /// Is the position inside, by the box first and then by the weights? A NaN position is not.
     bool IsPointInside(float x, float y) const;
-    /// Is the position inside, by the weights alone? Right also while the box is out of date.
+    /// Is the position inside, by the weights alone? The answer holds also while the box is out of
+    /// date. A NaN position is inside.
     bool IsPointInsideLT(float x, float y) const;
 
     /// Crossing with the segment from a to b (Moeller and Trumbore 1997, bounded to the segment).
@@ -88,15 +98,17 @@ class KELM_TIN_EXPORT Triangle {
     /// @param points column and row of each cell are appended
     /// @param heights one height a cell is appended
     /// @return half the size of `points`, earlier entries included; 0 if the triangle covers no
-    /// range of the grid @throw std::bad_alloc
+    /// range of the grid; 4294967295 if the number is greater
+    /// @throw std::bad_alloc, and both lists are then as they were
     unsigned GetGridPoints(int cols, int rows, std::vector<int>& points,
                            std::vector<float>& heights) const;
-    /// Writes column and row of each cell between the two edges of every row, unconfirmed: run
-    /// ends that the inside test would refuse are included. Same frame and rules as GetGridPoints.
+    /// Writes column and row of each cell between the two edges of every row, unconfirmed: ends of
+    /// a run that the inside test would refuse are included. Same frame and rules as GetGridPoints.
     /// @param points room for 2 * GetGridPointsNum(cols, rows) values
     /// @return the number of cells written
     unsigned GetGridPointsCR(int* points, int cols, int rows) const;
-    /// @return the number of cells that GetGridPointsCR writes for the same grid
+    /// @return the number of cells that GetGridPointsCR writes for the same grid. Both end at
+    /// 4294967295 cells: the cells behind are left out
     unsigned GetGridPointsNum(int cols, int rows) const;
 
   protected:
@@ -122,9 +134,12 @@ class KELM_TIN_EXPORT Triangle {
                          double* bary) const;
 
   private:
+    bool IsSet() const { return vertices[0] != nullptr; }
     float GetWeightedHeight(double l0, double l1, double l2) const;
     void AddGridPoint(int col, int row, std::vector<int>& points, std::vector<float>& heights,
                       const double* bary) const;
+    void AddGridRun(rules::Barycentric& barycentric, int first, int last, int row,
+                    std::vector<int>& points, std::vector<float>& heights) const;
 
     template <typename Single, typename Run>
     bool WalkGrid(int cols, int rows, Single&& single, Run&& run) const;

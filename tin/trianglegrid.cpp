@@ -1,9 +1,10 @@
 #include "tin/triangle.h"
 
-#include "tin/detail/barycentric.h"
+#include "tin/rules/barycentric.h"
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <utility>
 
@@ -21,6 +22,18 @@ int ToInt(float v, int nan) {
     if (v < -2147483648.0F)
         return std::numeric_limits<int>::min();
     return static_cast<int>(v);
+}
+
+/// Most cells that a result counts.
+constexpr std::uint64_t MOST_CELLS = std::numeric_limits<unsigned>::max();
+
+unsigned Saturate(std::uint64_t cells) {
+    return static_cast<unsigned>(std::min(cells, MOST_CELLS));
+}
+
+/// Cells of a run that is not empty.
+std::uint64_t GetLength(int first, int last) {
+    return static_cast<std::uint64_t>(std::int64_t{last} - first) + 1;
 }
 
 /// Abscissa at which the edge from start to end crosses the horizontal line at y.
@@ -53,6 +66,8 @@ int Triangle::GetGridExtent(int cols, int rows, int& xMin, int& yMin, int& xMax,
 }
 
 int Triangle::Sweepline(float* xs, float y) const {
+    if (!IsSet())
+        return 0;
     static constexpr int EDGES[3][2] = {{0, 2}, {1, 0}, {2, 1}};
     int crossings = 0;
     for (const auto& edge : EDGES) {
@@ -128,54 +143,65 @@ bool Triangle::WalkGrid(int cols, int rows, Single&& single, Run&& run) const {
     return true;
 }
 
+/// Adds the cells of a run that lie inside. What a row shares is computed once.
+void Triangle::AddGridRun(rules::Barycentric& barycentric, int first, int last, int row,
+                          std::vector<int>& points, std::vector<float>& heights) const {
+    if (barycentric.IsFlat())
+        return;
+    barycentric.SetRow(static_cast<float>(row));
+    double bary[3];
+    for (int col = first; col <= last; ++col)
+        if (barycentric.GetWeights(static_cast<float>(col), bary[0], bary[1], bary[2]))
+            AddGridPoint(col, row, points, heights, bary);
+}
+
 unsigned Triangle::GetGridPoints(int cols, int rows, std::vector<int>& points,
                                  std::vector<float>& heights) const {
+    if (!IsSet())
+        return 0U;
+    const std::size_t pointsBefore = points.size();
+    const std::size_t heightsBefore = heights.size();
+    rules::Barycentric barycentric(*vertices[0], *vertices[1], *vertices[2]);
     double bary[3];
-    detail::Barycentric barycentric(*vertices[0], *vertices[1], *vertices[2]);
-    const bool flat = barycentric.IsFlat();
     const auto add = [&](int col, int row) { GetGridPoint(col, row, points, heights, bary); };
     const auto addRun = [&](int first, int last, int row) {
-        if (flat)
-            return;
-        barycentric.SetRow(static_cast<float>(row));
-        for (int col = first; col <= last; ++col)
-            if (barycentric.GetWeights(static_cast<float>(col), bary[0], bary[1], bary[2]))
-                AddGridPoint(col, row, points, heights, bary);
+        AddGridRun(barycentric, first, last, row, points, heights);
     };
-    const bool covered = WalkGrid(cols, rows, add, addRun);
-    return covered ? static_cast<unsigned>(points.size() / 2) : 0U;
+    try {
+        return WalkGrid(cols, rows, add, addRun) ? Saturate(points.size() / 2) : 0U;
+    } catch (...) {
+        points.resize(pointsBefore);
+        heights.resize(heightsBefore);
+        throw;
+    }
 }
 
 unsigned Triangle::GetGridPointsCR(int* points, int cols, int rows) const {
-    unsigned count = 0;
-    const auto write = [&](int col, int row) {
-        points[2 * std::size_t{count}] = col;
-        points[2 * std::size_t{count} + 1] = row;
-        ++count;
+    std::uint64_t count = 0;
+    const auto write = [&](int first, int last, int row) {
+        const std::uint64_t end = std::min(count + GetLength(first, last), MOST_CELLS);
+        for (int col = first; count < end; ++col, ++count) {
+            points[2 * count] = col;
+            points[2 * count + 1] = row;
+        }
     };
-    WalkGrid(
-        cols, rows,
-        [&](int col, int row) {
-            if (IsPointInsideLT(static_cast<float>(col), static_cast<float>(row)))
-                write(col, row);
-        },
-        [&](int first, int last, int row) {
-            for (int col = first; col <= last; ++col)
-                write(col, row);
-        });
-    return count;
+    const auto confirm = [&](int col, int row) {
+        if (IsPointInsideLT(static_cast<float>(col), static_cast<float>(row)))
+            write(col, col, row);
+    };
+    WalkGrid(cols, rows, confirm, write);
+    return static_cast<unsigned>(count);
 }
 
 unsigned Triangle::GetGridPointsNum(int cols, int rows) const {
-    unsigned count = 0;
-    WalkGrid(
-        cols, rows,
-        [&](int col, int row) {
-            if (IsPointInsideLT(static_cast<float>(col), static_cast<float>(row)))
-                ++count;
-        },
-        [&](int first, int last, int) { count += static_cast<unsigned>(last - first) + 1U; });
-    return count;
+    std::uint64_t count = 0;
+    const auto add = [&](int first, int last, int) { count += GetLength(first, last); };
+    const auto confirm = [&](int col, int row) {
+        if (IsPointInsideLT(static_cast<float>(col), static_cast<float>(row)))
+            ++count;
+    };
+    WalkGrid(cols, rows, confirm, add);
+    return Saturate(count);
 }
 
 } // namespace kelm::tin

@@ -1,8 +1,8 @@
 #pragma once
 
 #include "tin/detail/polygon.h"
-#include "tin/tin.h"
 #include "tin/tinexport.h"
+#include "tin/triangleid.h"
 
 #include <vector>
 

@@ -3,6 +3,7 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 #include "tin/ray2.h"
+#include "tin/rules/extent.h"
 
 #include <algorithm>
 #include <cmath>
@@ -22,6 +23,20 @@ bool IsRepeat(const V& point, const V& predecessor) {
     const auto dy = point.y - predecessor.y;
     constexpr auto tolerance = REPEAT_TOLERANCE<decltype(point.x + dx)>;
     return dx > -tolerance && tolerance > dx && dy > -tolerance && tolerance > dy;
+}
+
+/// Calls keep(i) for each point that is no repeat. A point is compared with its immediate
+/// predecessor, kept or not, so that a chain of close points collapses to its first one.
+template <typename V, typename Keep>
+void VisitKept(const V* points, unsigned count, const Keep& keep) {
+    keep(0U);
+    V predecessor = points[0];
+    for (unsigned i = 1; i < count; ++i) {
+        const V point = points[i];
+        if (!IsRepeat(point, predecessor))
+            keep(i);
+        predecessor = point;
+    }
 }
 
 /// Does the segment A-B meet one of the segments between consecutive points of a chain? Ends count;
@@ -77,14 +92,11 @@ Polygon<T>::~Polygon() {
 
 template <typename T>
 void Polygon<T>::ComputeBBox() {
-    constexpr T highest = std::numeric_limits<T>::max();
-    moBBox.min = {highest, highest};
-    moBBox.max = {-highest, -highest};
-    for (unsigned i = 0; i < mnPoints; ++i) {
-        const point2_t<T>& p = mpoPoints[i];
-        moBBox.min = {std::min(moBBox.min.x, p.x), std::min(moBBox.min.y, p.y)};
-        moBBox.max = {std::max(moBBox.max.x, p.x), std::max(moBBox.max.y, p.y)};
-    }
+    rules::Extent<T> extent;
+    for (unsigned i = 0; i < mnPoints; ++i)
+        extent.Add(mpoPoints[i]);
+    moBBox.min = extent.GetMin();
+    moBBox.max = extent.GetMax();
 }
 
 template <typename T>
@@ -98,18 +110,10 @@ void Polygon<T>::SetOrient(PolygonOrient eOrient) {
         std::reverse(mpoPoints, mpoPoints + mnPoints);
 }
 
-/// A point is compared with its immediate predecessor, kept or not, so that a chain of close points
-/// collapses to its first one.
 template <typename T>
 void Polygon<T>::RemoveRepeatedPoints() {
-    unsigned kept = 1;
-    point2_t<T> predecessor = mpoPoints[0];
-    for (unsigned i = 1; i < mnPoints; ++i) {
-        const point2_t<T> point = mpoPoints[i];
-        if (!IsRepeat(point, predecessor))
-            mpoPoints[kept++] = point;
-        predecessor = point;
-    }
+    unsigned kept = 0;
+    VisitKept(mpoPoints, mnPoints, [&](unsigned i) { mpoPoints[kept++] = mpoPoints[i]; });
     mnPoints = kept;
 }
 
@@ -178,10 +182,8 @@ template class Polygon<double>;
 std::vector<unsigned> detail::FindRingVertices(const ZARShape& oShape) {
     std::vector<unsigned> kept;
     kept.reserve(static_cast<std::size_t>(oShape.vertexCount));
-    kept.push_back(0U);
-    for (unsigned i = 1; i + 1 < static_cast<unsigned>(oShape.vertexCount); ++i)
-        if (!IsRepeat(oShape.vertices[i], oShape.vertices[i - 1]))
-            kept.push_back(i);
+    VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
+              [&](unsigned i) { kept.push_back(i); });
     return kept;
 }
 

@@ -6,7 +6,7 @@
 #include <cstdint>
 #include <vector>
 
-namespace kelm::tin::detail {
+namespace kelm::tin::load {
 
 /// Welds the corners of a load where the octree's answer is plain to see: wherever no two different
 /// corners lie within its tolerance, it keeps the first of every group of equal corners, and that
@@ -47,4 +47,4 @@ class CornerHash {
     std::size_t mnKept = 0;
 };
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::load

@@ -1,57 +1,59 @@
 #pragma once
 
-#include "tin/aabbtree.h"
-#include "tin/detail/prefetch.h"
+#include "tin/index/prefetch.h"
 
 #include <array>
+#include <cstddef>
 #include <vector>
 
-namespace kelm::tin::detail {
+namespace kelm::tin::index {
 
 /// Nodes that a walk has yet to visit, last in first out. The common depth needs no allocation.
+template <typename Node>
 class PendingNodes {
   public:
     bool IsEmpty() const { return mnLocal == 0; }
 
-    void Push(const AabbNode* poNode) {
-        if (mnLocal < mao.size())
-            mao[mnLocal++] = poNode;
+    void Push(const Node* node) {
+        if (mnLocal < maoLocal.size())
+            maoLocal[mnLocal++] = node;
         else
-            moMore.push_back(poNode);
+            moMore.push_back(node);
     }
 
-    const AabbNode* Pop() {
+    const Node* Pop() {
         if (moMore.empty())
-            return mao[--mnLocal];
-        const AabbNode* poNode = moMore.back();
+            return maoLocal[--mnLocal];
+        const Node* node = moMore.back();
         moMore.pop_back();
-        return poNode;
+        return node;
     }
 
   private:
-    std::array<const AabbNode*, 48> mao;
+    std::array<const Node*, 48> maoLocal;
     std::size_t mnLocal = 0;
-    std::vector<const AabbNode*> moMore;
+    std::vector<const Node*> moMore;
 };
 
 /// Asks for what a walk needs next if it enters the node: most of its time is waiting for memory.
-inline void PrefetchBelow(const AabbNode* poNode) {
-    Prefetch(poNode->GetLeft());
-    Prefetch(poNode->GetRight());
-    Prefetch(poNode->GetLeaves().data());
+template <typename Node>
+void PrefetchBelow(const Node* node) {
+    Prefetch(node->GetLeft());
+    Prefetch(node->GetRight());
+    Prefetch(node->GetLeaves().data());
 }
 
-/// Calls visit(list) for every leaf that can be reached from poRoot through boxes for which
+/// Calls visit(list) for every leaf that can be reached from the root through boxes for which
 /// meets(box) holds, depth first, left before right. A null root has no leaves; a node has both
 /// children or none.
-template <typename Meets, typename Visit>
-void VisitLeaves(const AabbNode* poRoot, const Meets& meets, const Visit& visit) {
-    if (poRoot == nullptr || !meets(poRoot->GetBBox()))
+template <typename Node, typename Meets, typename Visit>
+void VisitLeaves(const Node* root, const Meets& meets, const Visit& visit) {
+    if (root == nullptr || !meets(root->GetBBox()))
         return;
-    PendingNodes pending;
-    for (const AabbNode* node = poRoot;;) {
-        const AabbNode* left = node->GetLeft();
-        const AabbNode* right = node->GetRight();
+    PendingNodes<Node> pending;
+    for (const Node* node = root;;) {
+        const Node* left = node->GetLeft();
+        const Node* right = node->GetRight();
         bool goesLeft = false;
         bool goesRight = false;
         if (left == nullptr) {
@@ -76,4 +78,4 @@ void VisitLeaves(const AabbNode* poRoot, const Meets& meets, const Visit& visit)
     }
 }
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::index

@@ -1,4 +1,4 @@
-#include "tin/detail/cornerhash.h"
+#include "tin/load/cornerhash.h"
 
 #include "tin/octree2.h"
 
@@ -6,7 +6,7 @@
 #include <array>
 #include <cmath>
 
-namespace kelm::tin::detail {
+namespace kelm::tin::load {
 
 namespace {
 
@@ -172,4 +172,4 @@ void CornerHash::Place(const Slot& slot, std::uint64_t hash) {
     moSlots[at] = slot;
 }
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::load

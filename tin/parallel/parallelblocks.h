@@ -5,18 +5,19 @@
 #include <cstdint>
 #include <exception>
 
-namespace kelm::tin::detail {
+namespace kelm::tin::parallel {
 
-/// Team that a loop over `count` items gets: the runtime's default above the threshold, else one.
+/// @return the size of the team for a loop over `count` items: the runtime's default above the
+/// threshold, else 1
 inline int GetTeamAbove(unsigned threshold, unsigned count) {
     return count > threshold ? omp_get_max_threads() : 1;
 }
 
-/// Runs body(thread, first, last) over 0 .. count-1, cut into one contiguous block a thread, blocks
-/// ascending in thread order, on at most `team` threads.
+/// Runs body(thread, first, last) over 0 .. count-1 on at most `team` threads. Each thread gets one
+/// contiguous block, and blocks ascend in thread order.
 ///
-/// An exception that left the region would end the process: the first one is kept and thrown again
-/// behind the region. The other blocks still run to their ends.
+/// An exception that left the region would end the process. So the first one is kept and thrown
+/// again behind the region; the other blocks still run to their ends.
 template <typename Body>
 void ParallelBlocks(unsigned count, int team, const Body& body) {
     std::exception_ptr failure;
@@ -38,4 +39,4 @@ void ParallelBlocks(unsigned count, int team, const Body& body) {
         std::rethrow_exception(failure);
 }
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::parallel

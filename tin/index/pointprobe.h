@@ -7,7 +7,7 @@
 #include <emmintrin.h>
 #endif
 
-namespace kelm::tin::detail {
+namespace kelm::tin::index {
 
 /// A position to be tested against many boxes: TestInside with its four comparisons made at once.
 ///
@@ -41,4 +41,4 @@ class PointProbe {
 #endif
 };
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::index

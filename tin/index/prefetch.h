@@ -1,6 +1,6 @@
 #pragma once
 
-namespace kelm::tin::detail {
+namespace kelm::tin::index {
 
 /// Asks for memory ahead of its use. A hint: nothing is read, and any address will do.
 inline void Prefetch([[maybe_unused]] const void* p) {
@@ -9,4 +9,4 @@ inline void Prefetch([[maybe_unused]] const void* p) {
 #endif
 }
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::index

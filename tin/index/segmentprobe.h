@@ -8,7 +8,7 @@
 #include <emmintrin.h>
 #endif
 
-namespace kelm::tin::detail {
+namespace kelm::tin::index {
 
 /// A segment to be tested against many boxes in plan: IsIntersectedBBox with both ends of both
 /// slabs worked out at once, by the same operations on the same floats.
@@ -17,7 +17,7 @@ class SegmentProbe {
 #ifdef __SSE2__
     template <typename P>
     SegmentProbe(const P& a, const P& b) {
-        const Ray2<float> ray = CreateSegmentRay(a, b);
+        const Ray2<float> ray = detail::CreateSegmentRay(a, b);
         const point2_t<float> origin = ray.GetOrigin();
         const point2_t<float> dirInv = ray.GetDirInv();
         mOrigin = _mm_setr_ps(origin.x, origin.y, origin.x, origin.y);
@@ -47,10 +47,10 @@ class SegmentProbe {
     __m128 mBackward; ///< all bits of an axis set where the segment runs against it
 #else
     template <typename P>
-    SegmentProbe(const P& a, const P& b) : mRay(CreateSegmentRay(a, b)) {}
+    SegmentProbe(const P& a, const P& b) : mRay(detail::CreateSegmentRay(a, b)) {}
 
     bool IsMet(const BBox<float, point2_t<float>>& box) const {
-        return TestSegment(box, mRay);
+        return detail::TestSegment(box, mRay);
     }
 
   private:
@@ -58,4 +58,4 @@ class SegmentProbe {
 #endif
 };
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::index

@@ -4,7 +4,7 @@
 
 #include <limits>
 
-namespace kelm::tin::detail {
+namespace kelm::tin::rules {
 
 /// Below this a determinant is no divisor: the configuration is degenerate.
 constexpr double EPSILON = std::numeric_limits<double>::epsilon();
@@ -60,4 +60,4 @@ class Barycentric {
     float mfRow1 = 0.0F;
 };
 
-} // namespace kelm::tin::detail
+} // namespace kelm::tin::rules

@@ -1,0 +1,247 @@
+#include "services/exception.h"
+#include "tests/support/allocationcounter.h"
+#include "tests/support/sheets.h"
+
+#include <fstream>
+#include <functional>
+#include <utility>
+
+// What headers let a caller write must not crash. Bad releases show under the address sanitizer.
+
+namespace kelm::tin::test {
+namespace {
+
+Mesh MakeSmallSheet(unsigned triangles) {
+    Mesh mesh;
+    for (unsigned i = 0; i < triangles; ++i) {
+        const auto x = static_cast<float>(i);
+        mesh.Add({x, 0, 1}, {x + 1, 0, 2}, {x, 1, 3});
+    }
+    return mesh;
+}
+
+Indices GetAllLeaves(const AabbTree& tree) {
+    Indices all;
+    tree.FindLeaves(EVERYWHERE, all);
+    std::sort(all.begin(), all.end());
+    return all;
+}
+
+/// @return actual and expected value of the refusal of an argument; empty if there is none
+std::pair<std::string, std::string> GetRefusal(const std::string& parameter,
+                                               const std::function<void()>& call) {
+    try {
+        call();
+    } catch (const ParameterException& e) {
+        EXPECT_EQ(e.GetParameter(), parameter);
+        return {e.GetActual(), e.GetExpected()};
+    }
+    return {};
+}
+
+TEST(MisuseTest, ATreeOfAnotherNumberOfTrianglesIsRefusedByEveryQuery) {
+    const OpenTin tin = MakeSmallSheet(20).MakeTin();
+    const Point a{0.2F, 0.2F, 9}, b{0.3F, 0.2F, -9};
+    const point3_t<double> mapA{0.2, 0.2, 9};
+    const point2_t<float> path[] = {{0, 0}, {9, 0.5F}};
+    const point2_t<double> mapPath[] = {{0, 0}, {9, 0.5}};
+    const auto mapBox = MakeBox(mapPath[0], mapPath[1]);
+    for (const unsigned count : {19U, 21U, 300U}) {
+        const OpenTin other = MakeSmallSheet(count).MakeTin();
+        const AabbTree tree(&other);
+        float h;
+        Indices list;
+        const std::function<void()> queries[] = {
+            [&] { tin.GetHeight(0.2F, 0.2F, h, &tree); },
+            [&] { tin.GetHeight(1e9, 0.2, h, &tree); }, // outside the surface too
+            [&] { tin.GetLineIntersectHeight(a, b, h, &tree); },
+            [&] { tin.GetLineIntersectHeight(mapA, mapA, h, &tree); },
+            [&] { delete tin.SubsetByRegion(EVERYWHERE, &tree); },
+            [&] { delete tin.SubsetByRegion(mapBox, &tree); },
+            [&] { delete tin.SubsetByLineString(path, 2, &tree); },
+            [&] { delete tin.SubsetByLineString(mapPath, 2, &tree); },
+            [&] { tin.FindTrianglesByPoint(0.2F, 0.2F, list, &tree); },
+            [&] { tin.FindTrianglesByRegion(EVERYWHERE, list, &tree); },
+            [&] { tin.FindTrianglesByLine(a, b, list, &tree); }};
+        for (const auto& query : queries)
+            EXPECT_EQ(GetRefusal("tree", query),
+                      std::pair(std::to_string(count), std::string("20")));
+    }
+}
+
+TEST(MisuseTest, AnIndexBeyondTheTrianglesIsRefused) {
+    const OpenTin tin = MakeSmallSheet(3).MakeTin();
+    for (const unsigned id : {3U, 4294967295U})
+        EXPECT_EQ(GetRefusal("indices",
+                             [&] {
+                                 delete tin.Subset(Indices{0, id});
+                             }),
+                  std::pair(std::to_string(id), std::string("below 3")));
+    EXPECT_EQ(std::unique_ptr<Tin>(tin.Subset(Indices{2}))->GetTriangleCount(), 1U);
+}
+
+TEST(MisuseTest, TreesAndNodesMoveSwapAndStandInAVector) {
+    const OpenTin small = MakeSmallSheet(7).MakeTin(), large = MakeSmallSheet(60).MakeTin();
+    std::vector<AabbTree> trees;
+    std::vector<AabbNode> nodes;
+    AabbTree counter;
+    for (unsigned i = 0; i < 9; ++i) {
+        const OpenTin& tin = i % 2 == 0 ? small : large;
+        trees.emplace_back(&tin);
+        nodes.emplace_back();
+        nodes.back().CreateChild(tin.GetTriangle(0), tin.GetAll(), &counter);
+    }
+    std::swap(trees[0], trees[1]);
+    std::swap(nodes[0], nodes[1]);
+    const auto choose = [&](bool first) {
+        AabbTree one(&small), two(&large);
+        return first ? std::move(one) : std::move(two);
+    };
+    trees[2] = choose(false);
+    trees[4] = std::move(trees[3]);
+    for (const unsigned i : {0U, 2U, 4U, 5U}) {
+        EXPECT_EQ(GetAllLeaves(trees[i]), large.GetAll());
+        EXPECT_EQ(trees[i].GetTriangleCount(), 60U);
+    }
+    Indices below;
+    nodes[0].FindLeaves(EVERYWHERE, below);
+    EXPECT_EQ(below.size(), 60U);
+    AabbTree left = std::move(trees[0]);
+    EXPECT_TRUE(trees[0].GetRoot() == nullptr && trees[0].GetObjBytes() == 32);
+    EXPECT_EQ(left.GetNodeCount(), trees[5].GetNodeCount());
+}
+
+TEST(MisuseTest, ACopiedInnerNodeMayOutliveItsTree) {
+    const OpenTin tin = MakeSmallSheet(60).MakeTin();
+    auto tree = std::make_unique<AabbTree>(&tin);
+    const AabbTree other(&tin);
+    std::vector<AabbNode> copies;
+    for (const AabbNode* node = tree->GetRoot()->GetLeft(); node; node = node->GetLeft())
+        copies.push_back(*node);
+    const Indices leaves = copies.back().GetLeaves();
+    tree.reset();
+    copies.pop_back();
+    copies.clear();
+    EXPECT_TRUE(!leaves.empty() && GetAllLeaves(other) == tin.GetAll());
+}
+
+TEST(MisuseTest, TheCrossingMayBeWrittenToAnEndOfTheSegment) {
+    const OpenTin tin = MakeSmallSheet(7).MakeTin();
+    const AabbTree tree(&tin);
+    for (const AabbTree* index : {static_cast<const AabbTree*>(nullptr), &tree}) {
+        Point a{0.25F, 0.25F, 9}, b{0.25F, 0.25F, -9};
+        float h;
+        ASSERT_TRUE(tin.GetLineIntersectHeight(a, b, h, index));
+        EXPECT_TRUE(tin.GetLineIntersectHeight(a, b, b.z, index) && b.z == h);
+        b.z = -9;
+        EXPECT_TRUE(tin.GetLineIntersectHeight(a, b, a.z, index) && a.z == h);
+    }
+}
+
+TEST(MisuseTest, ADefaultTriangleHoldsNothing) {
+    Triangle unset, set;
+    Point corners[] = {{-1, -1, 0}, {1, -1, 0}, {0, 1, 0}};
+    set.SetVertices(&corners[0], &corners[1], &corners[2]);
+    unset.ComputeBBox();
+    float h = UNTOUCHED;
+    std::vector<int> cells{1};
+    std::vector<float> heights;
+    EXPECT_FALSE(unset.GetHeight(0, 0, h) || unset.IsPointInside(0, 0) ||
+                 unset.IsPointInsideLT(0, 0) || unset.IsIntersectedLine(-1, 0, 1, 0) ||
+                 unset.IsIntersected(EVERYWHERE) || unset.IsIntersected(set) ||
+                 set.IsIntersected(unset));
+    EXPECT_EQ(unset.GetLineIntersectHeight({0, 0, 1}, {0, 0, -1}, h), IR_Disjoint);
+    EXPECT_EQ(h, UNTOUCHED);
+    EXPECT_TRUE(std::isnan(unset.GetCenterAt(AX_X)) && std::isnan(unset.GetCenterAt(AX_Y)));
+    EXPECT_EQ(unset.GetGridPoints(4, 4, cells, heights) + unset.GetGridPointsNum(4, 4), 0U);
+    EXPECT_EQ(unset.GetGridPointsCR(nullptr, 4, 4), 0U);
+    for (const int i : {-1, 3, 2147483647})
+        EXPECT_EQ(set.GetVertex(i), nullptr);
+    EXPECT_TRUE(unset.GetVertex(0) == nullptr && set.GetVertex(2) == &corners[2]);
+}
+
+TEST(MisuseTest, AssignmentOfACopyReleasesNothingAndAMoveReleasesWhatItReplaces) {
+    const Mesh mesh = MakeSmallSheet(2);
+    const OpenTin other = mesh.MakeTin(3, 4);
+    OpenTin tin = mesh.MakeTin();
+    point3_t<float>* vertices;
+    Triangle* triangles;
+    unsigned count;
+    tin.GetVertexList(vertices, count);
+    tin.GetTriangleList(triangles, count);
+    tin = other;
+    delete[] vertices; // the former owner has let them go
+    delete[] triangles;
+    EXPECT_EQ(tin.GetTriangle(1), other.GetTriangle(1));
+    tin = mesh.MakeTin();
+    tin = mesh.MakeTin(5, 6); // the first one's arrays go
+    double x, y;
+    tin.GetXYBase(x, y);
+    EXPECT_TRUE(x == 5 && y == 6 && tin.GetTriangleCount() == 2);
+}
+
+TEST(MisuseTest, BothConstructorsRefuseNullOnlyWhereItIsNeeded) {
+    Point vertices[3] = {{0, 0, 0}, {1, 0, 0}, {0, 1, 0}};
+    Triangle triangles[1];
+    Triangle* const noTriangles = nullptr;
+    Triangle_Id* const noIds = nullptr;
+    EXPECT_THROW(Tin(nullptr, 3, triangles, 1, 0, 0), DataException);
+    EXPECT_THROW(Tin(vertices, 3, noTriangles, 1, 0, 0), DataException);
+    EXPECT_THROW(Tin(vertices, 3, noIds, 1, 0, 0), DataException);
+    for (const unsigned n : {0U, 1U}) {
+        EXPECT_EQ(Tin(nullptr, n, noIds, 1 - n, 0, 0).GetTriangleCount(), 0U);
+        EXPECT_EQ(Tin(nullptr, n, noTriangles, 1 - n, 0, 0).GetTriangleCount(), 0U);
+    }
+}
+
+TEST(MisuseTest, TheNumberOfCellsSaturates) {
+    constexpr float SIDE = 1 << 17;
+    Point corners[] = {{0, 0, 0}, {3 * SIDE, 0, 0}, {0, 3 * SIDE, 0}};
+    Triangle triangle;
+    triangle.SetVertices(&corners[0], &corners[1], &corners[2]);
+    EXPECT_EQ(triangle.GetGridPointsNum(1 << 15, 1 << 15), ((1U << 15) - 1) << 15);
+    EXPECT_EQ(triangle.GetGridPointsNum(1 << 16, (1 << 16) + 1), 4294967295U); // one row is open
+    EXPECT_EQ(triangle.GetGridPointsNum(1 << 17, 1 << 17), 4294967295U);
+}
+
+TEST(MisuseTest, AGridWalkThatRunsOutOfMemoryLeavesBothListsAsTheyWere) {
+    if (!AllocationCounter::IS_ACTIVE)
+        GTEST_SKIP() << "the operators of the sanitizer are in force";
+    Point corners[] = {{0, 0, 0}, {90, 0, 0}, {0, 90, 0}};
+    Triangle triangle;
+    triangle.SetVertices(&corners[0], &corners[1], &corners[2]);
+    bool isDone = false;
+    for (long request = 1; !isDone; ++request) {
+        std::vector<int> cells{1, 2};
+        std::vector<float> heights{3};
+        const AllocationCounter counter(request);
+        try {
+            triangle.GetGridPoints(99, 99, cells, heights);
+            isDone = true;
+        } catch (const std::bad_alloc&) {
+            EXPECT_TRUE(cells == std::vector<int>({1, 2}) && heights == std::vector<float>{3});
+        }
+    }
+}
+
+/// @return mappings of this process that ask for huge pages
+long CountHugeMappings() {
+    std::ifstream maps("/proc/self/smaps");
+    long count = 0;
+    for (std::string line; std::getline(maps, line);)
+        count += line.find("VmFlags:") == 0 && line.find(" hg") != std::string::npos;
+    return count;
+}
+
+TEST(MisuseTest, ALargeTreeLeavesNoPageOfTheHeapMarked) {
+    const OpenTin tin = MakeSmallSheet(200000).MakeTin();
+    const long before = CountHugeMappings();
+    {
+        const AabbTree tree(&tin);
+        EXPECT_EQ(tree.GetTriangleCount(), 200000U);
+    }
+    EXPECT_EQ(CountHugeMappings(), before);
+}
+
+} // namespace
+} // namespace kelm::tin::test

@@ -1,0 +1,33 @@
+#pragma once
+
+#include "containers/keypoint.h"
+#include "tin/point.h"
+#include "tin/triangle.h"
+#include "tin/triangleid.h"
+
+#include <memory>
+#include <vector>
+
+namespace kelm::tin::load {
+
+/// The arrays of a new surface, surface-local, with heights as stored.
+struct Assembly {
+    std::unique_ptr<point3_t<float>[]> vertices;
+    unsigned vertexCount;
+    std::unique_ptr<Triangle[]> triangles;
+    unsigned triangleCount;
+    point2_t<double> base; ///< map coordinates of the local origin
+};
+
+/// Makes the arrays of welded corners. Vertices come in the order of their corners. The base is the
+/// first kept corner that has a finite position, else the origin.
+/// @param points,ids,keys as Weld leaves them; each list is emptied as soon as it falls out of use,
+/// so that the large ones do not coexist @param kept the number of kept corners
+/// @throw std::bad_alloc
+Assembly Assemble(std::vector<containers::KeyPoint<double>>& points, std::vector<Triangle_Id>& ids,
+                  std::vector<unsigned>& keys, unsigned kept);
+
+/// @return box of the triangles in plan
+aabb_t<point2_t<float>> ComputeBox(const Assembly& parts);
+
+} // namespace kelm::tin::load

@@ -1,0 +1,72 @@
+#pragma once
+
+#include "containers/keypoint.h"
+#include "services/vectorlayer.h"
+#include "tin/triangleid.h"
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <stdexcept>
+#include <vector>
+
+namespace kelm::tin::load {
+
+/// Corners and triangles that a load gathers. Each triangle has three corners of its own.
+///
+/// The lists grow by a fixed step rather than by a factor, since the first reservation fits a layer
+/// of triangles.
+class CornerList {
+  public:
+    /// @param shapeCount shapes of the layer, 0 or more
+    explicit CornerList(int shapeCount) {
+        moIds.reserve(static_cast<std::size_t>(shapeCount));
+        moPoints.reserve(3 * static_cast<std::size_t>(shapeCount));
+    }
+
+    /// Adds the triangle of a shape's first three vertices.
+    /// @throw std::length_error beyond 2147483647 corners; std::bad_alloc
+    void AddTriangle(const ZARShape& shape) {
+        Reserve(1);
+        Add(shape.vertices[0], shape.vertices[1], shape.vertices[2]);
+    }
+
+    /// Adds triangles over the ring of a shape. Their point numbers lead to shape vertices by
+    /// `vertices`. Throws as AddTriangle does.
+    void AddTriangles(const ZARShape& shape, const std::vector<Triangle_Id>& triangles,
+                      const std::vector<unsigned>& vertices) {
+        Reserve(triangles.size());
+        for (const Triangle_Id& id : triangles)
+            Add(shape.vertices[vertices[id.id0]], shape.vertices[vertices[id.id1]],
+                shape.vertices[vertices[id.id2]]);
+    }
+
+    std::vector<containers::KeyPoint<double>>& GetPoints() { return moPoints; }
+    std::vector<Triangle_Id>& GetIds() { return moIds; }
+
+  private:
+    static constexpr std::size_t POINT_STEP = 10000;
+    static constexpr std::size_t ID_STEP = 5000;
+    static constexpr std::size_t MOST_CORNERS = 2147483647;
+
+    void Reserve(std::size_t triangles) {
+        if (moPoints.size() + 3 * triangles > moPoints.capacity())
+            moPoints.reserve(moPoints.capacity() + std::max(3 * triangles, POINT_STEP));
+        if (moIds.size() + triangles > moIds.capacity())
+            moIds.reserve(moIds.capacity() + std::max(triangles, ID_STEP));
+    }
+
+    void Add(const ZARVertex& a, const ZARVertex& b, const ZARVertex& c) {
+        if (moPoints.size() > MOST_CORNERS - 3)
+            throw std::length_error("the corners of a load are limited to 2147483647");
+        const auto first = static_cast<std::uint32_t>(moPoints.size());
+        for (const ZARVertex* vertex : {&a, &b, &c})
+            moPoints.push_back({vertex->x, vertex->y, vertex->z});
+        moIds.push_back({first, first + 1, first + 2});
+    }
+
+    std::vector<containers::KeyPoint<double>> moPoints;
+    std::vector<Triangle_Id> moIds;
+};
+
+} // namespace kelm::tin::load
