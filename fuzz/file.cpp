@@ -2,7 +2,8 @@
 // exception. The first byte chooses the format.
 
 #include "fuzz/bytes.h"
-#include "services/bundled/datasetfile.h"
+#include "services/bundled/store/files/opendataset.h"
+#include "services/bundled/store/storefile.h"
 #include "services/exception.h"
 #include "services/vectorlayer.h"
 #include "tin/tinreader.h"
@@ -58,7 +59,7 @@ std::string WriteFile(fuzz::Bytes& rBytes) {
 
 void Load(const std::string& name) {
     using namespace kelm;
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(store::OpenDataset(name, "input").release(),
+    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(new _iobuf(store::OpenDataset(name, "input")),
                                                       &ZARClose);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     if (layer == nullptr || ZARGetLayerType(layer, 0) == 0)

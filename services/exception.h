@@ -7,7 +7,7 @@
 
 namespace kelm {
 
-/// Root of the failures that the library raises. Thrown by value; what() is the message.
+/// Base of all failures that the library raises. Thrown by value; what() is the message.
 ///
 /// Reading an exception object is safe from any number of threads.
 class KELM_SERVICES_EXPORT Exception : public std::exception {
@@ -43,7 +43,7 @@ class KELM_SERVICES_EXPORT DataException : public Exception {
     ~DataException() override;
 };
 
-/// An argument that a contract excludes.
+/// An argument that a contract does not allow.
 class KELM_SERVICES_EXPORT ParameterException : public DataException {
   public:
     /// What is wrong with the argument. The library raises one kind only.

@@ -17,23 +17,23 @@ struct ArgumentEnd {
 } // namespace
 
 std::string FormatString(const char* pszFormat, ...) {
-    va_list oArguments;
-    va_start(oArguments, pszFormat);
-    const ArgumentEnd oEnd{oArguments};
-    va_list oMeasured;
-    va_copy(oMeasured, oArguments);
-    const int nLength = std::vsnprintf(nullptr, 0, pszFormat, oMeasured);
-    va_end(oMeasured);
-    if (nLength < 0)
+    va_list arguments;
+    va_start(arguments, pszFormat);
+    const ArgumentEnd end{arguments};
+    va_list measured;
+    va_copy(measured, arguments);
+    const int length = std::vsnprintf(nullptr, 0, pszFormat, measured);
+    va_end(measured);
+    if (length < 0)
         throw std::length_error("FormatString: the text is too long or not convertible");
-    std::string text(static_cast<std::size_t>(nLength), '\0');
-    std::vsnprintf(text.data(), text.size() + 1, pszFormat, oArguments);
+    std::string text(static_cast<std::size_t>(length), '\0');
+    std::vsnprintf(text.data(), text.size() + 1, pszFormat, arguments);
     return text;
 }
 
 namespace kelm::tellus {
 
-// The handlers that a host has set for GDAL catch both. GDAL 3.6 cuts a warning at about a million
+// Both go to the handlers that a host has set for GDAL. GDAL 3.6 cuts a warning at about a million
 // characters and a note at 25,000. A text may hold percent signs, so it is never the format.
 
 void Warning::Warn(const std::string& text, const char* sourcePath, unsigned line) {

@@ -1,0 +1,22 @@
+#pragma once
+
+#include "services/bundled/reference/proj/projoperation.h"
+#include "services/bundled/reference/proj/projsession.h"
+#include "services/bundled/reference/projcrs.h"
+
+#include <vector>
+
+namespace kelm::ogc {
+
+/// Lists the operations between two compounds, the most accurate first. Left out are those that
+/// only guess (PROJ's ballpark operations). Also left out are those whose whole area a better
+/// operation covers, even if a grid for the better one is missing.
+/// @throw kelm::DataException if no operation can be used, naming the grids that are missing
+std::vector<ProjOperation> ListOperations(ProjSession& session, const ProjCRS& source,
+                                          const ProjCRS& target);
+
+/// @return an operation from map coordinates to longitude and latitude in degrees, good enough to
+/// tell areas of use. @throw kelm::DataException if there is none
+PjPtr CreateToDegrees(ProjSession& session, const PJ* map);
+
+} // namespace kelm::ogc

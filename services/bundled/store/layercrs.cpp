@@ -1,0 +1,53 @@
+#include "services/bundled/store/layercrs.h"
+
+#include "services/bundled/store/gdal/confinement.h"
+#include "services/bundled/store/gdal/gdalcall.h"
+#include "services/bundled/undefinedcrs.h"
+#include "services/exception.h"
+#include "services/reporting.h"
+
+#include <cpl_conv.h>
+#include <ogrsf_frmts.h>
+
+#include <memory>
+
+namespace kelm::store {
+
+namespace {
+
+constexpr const char* SOURCE = "services/bundled/store/layercrs";
+
+std::string WriteText(const OGRSpatialReference& crs, const std::string& subject,
+                      const GdalCall& call) {
+    if (crs.IsEmpty() || services::IsUndefinedCRS(crs.GetName()))
+        return {};
+    const char* const options[] = {"FORMAT=WKT2_2019", "MULTILINE=NO", nullptr};
+    char* raw = nullptr;
+    const OGRErr error = crs.exportToWkt(&raw, options);
+    const std::unique_ptr<char, decltype(&CPLFree)> text(raw, CPLFree);
+    if (error != OGRERR_NONE || !raw || !*raw)
+        throw DataException(FormatString("The CRS of the %s cannot be written as WKT: %s",
+                                         subject.c_str(), call.GetFailures().c_str()),
+                            SOURCE, __PRETTY_FUNCTION__, __LINE__);
+    return raw;
+}
+
+} // namespace
+
+std::string ReadCrsText(OGRLayer& layer, const std::string& subject) {
+    std::string text;
+    Warnings warnings;
+    {
+        GdalCall call;
+        const Confinement confinement;
+        if (const OGRSpatialReference* crs = layer.GetSpatialRef())
+            text = WriteText(*crs, subject, call);
+        warnings = call.TakeWarnings();
+        if (call.HasFailed())
+            AddWarning(warnings, call.GetFailures(), 1);
+    }
+    PassOn(warnings, "The CRS of the " + subject);
+    return text;
+}
+
+} // namespace kelm::store

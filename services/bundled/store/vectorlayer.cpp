@@ -1,0 +1,89 @@
+// The vector layer store by GDAL. It reads the formats that files/formats.h lists, and numbers
+// shapes by the rule of shapeids.h. A null layer is refused with a kelm::ParameterException.
+
+#include "services/vectorlayer.h"
+
+#include "services/bundled/store/files/opendataset.h"
+#include "services/bundled/store/gdal/gdalcall.h"
+#include "services/bundled/store/storefile.h"
+#include "services/exception.h"
+
+#include <cstring>
+
+using kelm::store::StoreLayer;
+
+namespace {
+
+constexpr const char* SOURCE = "services/bundled/store/vectorlayer";
+
+/// Every layer that is handed out is a StoreLayer.
+StoreLayer& Get(ZARLayer_t* layer) {
+    if (layer == nullptr)
+        throw kelm::ParameterException("layer", kelm::ParameterException::PT_Invalid, "null", "",
+                                       "A layer of an open file is needed", SOURCE,
+                                       __PRETTY_FUNCTION__, __LINE__);
+    return *static_cast<StoreLayer*>(layer);
+}
+
+int CountSegments(const _iobuf* file, int type) {
+    return file != nullptr && type == ZAR_SEGMENT_VECTOR ? file->GetLayerCount() : 0;
+}
+
+} // namespace
+
+_iobuf* ZAROpen(const char* name, const char* mode) {
+    if (!mode || std::strcmp(mode, "r") != 0)
+        throw kelm::ParameterException("mode", kelm::ParameterException::PT_Invalid,
+                                       mode ? mode : "null", "r",
+                                       "The vector layer store opens files for reading only",
+                                       SOURCE, __PRETTY_FUNCTION__, __LINE__);
+    return new _iobuf(kelm::store::OpenFile(name));
+}
+
+void ZARClose(_iobuf* file) {
+    const kelm::store::GdalCall call;
+    delete file;
+}
+
+int ZARSegCount(_iobuf* file, int type) {
+    return CountSegments(file, type);
+}
+
+int ZARSegNext(_iobuf* file, int type, int after) {
+    if (after < 0)
+        after = 0;
+    return after < CountSegments(file, type) ? after + 1 : 0;
+}
+
+ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {
+    if (segment < 1 || segment > CountSegments(file, ZAR_SEGMENT_VECTOR))
+        return nullptr;
+    return &file->GetLayer(segment);
+}
+
+int ZARGetLayerType(ZARLayer_t* layer, int) {
+    return Get(layer).GetSurvey().mnType;
+}
+
+int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* info) {
+    info->definition = Get(layer).GetCrsText();
+    return 0;
+}
+
+int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high) {
+    *low = Get(layer).GetSurvey().moLow;
+    *high = Get(layer).GetSurvey().moHigh;
+    return 0;
+}
+
+int ZARGetNext(ZARLayer_t* layer, int id) {
+    return id == -1 ? Get(layer).GetFirst() : Get(layer).GetBehind(id);
+}
+
+ZARShape* ZARGetShapeRef(ZARLayer_t* layer, int id) {
+    return &Get(layer).GetShape(id);
+}
+
+_iobuf* ZARLayer2fp(ZARLayer_t* layer) {
+    return &Get(layer).GetFile();
+}
