@@ -18,47 +18,47 @@ import sys
 # printed as unexplained.
 CAUSES = {
     "random": "Not proved, since there are no hardware counters here: a height seems to wait for "
-              "memory. It follows the nodes down, then reads a leaf's list, its triangles and their "
-              "vertices. Each read gives the address of the next",
+              "memory. It follows the nodes down, then reads a leaf's list, its triangles and "
+              "their vertices. Each read gives the address of the next",
     "line-short": "Not proved, as above: on the larger terrains almost all that a short segment "
                   "reads is out of the cache. A leaf reads each of up to five triangles, while "
                   "Boost's node holds their boxes side by side",
     "line-long": "As for short segments. The higher the line, the more a 3-D index leaves out",
     "scan": "While the triangles fit the cache, the time is that of testing each box: a load and "
             "six operations for each triangle. Beyond the cache it is the time of the memory",
-    "raster": "The walk gives column, row and height of every cell, with two divisions in double for "
-              "each cell by the inside rule. The plain walk trusts the ends of a row, divides once "
-              "for each row and writes to the raster directly",
+    "raster": "The walk gives column, row and height of every cell, with two divisions in double "
+              "for each cell by the inside rule. The plain walk trusts the ends of a row, "
+              "divides once for each row and writes to the raster directly",
     "load": "The loop makes nothing. A load also carries each corner through the list, welds it, "
             "and makes vertices and triangles",
-    "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing is. "
-              "At equal density of the positions, in the row `fine`, a height grows less",
+    "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing "
+              "is. At equal density of the positions, in the row `fine`, a height grows less",
 }
 
 # Title, key, unit of a figure (factor on nanoseconds an item, text), workload in words.
 SUBJECTS = [
     ("Build", "build", (1, "ns a triangle"),
-     "An index over a terrain in memory. Each library builds from its own form: our triangles, CGAL's "
-     "triangles, Embree's shared buffers, and a vector of boxes for Boost. The time to release the "
-     "index is not counted. Terrains are fractal. Their nodes are 10 m apart with 3 m of jitter, with "
-     "two triangles in a cell, in row order or shuffled. `jacksboro` is real (17,619 triangles). "
-     "`same` is so many copies of one triangle. In `crowded` vertices crowd towards a corner of the "
-     "box by powers of two."),
+     "An index over a terrain in memory. Each library builds from its own form: our triangles, "
+     "CGAL's triangles, Embree's shared buffers, and a vector of boxes for Boost. The time to "
+     "release the index is not counted. Terrains are fractal. Their nodes are 10 m apart with 3 "
+     "m of jitter, with two triangles in a cell, in row order or shuffled. `jacksboro` is real "
+     "(17,619 triangles). `same` is so many copies of one triangle. In `crowded` vertices crowd "
+     "towards a corner of the box by powers of two."),
     ("Memory of an index", "memory", (0, "bytes a triangle"),
-     "Resident memory that a build adds, at its peak and afterwards, beyond what it is built from. "
-     "Each build runs in a process of its own."),
+     "Resident memory that a build adds, at its peak and afterwards, beyond what it is built "
+     "from. Each build runs in a process of its own."),
     ("Degenerate surfaces", "degenerate", (1e-6, "ms"),
      "Our index over a million triangles (100k if `quick`). Each figure is one call. `same` and "
-     "`crowded` are as above. `vertical` has upright triangles on a diagonal. `tower` has growing "
-     "triangles over one point. `slivers` are 10,000 km long, side by side. In `far` each triangle "
-     "spans the range of `float`. The height is that in the middle of the surface's box. The crossing "
-     "is that of the box's diagonal."),
+     "`crowded` are as above. `vertical` has upright triangles on a diagonal. `tower` has "
+     "growing triangles over one point. `slivers` are 10,000 km long, side by side. In `far` "
+     "each triangle spans the range of `float`. The height is that in the middle of the "
+     "surface's box. The crossing is that of the box's diagonal."),
     ("Heights along scanlines", "height/scanline", (1, "ns a height"),
-     "The greatest height at a million positions, row by row over the whole extent, one call for each "
-     "position. CGAL lists the triangles that a plumb line meets. Boost lists those whose box holds "
-     "the position. From both lists the highest is taken. Embree casts a ray down, with its robust "
-     "flag. In its first column the first hit is the highest. In its second column a filter lists all "
-     "hits."),
+     "The greatest height at a million positions, row by row over the whole extent, one call for "
+     "each position. CGAL lists the triangles that a plumb line meets. Boost lists those whose "
+     "box holds the position. From both lists the highest is taken. Embree casts a ray down, "
+     "with its robust flag. In its first column the first hit is the highest. In its second "
+     "column a filter lists all hits."),
     ("Heights along fine scanlines", "height/fine", (1, "ns a height"),
      "The same at a million positions 2.24 m apart. On each terrain there are ten positions in a "
      "triangle, so they cross only a part of the larger terrains."),
@@ -66,34 +66,37 @@ SUBJECTS = [
      "The same at a million positions in random order."),
     ("Highest crossing of short segments", "line/2%", (1e-3, "µs a segment"),
      "20,000 lines of sight. Each is 2 % of the extent long. It starts 1 m above the ground. It "
-     "ends 1 m, plus up to 5 % of its length, above the ground. Our index and Boost's know only the plan, "
-     "and visit every triangle below the segment. Those of CGAL and Embree are three-dimensional, and "
-     "visit the triangles whose box the segment passes through. Embree takes the first hit from the "
-     "higher end."),
+     "ends 1 m, plus up to 5 % of its length, above the ground. Our index and Boost's know only "
+     "the plan, and visit every triangle below the segment. Those of CGAL and Embree are "
+     "three-dimensional, and visit the triangles whose box the segment passes through. Embree "
+     "takes the first hit from the higher end."),
     ("Highest crossing of long segments", "line/50%", (1e-3, "µs a segment"),
      "The same for 2,000 segments of 50 % of the extent."),
     ("Heights without an index", "scan", (1e-3, "µs a height"),
      "One height by a scan of all triangles, beside reading one word of each cache line of the "
      "array of triangles."),
     ("Welding", "weld", (1, "ns a corner"),
-     "Three corners for each triangle, in map coordinates, 24 bytes each. For every corner it finds "
-     "the first one within 1e-9 on each axis. meshoptimizer finds the first one with the same bits. "
-     "In `twins` one corner in a thousand is moved by the smallest step of a double. `ours, corners "
-     "to surface` adds what follows in a load: vertices, triangles and their boxes."),
+     "Three corners for each triangle, in map coordinates, 24 bytes each. For every corner it "
+     "finds the first one within 1e-9 on each axis. meshoptimizer finds the first one with the "
+     "same bits. In `twins` one corner in a thousand is moved by the smallest step of a double. "
+     "`ours, corners to surface` adds what follows in a load: vertices, triangles and their "
+     "boxes."),
     ("Rings, star-shaped", "ring/star", (1e-3, "µs a ring"),
      "Rings of 4 to 500 corners around a centre. Each is tested for being simple and cut into "
-     "triangles. GEOS uses isSimple and PolygonTriangulator on a polygon made beforehand. CGAL uses "
-     "constrained Delaunay. Ours starts from the vertices of a shape."),
+     "triangles. GEOS uses isSimple and PolygonTriangulator on a polygon made beforehand. CGAL "
+     "uses constrained Delaunay. Ours starts from the vertices of a shape."),
     ("Rings, wiggly", "ring/wiggly", (1e-3, "µs a ring"),
      "The same for bands that go up and down at each step."),
     ("Whole surface to a raster", "raster", (1e-6, "ms a raster"),
-     "2000 x 2000 cells over the whole terrain, with the greatest height in each, from triangles in "
-     "grid coordinates. Embree casts a ray for each cell; its index is built beforehand. The row walks "
-     "are plain loops in `double` over the triangles. One tests and weights each cell of a row. The "
-     "other takes the cells for inside and steps along the plane. GDAL triangulates the vertices anew."),
+     "2000 x 2000 cells over the whole terrain, with the greatest height in each, from triangles "
+     "in grid coordinates. Embree casts a ray for each cell; its index is built beforehand. The "
+     "row walks are plain loops in `double` over the triangles. One tests and weights each cell "
+     "of a row. The other takes the cells for inside and steps along the plane. GDAL "
+     "triangulates the vertices anew."),
     ("Loading, GeoPackage", "load/GPKG", (1e-9, "s"),
-     "Triangles as polygons with heights, each load in a process of its own. The time is the processor "
-     "time of `Load`, beside a loop over all features that reads each corner and keeps nothing."),
+     "Triangles as polygons with heights, each load in a process of its own. The time is the "
+     "processor time of `Load`, beside a loop over all features that reads each corner and keeps "
+     "nothing."),
     ("Loading, FlatGeobuf", "load/FlatGeobuf", (1e-9, "s"), "The same."),
     ("Loading, Shapefile", "load/ESRI Shapefile", (1e-9, "s"), "The same."),
 ]
