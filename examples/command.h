@@ -6,9 +6,10 @@
 #include <functional>
 #include <stdexcept>
 
-/// Reads the command line into the options of the app and runs the command. @return its exit
-/// status: 0; 1 for a failure, told on standard error; 2 for a command line that has no meaning,
-/// which the command may also find itself and tell by throwing a CLI::ValidationError
+/// Reads the command line into the options of the app and runs the command. The command may throw a
+/// CLI::ValidationError if it finds the command line wrong.
+/// @return the exit status: 0 for success, 1 for a failure, 2 for a wrong command line. Failures
+/// are told on standard error
 inline int RunCommand(CLI::App& app, int argc, char** argv, const std::function<void()>& command) {
     try {
         app.parse(argc, argv);
