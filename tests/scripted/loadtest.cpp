@@ -1,4 +1,3 @@
-#include "services/exception.h"
 #include "services/interpgrid3d.h"
 #include "tests/scripted/readerfixture.h"
 
@@ -38,11 +37,63 @@ TEST_F(ReaderTest, WhatCannotBeUsedIsLeftOutAndTheReaderLoadsOn) {
     const Reader reader = Open();
     script.shapes.push_back({{}, {}, {}});
     for (int i = 0; i < 2; ++i) // a lock left behind would stop the second
-        EXPECT_THROW(Load(*reader), kelm::DataException);
+        EXPECT_EQ(kelm::test::GetRefusal([&] { Load(*reader); }),
+                  "tin/detail/polygon: 3 points could not forma polygon");
     script.shapes = {{{}}, {}, {{0, 0, 0}, {9, 9, 0}, {9, 0, 0}, {0, 9, 0}, {}}, script.shapes[0]};
-    EXPECT_EQ(Load(*reader)->GetTriangleCount(), 1U);
-    script.shapes.pop_back();
-    EXPECT_EQ(Load(*reader), nullptr);
+    for (const unsigned count : {1U, 0U}) {
+        const Surface surface = Load(*reader);
+        EXPECT_EQ(surface ? surface->GetTriangleCount() : 0, count);
+        EXPECT_EQ(Take(), "Shape# 110 is ignored because the store has none. (tin/tinreader)\n"
+                          "Triangulate(): Polygon# 120 is ignored becasue it is not simple.\n"
+                          " (tin/tinreader)\n");
+        script.shapes.pop_back();
+    }
+}
+
+TEST_F(ReaderTest, AWindowLoadsTheSameTrianglesWithABaseOfTheirOwn) {
+    script.shapes = CreateStrip(1200, 50);
+    for (Ring& ring : script.shapes)
+        for (ZARVertex& vertex : ring)
+            vertex = {vertex.x + 0.12, vertex.y + 49776.31, vertex.z};
+    const Reader reader = Open();
+    const Window window(500100, 4600000, 500900, 4700000);
+    const Surface whole = Load(*reader), part = Load(*reader, &window);
+    kelm::tin::BBox<double, point3_t<double>> box;
+    ASSERT_NE(part, nullptr);
+    part->GetRawBBox(box);
+    EXPECT_NEAR(box.min.x, STRIP_X + 0.12 + 3.7 * 25, 1e-4);
+    EXPECT_NEAR(box.max.y, STRIP_Y + 49776.31 + 40, 1e-4);
+    double x, y;
+    part->GetXYBase(x, y);
+    EXPECT_EQ(x, GetStripVertex(25, 50).x + 0.12);
+    EXPECT_EQ(y, GetStripVertex(25, 50).y + 49776.31);
+    for (double at = 500105; at < 500890; at += 1.7) {
+        float height = -1, expected = -2;
+        EXPECT_TRUE(whole->GetHeight(at, STRIP_Y + 49790, expected, nullptr));
+        EXPECT_TRUE(part->GetHeight(at, STRIP_Y + 49790, height, nullptr));
+        EXPECT_NEAR(height, expected, 1e-3);
+    }
+}
+
+TEST_F(ReaderTest, HeightsOfALargeSurfaceInDegreesAreInterpolatedWithAWarning) {
+    for (int side = 0; side < 5; ++side) {
+        script.shapes.clear();
+        for (int i = 0; i < 500; ++i)
+            script.shapes.push_back(
+                Close({{-360, -90, 1}, {i * 0.72, i * 0.18, 2}, {9, i * 0.1, 3}}));
+        script.shapes.push_back(Close({{360, 90, 5}, {-360, 90, 5}, {360, -90, 5}}));
+        const ZARVertex out[] = {{}, {360.1, 0, 0}, {-360.1, 0, 0}, {0, 90.1, 0}, {0, -90.1, 0}};
+        script.shapes.push_back(Close({{1, 1, 0}, {2, 5, 0}, out[side]}));
+        const Reader reader = Open();
+        reader->SetOutputVerticalDatum(DatumType(2001));
+        EXPECT_GT(Load(*reader)->GetVertexCount(), 999U);
+        EXPECT_EQ(Take(), side > 0
+                              ? ""
+                              : "Heights are interpolated between positions 100 map units "
+                                "apart, and the coordinates look like degrees: use a projected "
+                                "layer to change the vertical datum of a large surface. "
+                                "(tin/tinreader)\n");
+    }
 }
 
 TEST_F(ReaderTest, OfEachRunOfRepeatsTheFirstVertexGivesTheHeight) {

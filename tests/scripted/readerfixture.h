@@ -1,5 +1,7 @@
 #pragma once
 
+#include "tests/digest/recordingservices.h"
+#include "tests/support/refusal.h"
 #include "tests/support/scriptedservices.h"
 #include "tin/aabbtree.h"
 #include "tin/tinreader.h"
@@ -83,9 +85,18 @@ struct Opened : kelm::tin::Tin {
     }
 };
 
-/// A script with one triangle, whose first height is 5.
+/// A script with one triangle, whose first height is 5. What is reported and not taken is a
+/// failure.
 struct ReaderTest : testing::Test {
-    ReaderTest() { script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})}; }
+    ReaderTest() {
+        script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})};
+        Recording::poTranscript = &transcript;
+    }
+    ~ReaderTest() override {
+        Recording::poTranscript = nullptr;
+        EXPECT_EQ(transcript, "");
+    }
+    std::string Take() { return std::exchange(transcript, ""); }
 
     static Reader Open(double offset = 0.0, double scale = 1.0, int source = 2002) {
         return Reader(kelm::tin::TinReaderFactory::CreateTinReader("some.file", 0, offset, scale,
@@ -96,4 +107,5 @@ struct ReaderTest : testing::Test {
     }
 
     scripted::Script script;
+    std::string transcript;
 };
