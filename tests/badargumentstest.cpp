@@ -1,33 +1,58 @@
-#include "services/exception.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
+#include "tests/support/refusal.h"
 #include "tests/support/sheets.h"
+#include "tests/support/transcript.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
-#include <cpl_conv.h>
-#include <cpl_error.h>
-
 namespace kelm::tin::test {
+
+using kelm::test::GetRefusal;
 
 constexpr double NaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double FAR = std::numeric_limits<double>::max();
 using MapPoint = point2_t<double>;
 
 TEST(BadArguments, OfReadersAreRefused) {
+    kelm::test::Transcript transcript;
     const char* const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg";
     const auto open = [](const char* name, int layer, double scale = 1, int datum = 2002) {
         return std::unique_ptr<TinReader>(
             TinReaderFactory::CreateTinReader(name, layer, 0, scale, ogc::cs::DatumType(datum)));
     };
-    for (const char* name : {"", "/", "%s%n", "/dev/null", static_cast<const char*>(nullptr)})
-        EXPECT_THROW(open(name, 1), DataException);
-    EXPECT_THROW(open(good, 2), DataException);
-    EXPECT_THROW(open(good, 1, 0), ParameterException);
-    EXPECT_THROW(open(good, 1, 1, 3000), DataException);
+    const std::string factory = "tin/tinreaderfactory: ", crs = "services/bundled/";
+    for (const auto& [name, reason] :
+         {std::pair("", "The name of the file to open is empty"),
+          {"%s%n",
+           "The file %s%n cannot be opened: expected a readable local file of one of the formats "
+           "GeoPackage, ESRI Shapefile, FlatGeobuf, GeoJSON, GML, DXF, File Geodatabase, SQLite; "
+           "found: No such file or directory"}}) {
+        EXPECT_EQ(GetRefusal([&] { open(name, 1); }),
+                  factory + "The format of file " + name + " is not supported by ZAR");
+        EXPECT_EQ(transcript.Take(), std::string("TIN: ") + reason + '\n');
+    }
+    EXPECT_EQ(GetRefusal([&] { open(nullptr, 1); }),
+              factory + "The name of the file must be non-null");
+    EXPECT_EQ(GetRefusal([&] { open(good, 2); }),
+              factory + "ZARGetLayer failed on the provided vector layer 2 in the input file " +
+                  good + ".");
+    EXPECT_EQ(GetRefusal([&] { open(good, 1, 0); }),
+              "tin/tinreader: dfScale=0.0!non-zero: The scale parameter may not be zero");
+    EXPECT_EQ(GetRefusal([&] { open(good, 1, 1, 3000); }),
+              crs + "projcrs: The vertical datum code 3000 is not supported: use VD_Orthometric "
+                    "(2001) or VD_Ellipsoidal (2002)");
     const auto reader = open(good, -9); // the first layer
-    EXPECT_THROW(reader->SetOutputVerticalDatum(ogc::cs::DatumType(1000)), ParameterException);
-    EXPECT_THROW(ZARGetNext(nullptr, -1), ParameterException);
+    EXPECT_EQ(GetRefusal([] { ZARGetNext(nullptr, -1); }),
+              crs + "vectorlayer: layer=null!: A layer of an open file is needed");
+    for (const char* mode : {"r+", static_cast<const char*>(nullptr)})
+        EXPECT_EQ(GetRefusal([&] { ZAROpen(good, mode); }),
+                  crs + "vectorlayer: mode=" + (mode ? mode : "null") +
+                      "!r: The vector layer store opens files for reading only");
+    for (const char* name : {"", static_cast<const char*>(nullptr)})
+        EXPECT_EQ(GetRefusal([&] { ZAROpen(name, "r"); }),
+                  crs + "datasetfile: name=" + (name ? "" : "null") +
+                      "!the path of a file: The name of the file to open is empty");
     EXPECT_EQ(ZARSegNext(nullptr, 116, 0), 0);
     const auto window = MakeBox(MapPoint{NaN, FAR}, MapPoint{1, -FAR});
     EXPECT_EQ(reader->Load(&window), nullptr);
@@ -40,11 +65,14 @@ TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     Triangle t = *tin.GetTriangle(0);
     Triangle_Id ids[1] = {};
     Point *const v = tin.GetVertex(0), *const hole[] = {v + 1, v, nullptr};
-    EXPECT_THROW(Tin(v, 3, static_cast<Triangle_Id*>(nullptr), 1, 0, 0), DataException);
-    EXPECT_THROW(Tin(nullptr, 3, ids, 1, 0, 0), DataException);
-    EXPECT_THROW(AabbTree{nullptr}, ParameterException);
-    EXPECT_THROW(Triangle{nullptr}, DataException);
-    EXPECT_THROW(t.SetVertices(hole), DataException);
+    const std::string arrays = "tin/tin: vertices and index triples must be non-null";
+    EXPECT_EQ(GetRefusal([&] { Tin(v, 3, static_cast<Triangle_Id*>(nullptr), 1, 0, 0); }), arrays);
+    EXPECT_EQ(GetRefusal([&] { Tin(nullptr, 3, ids, 1, 0, 0); }), arrays);
+    for (const auto& work : {+[] { AabbTree{nullptr}; }, +[] { AabbTree().CreateTree(nullptr); }})
+        EXPECT_EQ(GetRefusal(work),
+                  "tin/aabbtree: poTin=!: The TIN used to create AabbTree cannot be empty");
+    EXPECT_EQ(GetRefusal([] { Triangle{nullptr}; }), ": vertices must be non-null");
+    EXPECT_EQ(GetRefusal([&] { t.SetVertices(hole); }), ": vertices must be non-null");
     EXPECT_TRUE(t.GetVertex(0) == v && tin.GetVertex(3) == nullptr && !tin.GetTriangle(~0U));
     const AabbTree tree(&tin), rootless, *const indices[] = {nullptr, &tree, &rootless};
     float h = UNTOUCHED;
@@ -63,36 +91,26 @@ TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     EXPECT_EQ(t.GetGridPointsNum(9, 0) + t.GetGridPointsNum(-9, 9), 0U);
 }
 
-TEST(BadArguments, ARefusalTellsWhereAndWhatWasExpected) {
+TEST(BadArguments, ARefusalIsCopiedWhole) {
     ParameterException kept("", ParameterException::PT_Invalid, "", "", "", "", "", 0);
     DataException plain("", "", "", 0);
-    try {
-        AabbTree().CreateTree(nullptr);
-    } catch (const ParameterException& refusal) {
-        kept = refusal;
-        plain = refusal;
-    }
-    EXPECT_EQ(kept.GetParameter(), "poTin");
-    EXPECT_TRUE(kept.GetActual().empty() && kept.GetExpected().empty());
-    EXPECT_EQ(kept.GetType(), ParameterException::PT_Invalid);
-    EXPECT_EQ(plain.GetMessage(), "The TIN used to create AabbTree cannot be empty");
-    EXPECT_TRUE(plain.what() == kept.GetMessage() && plain.GetSourcePath() == "tin/aabbtree");
-    EXPECT_NE(DataException(plain).GetFunction().find("CreateTree"), std::string::npos);
-    EXPECT_GT(ParameterException(kept).GetLine(), 0U);
+    const ParameterException refusal("p", ParameterException::PT_Invalid, "actual", "expected",
+                                     "message", "source", "function", 7);
+    kept = refusal;
+    plain = refusal;
+    EXPECT_EQ(GetRefusal([&] { throw ParameterException(kept); }),
+              "source: p=actual!expected: message");
+    EXPECT_EQ(GetRefusal([&] { throw DataException(plain); }), "source: message");
+    EXPECT_TRUE(plain.GetFunction() == "function" && DataException(plain).GetLine() == 7);
 }
 
 TEST(BadArguments, ATextForTheHostIsNoFormat) {
-    static std::string last;
+    kelm::test::Transcript transcript;
     const std::string text = FormatString("%d %s%%s%%n", 7, std::string(20000, 'x').c_str());
     EXPECT_EQ(text, "7 " + std::string(20000, 'x') + "%s%n");
-    CPLPushErrorHandler([](CPLErr, int, const char* pszText) { last = pszText; });
-    CPLSetThreadLocalConfigOption("CPL_DEBUG", "TIN");
     tellus::Warning::Warn(text, "tin/tinreader", 12);
-    EXPECT_EQ(last, text + " (tin/tinreader:12)");
     tellus::Report::AddInfo(text);
-    EXPECT_EQ(last, "TIN: " + text);
-    CPLSetThreadLocalConfigOption("CPL_DEBUG", nullptr);
-    CPLPopErrorHandler();
+    EXPECT_EQ(transcript.Take(), text + " (tin/tinreader)\nTIN: " + text + '\n');
 }
 
 } // namespace kelm::tin::test
