@@ -1,8 +1,10 @@
 #include "services/vectorlayer.h"
-#include "services/exception.h"
 #include "tests/support/layerwriter.h"
+#include "tests/support/refusal.h"
 #include "tests/support/temporaryfolder.h"
+#include "tests/support/transcript.h"
 
+#include <cpl_http.h>
 #include <gtest/gtest.h>
 #include <sys/stat.h>
 
@@ -20,23 +22,21 @@ Ring MakeRing(double x, double y, double z) {
     return {{x, y, z}, {x, y + 1, z + 1}, {x + 1, y, z + 2}, {x, y, z}};
 }
 
-/// @return the ring of a shape; empty if the store refuses it
-Ring ReadShape(ZARLayer_t* poLayer, int nId) try {
+Ring ReadShape(ZARLayer_t* poLayer, int nId) {
     const ZARShape& oShape = *ZARGetShapeRef(poLayer, nId);
     Ring oRing;
     for (int n = 0; n < oShape.vertexCount; ++n)
         oRing.push_back({oShape.vertices[n].x, oShape.vertices[n].y, oShape.vertices[n].z});
     return oRing;
-} catch (const kelm::DataException&) {
-    return {};
 }
 
-/// The first layer of a file, by one walk.
+/// The first layer of a file, by one walk. The ring of a shape that is refused is empty.
 struct Layer {
     explicit Layer(const std::string& path) : mpoFile(ZAROpen(path.c_str(), "r"), ZARClose) {
         for (int nId = mpo ? ZARGetNext(mpo, -1) : -1; nId != -1; nId = ZARGetNext(mpo, nId)) {
             moIds.push_back(nId);
-            moRings.push_back(ReadShape(mpo, nId));
+            moRings.emplace_back();
+            moRefusals += GetRefusal([&] { moRings.back() = ReadShape(mpo, nId); });
         }
         EXPECT_EQ(static_cast<int>(moIds.size()), mpo ? mpo->shapeCount : 0);
     }
@@ -44,6 +44,7 @@ struct Layer {
     ZARLayer_t* mpo = ZARGetLayer(mpoFile.get(), 1);
     std::vector<int> moIds;
     std::vector<Ring> moRings;
+    std::string moRefusals;
 };
 
 std::string GetCrs(const Layer& oLayer) {
@@ -57,14 +58,19 @@ const Format kGpkg{"GPKG", "a.gpkg"}, kShape{"ESRI Shapefile", "a.shp"}, kGml{"G
 
 class VectorLayer : public testing::Test {
   protected:
-    VectorLayer() { CPLPushErrorHandlerEx(Keep, this); }
-    ~VectorLayer() override { CPLPopErrorHandler(); }
-    static void CPL_STDCALL Keep(CPLErr eClass, CPLErrorNum, const char* pszText) {
-        if (eClass != CE_Debug)
-            static_cast<VectorLayer*>(CPLGetErrorHandlerUserData())->moWarnings += pszText;
+    std::string Write(const LayerText& oText) {
+        WriteLayer(moPath, "GPKG", oText);
+        moTranscript.Take();
+        return moPath;
     }
-    bool HasWarned(const std::string& text) const { return moWarnings.find(text) + 1 != 0; }
-    std::string Write(const LayerText& oText) const { return WriteLayer(moPath, "GPKG", oText); }
+    /// @return what the file makes the store say when it is opened
+    std::string GetUnusable(const std::string& path, const std::string& found) const {
+        return "services/bundled/datasetfile: The file " + path +
+               " cannot be opened: expected a readable local file of one of the formats "
+               "GeoPackage, ESRI Shapefile, FlatGeobuf, GeoJSON, GML, DXF, File Geodatabase, "
+               "SQLite; found: " +
+               found;
+    }
     std::string WriteRow(const Format& oFormat, int nTriangles, bool bTwice = false) const {
         LayerText oText{{}, wkbPolygon25D};
         for (int n = 0; n < nTriangles; ++n)
@@ -72,9 +78,25 @@ class VectorLayer : public testing::Test {
         return WriteLayer(moFolder.GetPath(oFormat.second), oFormat.first, oText, bTwice);
     }
 
+    /// Shortens a file, which must then be refused or give all its rings.
+    void ExpectCut(const std::string& path, std::uintmax_t nSize, const std::vector<Ring>& oRings) {
+        fs::resize_file(path, nSize);
+        const std::string refusal = GetRefusal([&] {
+            const Layer oLayer(path);
+            EXPECT_TRUE(!oLayer.mpo || oLayer.moRings == oRings) << path << ' ' << nSize;
+        });
+        EXPECT_TRUE(refusal.empty() || IsLike(refusal, GetUnusable(path, "*")) ||
+                    IsLike(refusal, "services/bundled/featurereader: The layer * of file " + path +
+                                        " cannot be read, near feature number *: *"))
+            << refusal;
+        const std::string warning = "The *" + path + "*: * (services/bundled/gdalcall)\n";
+        EXPECT_TRUE(IsLike(moTranscript.Take() + warning, warning)) << "or none";
+    }
+
     TemporaryFolder moFolder;
-    const std::string moPath = moFolder.GetPath("a.gpkg");
-    std::string moWarnings;
+    const std::string moPath = moFolder.GetPath("a.gpkg"),
+                      moFacets = "layer facets of file " + moPath;
+    Transcript moTranscript;
 };
 
 TEST_F(VectorLayer, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
@@ -89,12 +111,7 @@ TEST_F(VectorLayer, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
         EXPECT_EQ(GetCrs(Layer(path)).find("PROJCRS[\"WGS 84 / UTM zone 32N\""), 0U) << path;
         const auto nSize = fs::is_directory(path) ? 0 : fs::file_size(path);
         for (unsigned nCut = nSize > 0 ? 25 : 0; nCut-- > 0;)
-            try {
-                fs::resize_file(path, nSize * nCut / 25);
-                const Layer oLayer(path);
-                EXPECT_TRUE(!oLayer.mpo || oLayer.moRings == oRings) << path << ' ' << nCut;
-            } catch (const kelm::DataException&) {
-            }
+            ExpectCut(path, nSize * nCut / 25, oRings);
     }
     const char* pszDrawing =
         "0\nSECTION\n2\nENTITIES\n0\n3DFACE\n10\n0\n20\n0\n30\n0\n11\n0\n21\n1\n"
@@ -105,34 +122,50 @@ TEST_F(VectorLayer, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
 const struct {
     const char* mpszText;
     std::vector<std::size_t> moCorners; ///< of each shape; 0: refused
-    const char* mpszWarning = "";
+    const char* mpszFault = "";
+    const char* mpszFeatures = ""; ///< that the warning names, with their number
 } kKinds[] = {
     {"POLYGON Z ((0 0 1,1 0 1,1 1 1,0 1 1))", {5}}, // not closed
     {"POLYGON Z ((0 0 1,1 0 1,1 1 1,0 0 9))", {4}}, // closed in plan only
     {"GEOMETRYCOLLECTION Z (GEOMETRYCOLLECTION Z (TIN Z (((0 0 1,1 0 1,0 1 1,0 0 1)))))", {4}},
-    {"GEOMETRYCOLLECTION EMPTY", {0}, "feature 4 cannot be used (shapes left out: 1): an empty"},
+    {"GEOMETRYCOLLECTION EMPTY", {0}, "an empty geometry", "feature 4"},
     {"CURVEPOLYGON Z (CIRCULARSTRING Z (0 0 1,1 1 1,2 0 1,1 -1 1,0 0 1))", {91}},
-    {"POLYGON Z ((0 0 1,9 0 1,9 9 1,0 0 1),(5 1 1,6 1 1,6 2 1,5 1 1))", {0}, "with holes"},
-    {"POLYGON Z ((0 0 1,1 0 1,0 0 1))", {0}, "a ring of fewer than three corners"},
-    {"POLYGON Z ((0 0 1,1e999 0 1,0 1 1,0 0 1))", {0}},
+    {"POLYGON Z ((0 0 1,9 0 1,9 9 1,0 0 1),(5 1 1,6 1 1,6 2 1,5 1 1))",
+     {0},
+     "a polygon with holes",
+     "feature 6"},
+    {"POLYGON Z ((0 0 1,1 0 1,0 0 1))", {0}, "a ring of fewer than three corners", "feature 7"},
+    {"POLYGON Z ((0 0 1,1e999 0 1,0 1 1,0 0 1))", {0}, "an ordinate that is not a finite number"},
     {"POLYGON Z ((0 0 1,1 0 1,0 1 1e999,0 0 1))",
      {0},
-     "features 8 to 9 cannot be used (shapes left"},
-    {"", {0}, "no geometry"},
-    {"POLYGON ((3 3,4 3,3 4,3 3))", {4}, "1 of 5 shapes have no heights"}};
+     "an ordinate that is not a finite number",
+     "features 8 to 9"},
+    {"", {0}, "no geometry", "feature 10"},
+    {"POLYGON ((3 3,4 3,3 4,3 3))", {4}}};
 
 TEST_F(VectorLayer, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
     LayerText oText;
     for (const auto& oKind : kKinds)
         oText.moGeometries.emplace_back(oKind.mpszText);
     const Layer oLayer(Write(oText));
-    std::size_t nShape = 0;
-    for (const auto& [pszText, oCorners, pszWarning] : kKinds) {
-        for (const std::size_t nCorners : oCorners)
-            EXPECT_EQ(oLayer.moRings.at(nShape++).size(), nCorners) << pszText;
-        EXPECT_TRUE(HasWarned(pszWarning)) << pszText;
+    std::string warnings, refusals;
+    for (int n = 0; n < 11; ++n) {
+        const auto& [pszText, oCorners, pszFault, pszFeatures] = kKinds[n];
+        EXPECT_EQ(oLayer.moRings.at(n).size(), oCorners[0]) << pszText;
+        if (*pszFault)
+            refusals += FormatString("services/bundled/storelayer: Shape %d (feature %d) of %s "
+                                     "cannot be used: %s",
+                                     n + 1, n + 1, moFacets.c_str(), pszFault);
+        if (*pszFeatures)
+            warnings += FormatString("The %s: %s cannot be used (shapes left out: %d): %s "
+                                     "(services/bundled/refusallog)\n",
+                                     moFacets.c_str(), pszFeatures, pszFeatures[7] == 's' ? 2 : 1,
+                                     pszFault);
     }
-    EXPECT_TRUE(HasWarned("The layer facets of file " + moPath));
+    EXPECT_EQ(oLayer.moRefusals, refusals);
+    EXPECT_EQ(moTranscript.Take(), warnings + "The " + moFacets +
+                                       ": 1 of 5 shapes have no heights and are read with height "
+                                       "0 (services/bundled/layersurvey)\n");
     ZARVertex oLow, oHigh;
     ZARGetExtents(oLayer.mpo, &oLow, &oHigh);
     EXPECT_TRUE(oLow.z == 0 && oHigh.z == 9 && oHigh.x == 4);
@@ -140,14 +173,34 @@ TEST_F(VectorLayer, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
 
 TEST_F(VectorLayer, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader) {
     const std::string point = "POINT Z (0 0 1)", line = "LINESTRING Z (0 0 1,1 1 1)";
-    const auto GetType = [&](const LayerText& oText) {
-        return ZARGetLayerType(Layer(Write(oText)).mpo, 0);
-    };
-    EXPECT_EQ(GetType({{}, wkbPoint25D}), 1);
-    EXPECT_EQ(GetType({{}, wkbMultiLineString25D}), 3);
-    EXPECT_EQ(GetType({{point}}), 1);
-    EXPECT_EQ(GetType({{point, line}}), 3);
-    EXPECT_EQ(GetType({{point, line, MakeTriangle(0, 0, 0)}}), 2);
+    std::string drawing = "GEOMETRYCOLLECTION Z (" + point; // of more faults than are told
+    for (int n = 1; n < 1003; ++n)
+        drawing += ',' + (n % 2 == 0 ? point : line);
+    const std::string left = " cannot be used (shapes left out: 1): ",
+                      source = " instead of a polygon (services/bundled/refusallog)\n";
+    const std::string points = "The " + moFacets + ": feature 1" + left + "points" + source;
+    const std::string lines = "The " + moFacets + ": feature 2" + left + "lines" + source;
+    const std::tuple<LayerText, int, std::string> cases[] = {
+        {{{}, wkbPoint25D}, 1, ""},
+        {{{}, wkbMultiLineString25D}, 3, ""},
+        {{{point}}, 1, points},
+        {{{point, line}}, 3, points + lines},
+        {{{point, line, MakeTriangle(0, 0, 0)}}, 2, points + lines},
+        {{{drawing + ')'}},
+         3,
+         "The *: feature 1 cannot*: lines" + source + "The " + moFacets +
+             ": 3 further shapes cannot be used (services/bundled/refusallog)\nTIN: The " +
+             moFacets +
+             ": shape id = feature id x 10000 + number of the facet in the feature, from 0\n"}};
+    for (const auto& [oText, nType, transcript] : cases) {
+        EXPECT_EQ(ZARGetLayerType(Layer(Write(oText)).mpo, 0), nType);
+        const std::string found = moTranscript.Take();
+        EXPECT_TRUE(IsLike(found, transcript));
+        EXPECT_EQ(std::count(found.begin(), found.end(), '\n'),
+                  oText.moGeometries == std::vector{drawing + ')'}
+                      ? 1002
+                      : std::count(transcript.begin(), transcript.end(), '\n'));
+    }
 }
 
 TEST_F(VectorLayer, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
@@ -167,6 +220,11 @@ TEST_F(VectorLayer, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
         oText.moGeometries.push_back("MULTIPOLYGON Z " + facets + ")");
         const Layer oLayer(Write(oText));
         ASSERT_EQ(oLayer.moIds, oIds);
+        const char* const pszRule =
+            oIds[0] == 300
+                ? ": shape id = feature id x 100 + number of the facet in the feature, from 0"
+                : ": shape ids count the shapes in reading order, from 1";
+        EXPECT_EQ(moTranscript.Take(), oIds[0] == 0 ? "" : "TIN: The " + moFacets + pszRule + '\n');
         EXPECT_EQ(GetCrs(oLayer), "");
         EXPECT_EQ(oLayer.moRings.back(), MakeRing(nFacets - 1, 0, nFacets - 1));
         for (std::size_t n = oIds.size(); n-- > 0;) {
@@ -174,7 +232,9 @@ TEST_F(VectorLayer, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
             EXPECT_EQ(ZARGetNext(oLayer.mpo, oIds[n]), n + 1 < oIds.size() ? oIds[n + 1] : -1);
         }
         for (const int nUnknown : {-2, 5, 712, 2147483646})
-            EXPECT_THROW(ZARGetShapeRef(oLayer.mpo, nUnknown), kelm::DataException) << nUnknown;
+            EXPECT_EQ(GetRefusal([&] { ZARGetShapeRef(oLayer.mpo, nUnknown); }),
+                      FormatString("services/bundled/storelayer: The %s has no shape %d",
+                                   moFacets.c_str(), nUnknown));
     }
 }
 
@@ -194,25 +254,30 @@ TEST_F(VectorLayer, LayersOfOneFileCanBeReadInTurns) {
 TEST_F(VectorLayer, WhatIsNoLocalFileOfAKnownFormatIsRefusedByName) {
     const std::string shape = WriteRow(kShape, 1), pipe = moFolder.GetPath("pipe.geojson");
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
-    for (const std::string& name :
-         {std::string(R"({"type":"Point","coordinates":[1,2]})"), "GeoJSON:" + shape,
-          "/vsizip/" + shape, moFolder.GetPath(""), pipe, moFolder.WriteFile("empty.gpkg", ""),
-          moFolder.WriteFile("a.vrt", "<OGRVRTDataSource/>")})
-        try {
-            const Layer oLayer(name);
-            ADD_FAILURE() << name << " is opened";
-        } catch (const kelm::DataException& oException) {
-            EXPECT_EQ(oException.GetMessage().find("The file " + name + " cannot be opened"), 0U);
-        }
+    const std::string missing = "No such file or directory";
+    Write({{MakeTriangle(0, 0, 0)}});
+    fs::resize_file(moPath, fs::file_size(moPath) + 1);
+    for (const auto& [name, found] : std::vector<std::pair<std::string, std::string>>{
+             {R"({"type":"Point","coordinates":[1,2]})", missing},
+             {"GeoJSON:" + shape, missing},
+             {"/vsizip/" + shape, "no path of the local file system"},
+             {moFolder.GetPath(""), "a folder whose name does not end in .gdb"},
+             {pipe, "not a regular file"},
+             {moPath, "the file ends within a page of the database"},
+             {moFolder.WriteFile("empty.gpkg", ""), "none of them"},
+             {moFolder.WriteFile("a.vrt", "<OGRVRTDataSource/>"), "none of them"}})
+        EXPECT_EQ(GetRefusal([&, &p = name] { Layer{p}; }), GetUnusable(name, found));
 }
 
 TEST_F(VectorLayer, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
     const std::string json =
-        R"({"type":"Polygon","coordinates":[[[0,0,1],[1,0,1],[0,1,1]]],"crs":{"type":"link",)"
+        R"({"type":"Polygon","coordinates":[[[0,0,1],[1,0,1],[0,1,1],[0,0,1]]],"crs":{"type":"link",)"
         R"("properties":{"type":"ogcwkt","href":"http://127.0.0.1:9/x"}}})";
-    EXPECT_EQ(Layer(moFolder.WriteFile("a.geojson", json)).moIds.size(), 1U);
-    EXPECT_TRUE(HasWarned("network"));
-    moWarnings.clear();
+    const std::string path = moFolder.WriteFile("a.geojson", json),
+                      fetch = "the file asks for a resource of a network";
+    EXPECT_EQ(Layer(path).moIds.size(), 1U);
+    EXPECT_EQ(moTranscript.Take(),
+              "The file " + path + ": " + fetch + "; " + fetch + " (services/bundled/gdalcall)\n");
 
     std::ifstream oStream(WriteRow(kGml, 1));
     std::string gml(std::istreambuf_iterator<char>(oStream), {});
@@ -225,19 +290,18 @@ TEST_F(VectorLayer, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
     EXPECT_STREQ(CPLGetConfigOption("GML_PARSER", ""), "XERCES") << "the host's choice stands";
     CPLSetConfigOption("GML_PARSER", nullptr);
     EXPECT_FALSE(fs::exists(moFolder.GetPath("a.gfs")));
-    EXPECT_EQ(moWarnings, "") << "the GML file does not ask";
 
-    const std::string path = moFolder.GetPath("spy.sqlite"), other = WriteRow(kShape, 1);
+    const std::string spy = moFolder.GetPath("spy.sqlite"), other = WriteRow(kShape, 1);
     const std::string table = "VirtualShape('" + other.substr(0, other.size() - 4) + "','UTF-8',0)";
     CPLStringList oOptions;
     oOptions.AddString("SPATIALITE=YES");
     GDALDatasetUniquePtr poSpy(GetGDALDriverManager()->GetDriverByName("SQLite")->Create(
-        path.c_str(), 0, 0, 0, GDT_Unknown, oOptions.List()));
+        spy.c_str(), 0, 0, 0, GDT_Unknown, oOptions.List()));
     if (!poSpy)
         GTEST_SKIP() << "GDAL is built without the library that reads other files";
     poSpy->ExecuteSQL(("CREATE VIRTUAL TABLE spy USING " + table).c_str(), nullptr, nullptr);
     poSpy.reset();
-    EXPECT_EQ(Layer(path).mpo, nullptr);
+    EXPECT_EQ(Layer(spy).mpo, nullptr);
 }
 
 TEST_F(VectorLayer, AFileThatChangesWhileItIsOpenEndsEachWalkWithAnException) {
@@ -245,7 +309,46 @@ TEST_F(VectorLayer, AFileThatChangesWhileItIsOpenEndsEachWalkWithAnException) {
     GDALDatasetUniquePtr(GDALDataset::Open(moPath.c_str(), GDAL_OF_VECTOR | GDAL_OF_UPDATE))
         ->ExecuteSQL("DELETE FROM facets WHERE fid > 200", nullptr, nullptr);
     for (int nWalk = 0, nId = -1; nWalk < 2; ++nWalk, nId = -1)
-        EXPECT_THROW(while ((nId = ZARGetNext(oLayer.mpo, nId)) != -1), kelm::DataException);
+        EXPECT_EQ(GetRefusal([&] {
+                      while ((nId = ZARGetNext(oLayer.mpo, nId)) != -1)
+                          continue;
+                  }),
+                  "services/bundled/storelayer: The " + moFacets +
+                      " has changed since it was opened: there were 300 shapes");
+}
+
+TEST_F(VectorLayer, TheHostGetsBackItsStateOfGdal) {
+    const std::pair<const char*, const char*> options[] = {{"GML_PARSER", "XERCES"},
+                                                           {"GML_SKIP_RESOLVE_ELEMS", nullptr},
+                                                           {"SPATIALITE_LOAD", "YES"},
+                                                           {"GML_SKIP_CORRUPTED_FEATURES", nullptr},
+                                                           {"SHAPE_RESTORE_SHX", nullptr},
+                                                           {"OGR_SQLITE_LOAD_EXTENSIONS", nullptr},
+                                                           {"OGR_SQLITE_STATIC_VIRTUAL_OGR", ""}};
+    const auto Fetch = [](const char*, CSLConstList, GDALProgressFunc, void*, CPLHTTPFetchWriteFunc,
+                          void*, void* pCalls) -> CPLHTTPResult* {
+        ++*static_cast<int*>(pCalls);
+        return static_cast<CPLHTTPResult*>(CPLCalloc(1, sizeof(CPLHTTPResult)));
+    };
+    int nCalls = 0;
+    CPLHTTPPushFetchCallback(Fetch, &nCalls);
+    for (const auto& [pszKey, pszValue] : options)
+        CPLSetThreadLocalConfigOption(pszKey, pszValue);
+    for (const std::string& path :
+         {WriteRow(kGml, 3), WriteRow(kGpkg, 3), moFolder.GetPath("no")}) {
+        CPLErrorReset();
+        GetRefusal([&] { GetCrs(Layer(path)); });
+        EXPECT_EQ(CPLGetLastErrorType(), CE_None);
+        EXPECT_STREQ(CPLGetLastErrorMsg(), "");
+        EXPECT_EQ(CPLGetErrorHandlerUserData(), &moTranscript);
+        for (const auto& [pszKey, pszValue] : options)
+            EXPECT_STREQ(CPLGetThreadLocalConfigOption(pszKey, nullptr), pszValue) << pszKey;
+        CPLHTTPDestroyResult(CPLHTTPFetch("http://127.0.0.1:9", nullptr));
+    }
+    EXPECT_EQ(nCalls, 3);
+    CPLHTTPPopFetchCallback();
+    for (const auto& [pszKey, pszValue] : options)
+        CPLSetThreadLocalConfigOption(pszKey, nullptr);
 }
 
 } // namespace
