@@ -1,5 +1,5 @@
+#include "tests/support/gdaltranscript.h"
 #include "tests/support/sheets.h"
-#include "tests/support/transcript.h"
 
 namespace kelm::tin::test {
 namespace {
@@ -49,7 +49,7 @@ void ExpectDivided(const AabbNode* node, const OpenTin& tin, const Indices& list
 TEST(AabbTree, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
     Random random;
     AabbTree tree;
-    kelm::test::Transcript transcript;
+    kelm::test::GdalTranscript transcript;
     for (const Mesh& mesh : MakeMeshes(random))
         for (const DivisionType eType : {DT_BestAxis, DT_LongestAxis, DivisionType(7)})
             for (int nCapacity : {5, 1, 0, -1, 64}) {

@@ -1,78 +1,51 @@
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
-#include "tests/support/refusal.h"
+#include "tests/support/gdaltranscript.h"
 #include "tests/support/sheets.h"
-#include "tests/support/transcript.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
-namespace kelm::tin::test {
+#include <functional>
 
-using kelm::test::GetRefusal;
+namespace kelm::tin::test {
 
 constexpr double NaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double FAR = std::numeric_limits<double>::max();
 using MapPoint = point2_t<double>;
 
 TEST(BadArguments, OfReadersAreRefused) {
-    kelm::test::Transcript transcript;
-    const char* const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg";
+    kelm::test::GdalTranscript transcript;
+    transcript.moFolder = KELM_TIN_DATA_DIR;
+    const char *const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg", *const none = nullptr;
     const auto open = [](const char* name, int layer, double scale = 1, int datum = 2002) {
         return std::unique_ptr<TinReader>(
             TinReaderFactory::CreateTinReader(name, layer, 0, scale, ogc::cs::DatumType(datum)));
     };
-    const std::string factory = "tin/tinreaderfactory: ", crs = "services/bundled/";
-    for (const auto& [name, reason] :
-         {std::pair("", "The name of the file to open is empty"),
-          {"%s%n",
-           "The file %s%n cannot be opened: expected a readable local file of one of the formats "
-           "GeoPackage, ESRI Shapefile, FlatGeobuf, GeoJSON, GML, DXF, File Geodatabase, SQLite; "
-           "found: No such file or directory"}}) {
-        EXPECT_EQ(GetRefusal([&] { open(name, 1); }),
-                  factory + "The format of file " + name + " is not supported by ZAR");
-        EXPECT_EQ(transcript.Take(), std::string("TIN: ") + reason + '\n');
-    }
-    EXPECT_EQ(GetRefusal([&] { open(nullptr, 1); }),
-              factory + "The name of the file must be non-null");
-    EXPECT_EQ(GetRefusal([&] { open(good, 2); }),
-              factory + "ZARGetLayer failed on the provided vector layer 2 in the input file " +
-                  good + ".");
-    EXPECT_EQ(GetRefusal([&] { open(good, 1, 0); }),
-              "tin/tinreader: dfScale=0.0!non-zero: The scale parameter may not be zero");
-    EXPECT_EQ(GetRefusal([&] { open(good, 1, 1, 3000); }),
-              crs + "projcrs: The vertical datum code 3000 is not supported: use VD_Orthometric "
-                    "(2001) or VD_Ellipsoidal (2002)");
-    const auto reader = open(good, -9); // the first layer
-    EXPECT_EQ(GetRefusal([] { ZARGetNext(nullptr, -1); }),
-              crs + "vectorlayer: layer=null!: A layer of an open file is needed");
-    for (const char* mode : {"r+", static_cast<const char*>(nullptr)})
-        EXPECT_EQ(GetRefusal([&] { ZAROpen(good, mode); }),
-                  crs + "vectorlayer: mode=" + (mode ? mode : "null") +
-                      "!r: The vector layer store opens files for reading only");
-    for (const char* name : {"", static_cast<const char*>(nullptr)})
-        EXPECT_EQ(GetRefusal([&] { ZAROpen(name, "r"); }),
-                  crs + "datasetfile: name=" + (name ? "" : "null") +
-                      "!the path of a file: The name of the file to open is empty");
+    for (const auto& work : std::vector<std::function<void()>>{
+             [&] { open("", 1); }, [&] { open("%s%n", 1); }, [&] { open(none, 1); },
+             [&] { open(good, 2); }, [&] { open(good, 1, 0); }, [&] { open(good, 1, 1, 3000); },
+             [&] { ZARGetNext(nullptr, -1); }, [&] { ZAROpen(good, "r+"); },
+             [&] { ZAROpen(good, none); }, [&] { ZAROpen("", "r"); }, [&] { ZAROpen(none, "r"); }})
+        EXPECT_TRUE(transcript.Refuses(work));
     EXPECT_EQ(ZARSegNext(nullptr, 116, 0), 0);
     const auto window = MakeBox(MapPoint{NaN, FAR}, MapPoint{1, -FAR});
-    EXPECT_EQ(reader->Load(&window), nullptr);
+    EXPECT_EQ(open(good, -9)->Load(&window), nullptr); // the first layer
 }
 
 TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
+    kelm::test::Transcript transcript;
     Mesh mesh;
     mesh.Add({0, 0, 1}, {8, 0, 2}, {0, 8, 3});
     const OpenTin tin = mesh.MakeTin(10, 20);
     Triangle t = *tin.GetTriangle(0);
     Triangle_Id ids[1] = {};
     Point *const v = tin.GetVertex(0), *const hole[] = {v + 1, v, nullptr};
-    const std::string arrays = "tin/tin: vertices and index triples must be non-null";
-    EXPECT_EQ(GetRefusal([&] { Tin(v, 3, static_cast<Triangle_Id*>(nullptr), 1, 0, 0); }), arrays);
-    EXPECT_EQ(GetRefusal([&] { Tin(nullptr, 3, ids, 1, 0, 0); }), arrays);
-    for (const auto& work : {+[] { AabbTree{nullptr}; }, +[] { AabbTree().CreateTree(nullptr); }})
-        EXPECT_EQ(GetRefusal(work),
-                  "tin/aabbtree: poTin=!: The TIN used to create AabbTree cannot be empty");
-    EXPECT_EQ(GetRefusal([] { Triangle{nullptr}; }), ": vertices must be non-null");
-    EXPECT_EQ(GetRefusal([&] { t.SetVertices(hole); }), ": vertices must be non-null");
+    for (const auto& work : std::vector<std::function<void()>>{
+             [&] { Tin(v, 3, static_cast<Triangle_Id*>(nullptr), 1, 0, 0); },
+             [&] { Tin(nullptr, 3, ids, 1, 0, 0); }, [] { AabbTree{nullptr}; },
+             [] { AabbTree().CreateTree(nullptr); }, [] { Triangle{nullptr}; },
+             [&] { t.SetVertices(hole); }})
+        EXPECT_TRUE(transcript.Refuses(work));
     EXPECT_TRUE(t.GetVertex(0) == v && tin.GetVertex(3) == nullptr && !tin.GetTriangle(~0U));
     const AabbTree tree(&tin), rootless, *const indices[] = {nullptr, &tree, &rootless};
     float h = UNTOUCHED;
@@ -91,26 +64,23 @@ TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     EXPECT_EQ(t.GetGridPointsNum(9, 0) + t.GetGridPointsNum(-9, 9), 0U);
 }
 
-TEST(BadArguments, ARefusalIsCopiedWhole) {
+TEST(BadArguments, ARefusalIsCopiedWholeAndATextForTheHostIsNoFormat) {
+    kelm::test::GdalTranscript transcript;
     ParameterException kept("", ParameterException::PT_Invalid, "", "", "", "", "", 0);
     DataException plain("", "", "", 0);
     const ParameterException refusal("p", ParameterException::PT_Invalid, "actual", "expected",
                                      "message", "source", "function", 7);
     kept = refusal;
     plain = refusal;
-    EXPECT_EQ(GetRefusal([&] { throw ParameterException(kept); }),
-              "source: p=actual!expected: message");
-    EXPECT_EQ(GetRefusal([&] { throw DataException(plain); }), "source: message");
+    transcript.Refuses([&] { throw ParameterException(kept); });
+    transcript.Refuses([&] { throw DataException(plain); });
     EXPECT_TRUE(plain.GetFunction() == "function" && DataException(plain).GetLine() == 7);
-}
-
-TEST(BadArguments, ATextForTheHostIsNoFormat) {
-    kelm::test::Transcript transcript;
     const std::string text = FormatString("%d %s%%s%%n", 7, std::string(20000, 'x').c_str());
     EXPECT_EQ(text, "7 " + std::string(20000, 'x') + "%s%n");
     tellus::Warning::Warn(text, "tin/tinreader", 12);
     tellus::Report::AddInfo(text);
-    EXPECT_EQ(transcript.Take(), text + " (tin/tinreader)\nTIN: " + text + '\n');
+    EXPECT_EQ(transcript.Take(), "source: p=actual!expected: message\nsource: message\n" + text +
+                                     " (tin/tinreader)\nTIN: " + text + '\n');
 }
 
 } // namespace kelm::tin::test

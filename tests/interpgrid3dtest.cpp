@@ -1,5 +1,5 @@
 #include "services/interpgrid3d.h"
-#include "tests/support/refusal.h"
+#include "tests/support/transcript.h"
 
 #include <gtest/gtest.h>
 
@@ -59,30 +59,19 @@ TEST(InterpGrid3D, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOu
 }
 
 TEST(InterpGrid3D, RefusesWhatItCannotLayOutAndKeepsTheOldGrid) {
+    kelm::test::Transcript oTranscript;
     InterpGrid3D oGrid;
-    const std::string source = "services/bundled/interpgrid3d: ",
-                      unusable = ", as it does if no vertex has a usable coordinate";
-    EXPECT_EQ(kelm::test::GetRefusal([&] { oGrid.SetDimension(2); }),
-              source + "nDimension=2!1: InterpGrid3D holds one value a node");
+    EXPECT_TRUE(oTranscript.Refuses([&] { oGrid.SetDimension(2); }));
     oGrid.LayoutGrid(0, 0, 0, 1, 1, 1, 1, 1, 1);
-    for (const auto& [oBox, reason] : std::vector<std::pair<Box, std::string>>{
-             {{0, 0, 3.4e38, 1, 1, -3.4e38, 1, 1, 1}, // of no finite height
-              "along z the box runs from 3.4e+38 to -3.4e+38" + unusable},
-             {{0, std::nan(""), 0, 1, 1, 1, 1, 1, 1},
-              "along y the box runs from nan to 1" + unusable},
-             {{-HUGE_VAL, 0, 0, 1, 1, 1, 1, 1, 1},
-              "along x the box runs from -inf to 1" + unusable},
-             {{0, 0, 0, 1, 1, 1, 0, 1, 1}, "along x the spacing is 0"},
-             {{0, 0, 0, 1e9, 1, 1, 0.5, 1, 1},
-              "along x there are too many nodes: 0 to 1e+09 in steps of 0.5"},
-             {{1e300, 0, 0, 1e300, 1, 1, 1, 1, 1},
-              "along x the spacing 1 is lost in the rounding of 1e+300 to 1e+300"},
-             // 2^32 values and 12854 more
-             {{0, 0, 0, 26754, 26754, 1, 1, 1, 1},
-              "the box needs 26755 x 26755 x 2 nodes; the most is 1431655765"}}) {
+    for (const Box& oBox :
+         {Box{0, 0, 3.4e38, 1, 1, -3.4e38, 1, 1, 1}, // of no finite height
+          Box{0, std::nan(""), 0, 1, 1, 1, 1, 1, 1}, Box{-HUGE_VAL, 0, 0, 1, 1, 1, 1, 1, 1},
+          Box{0, 0, 0, 1, 1, 1, 0, 1, 1}, Box{0, 0, 0, 1e9, 1, 1, 0.5, 1, 1},
+          Box{1e300, 0, 0, 1e300, 1, 1, 1, 1, 1},
+          // 26755 x 26755 x 2 nodes of three values: 2^32 and 12854 more.
+          Box{0, 0, 0, 26754, 26754, 1, 1, 1, 1}}) {
         const auto Layout = [&](auto... v) { oGrid.LayoutGrid(v...); };
-        EXPECT_EQ(kelm::test::GetRefusal([&, &oWanted = oBox] { std::apply(Layout, oWanted); }),
-                  source + "InterpGrid3D: " + reason);
+        EXPECT_TRUE(oTranscript.Refuses([&] { std::apply(Layout, oBox); }));
     }
     EXPECT_EQ(oGrid.GetNumGridPoints(), 8U);
 }

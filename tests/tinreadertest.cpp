@@ -1,7 +1,4 @@
 #include "tin/tinreader.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tests/support/transcript.h"
 #include "tin/tinreaderfactory.h"
 
 #include <gtest/gtest.h>
@@ -34,19 +31,6 @@ TEST(TinReaderTest, TheTerrainIsTheSameOnEveryThreadAndChangesItsDatum) {
         ASSERT_TRUE(v.x == w.x && v.y == w.y && v.z == w.z) << i;
         ASSERT_NEAR(geoidal->GetVertex(i)->z - v.z, 30.6F, 0.5F) << "EGM96 of the place";
     }
-}
-
-TEST(TinReaderTest, ALayerWithoutACrsKeepsItsHeightsAndSaysSo) {
-    kelm::test::Transcript transcript;
-    const kelm::test::TemporaryFolder folder;
-    const std::string path = kelm::test::WriteLayer(
-        folder.GetPath("a.gpkg"), "GPKG", {{kelm::test::MakeTriangle(0, 0, 5)}, wkbPolygon25D, ""});
-    const std::unique_ptr<TinReader> reader(
-        TinReaderFactory::CreateTinReader(path.c_str(), 0, 0.0, 1.0, VD_Orthometric));
-    reader->SetOutputVerticalDatum(VD_Ellipsoidal);
-    EXPECT_EQ(transcript.Take(), "The layer has a local CRS, or none: its heights are the same in "
-                                 "every vertical datum. (tin/tinreader)\n");
-    EXPECT_EQ(std::unique_ptr<Tin>(reader->Load(nullptr))->GetVertex(0)->z, 5.0F);
 }
 
 } // namespace

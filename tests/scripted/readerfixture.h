@@ -1,8 +1,8 @@
 #pragma once
 
 #include "tests/digest/recordingservices.h"
-#include "tests/support/refusal.h"
 #include "tests/support/scriptedservices.h"
+#include "tests/support/transcript.h"
 #include "tin/aabbtree.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
@@ -85,18 +85,13 @@ struct Opened : kelm::tin::Tin {
     }
 };
 
-/// A script with one triangle, whose first height is 5. What is reported and not taken is a
-/// failure.
+/// A script with one triangle, whose first height is 5.
 struct ReaderTest : testing::Test {
     ReaderTest() {
         script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})};
-        Recording::poTranscript = &transcript;
+        Recording::poTranscript = &transcript.moLines;
     }
-    ~ReaderTest() override {
-        Recording::poTranscript = nullptr;
-        EXPECT_EQ(transcript, "");
-    }
-    std::string Take() { return std::exchange(transcript, ""); }
+    ~ReaderTest() override { Recording::poTranscript = nullptr; }
 
     static Reader Open(double offset = 0.0, double scale = 1.0, int source = 2002) {
         return Reader(kelm::tin::TinReaderFactory::CreateTinReader("some.file", 0, offset, scale,
@@ -107,5 +102,5 @@ struct ReaderTest : testing::Test {
     }
 
     scripted::Script script;
-    std::string transcript;
+    kelm::test::Transcript transcript;
 };
