@@ -77,35 +77,6 @@ TEST(AabbTree, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
     EXPECT_GE(tree.EstimateObjBytes(4294967295U), 4294967295U * std::uint64_t{4});
 }
 
-struct OpenNode : AabbNode {
-    using AabbNode::ComputeBBox, AabbNode::ComputeCenter, AabbNode::Divide;
-    using AabbNode::GetBestAxis, AabbNode::GetLongestAxis;
-};
-
-TEST(AabbNode, StepsByHandDivideAsABuildDoes) {
-    Random random;
-    const OpenTin tin = MakeMeshes(random)[1].MakeTin();
-    const Triangle* triangles = tin.GetTriangle(0);
-    AabbTree tree;
-    for (const DivisionType eType : {DT_BestAxis, DT_LongestAxis}) {
-        tree.GetInfo()->SetDivisionType(eType);
-        tree.CreateTree(&tin);
-        OpenNode node;
-        float center[2];
-        Indices left{9}, right{9}, built{9};
-        node.ComputeBBox(triangles, tin.GetAll());
-        node.ComputeCenter(triangles, tin.GetAll(), center);
-        const Axis axis = eType == DT_BestAxis ? node.GetBestAxis(triangles, tin.GetAll(), center)
-                                               : node.GetLongestAxis();
-        node.Divide(triangles, tin.GetAll(), axis, center, left, right);
-        EXPECT_EQ(left.size() + right.size(), tin.GetTriangleCount());
-        tree.GetRoot()->GetLeft()->FindLeaves(EVERYWHERE, built);
-        std::sort(built.begin() + 1, built.end()); // behind what stood there
-        left.insert(left.begin(), 9);
-        EXPECT_EQ(built, left);
-    }
-}
-
 // Wrong releases show under the address sanitizer.
 TEST(AabbNode, OnlyTheTopOfABuildReleasesIt) {
     Random random;

@@ -90,34 +90,17 @@ point2_t<float> MakePosition(const Tin& tin, Random& random) {
     }
 }
 
-/// Asks in both frames in turn.
-bool GetHeight(const Tin& tin, const AabbTree* tree, point2_t<float> p, bool isMap, float& height) {
-    height = UNTOUCHED;
-    if (isMap)
-        return tin.GetHeight(BASE_X + static_cast<double>(p.x), BASE_Y + static_cast<double>(p.y),
-                             height, tree);
-    return tin.GetHeight(p.x, p.y, height, tree);
-}
-
-/// @return false if the tree and the scan disagree
-bool AddAnswers(const Tin& tin, unsigned count, bool isScanned, Random& random, Digest& digest) {
+void AddAnswers(const Tin& tin, unsigned count, Random& random, Digest& digest) {
     const AabbTree tree(&tin);
     for (unsigned i = 0; i < count; ++i) {
         const point2_t<float> p = MakePosition(tin, random);
-        float height;
-        const bool found = GetHeight(tin, &tree, p, i % 2 == 0, height);
+        float height = UNTOUCHED;
+        const bool found = // in both frames in turn
+            i % 2 == 0 ? tin.GetHeight(BASE_X + static_cast<double>(p.x),
+                                       BASE_Y + static_cast<double>(p.y), height, &tree)
+                       : tin.GetHeight(p.x, p.y, height, &tree);
         digest.AddAnswer(found, height);
-        if (!isScanned)
-            continue;
-        float scanned;
-        if (GetHeight(tin, nullptr, p, i % 2 == 0, scanned) != found ||
-            std::memcmp(&scanned, &height, sizeof height) != 0) {
-            std::fprintf(stderr, "tree and scan disagree at %a, %a\n", static_cast<double>(p.x),
-                         static_cast<double>(p.y));
-            return false;
-        }
     }
-    return true;
 }
 
 void Print(const Digest& digest, const char* answers, const char* hits) {
@@ -132,9 +115,8 @@ int main() {
     Digest digest;
     const Tin small = MakeSheet(32, random);
     const Tin large = MakeSheet(224, random);
-    if (!AddAnswers(small, 20000, true, random, digest) ||
-        !AddAnswers(large, 980000, false, random, digest))
-        return 1;
+    AddAnswers(small, 20000, random, digest);
+    AddAnswers(large, 980000, random, digest);
     Print(digest, "answers", "heights");
     Print(AskEverything(), "other answers", "found");
     return 0;

@@ -15,7 +15,7 @@ MapPoint ToMap(const Tin& tin, Point2 p) {
     return {x + static_cast<double>(p.x), y + static_cast<double>(p.y)};
 }
 
-/// The box of two points, which may be inverted on an axis as a rare user's is.
+/// The box of two points, now and then as it comes, inverted on an axis.
 template <typename P>
 auto MakeRegion(const P& a, const P& b, unsigned turn) {
     return turn % 9 == 0 ? MakeBox(a, b)
@@ -28,16 +28,15 @@ void AddSurface(const Tin& tin, Digest& digest) {
     BBox<double, point3_t<double>> box;
     tin.GetRawBBox(box);
     digest.Add(ToMap(tin, {0, 0}));
-    digest.Add(box.min);
-    digest.Add(box.max);
-    digest.Add(tin.GetObjBytes());
+    for (const point3_t<double>& corner : {box.min, box.max})
+        digest.Add(corner);
     for (unsigned i = 0; i < tin.GetVertexCount(); ++i)
         digest.Add(*tin.GetVertex(i));
-    for (unsigned i = 0; i < tin.GetTriangleCount(); ++i) {
-        for (int k = 0; k < 3; ++k)
-            digest.Add(tin.GetTriangle(i)->GetVertex(k) - tin.GetVertex(0));
-        digest.Add(tin.GetTriangle(i)->GetBBox().min);
-        digest.Add(tin.GetTriangle(i)->GetBBox().max);
+    for (unsigned i = 0; i < 3 * tin.GetTriangleCount(); ++i) {
+        const Triangle& triangle = *tin.GetTriangle(i / 3);
+        digest.Add(triangle.GetVertex(static_cast<int>(i % 3)) - tin.GetVertex(0));
+        for (const Point2& corner : {triangle.GetBBox().min, triangle.GetBBox().max})
+            digest.Add(corner);
     }
 }
 
@@ -46,8 +45,7 @@ void AddSubset(const Tin* poSubset, Point2 p, Digest& digest) {
     const std::unique_ptr<const Tin> subset(poSubset);
     float height = UNTOUCHED;
     const MapPoint at = subset ? ToMap(*subset, p) : MapPoint{};
-    const bool found = subset && subset->GetHeight(at.x, at.y, height, nullptr);
-    digest.AddAnswer(found, height);
+    digest.AddAnswer(subset && subset->GetHeight(at.x, at.y, height, nullptr), height);
     if (subset)
         AddSurface(*subset, digest);
 }
@@ -114,14 +112,29 @@ struct Question {
     }
 };
 
-/// Builds a tree and adds its nodes and the order of its leaves.
-void BuildTree(const Tin& tin, unsigned turn, AabbTree& tree, Digest& digest) {
+struct OpenNode : AabbNode {
+    using AabbNode::ComputeBBox, AabbNode::ComputeCenter, AabbNode::Divide;
+    using AabbNode::GetBestAxis, AabbNode::GetLongestAxis;
+};
+
+/// Builds a tree and adds its nodes and the order of its leaves, and a first division by hand.
+void BuildTree(const OpenTin& tin, unsigned turn, AabbTree& tree, Digest& digest) {
     tree.GetInfo()->SetDivisionType(DivisionType(turn % 2));
     tree.SetCapacity(static_cast<int>(turn % 7));
     tree.CreateTree(&tin);
-    Indices leaves;
+    const Triangle* triangles = tin.GetTriangle(0);
+    Indices leaves, left{9}, right{9};
+    OpenNode node;
+    float center[2];
+    node.ComputeBBox(triangles, tin.GetAll());
+    node.ComputeCenter(triangles, tin.GetAll(), center);
+    node.Divide(triangles, tin.GetAll(),
+                turn % 2 == 0 ? node.GetBestAxis(triangles, tin.GetAll(), center)
+                              : node.GetLongestAxis(),
+                center, left, right);
     tree.FindLeaves(EVERYWHERE, leaves);
-    digest.AddList(leaves);
+    for (const Indices& list : {leaves, left, right})
+        digest.AddList(list);
     digest.AddList<std::uint64_t>({tree.GetNodeCount(), tree.GetCapacity(), tree.GetObjBytes()});
 }
 
