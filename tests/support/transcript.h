@@ -70,7 +70,7 @@ struct Transcript {
         std::string section, line;
         while (getline(file, line) && line != title)
             continue;
-        while (getline(file, line) && line.find("[") != 0)
+        while (getline(file, line) && line.rfind('[', 0) != 0)
             section += line + '\n';
         return section;
     }
