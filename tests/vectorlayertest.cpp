@@ -161,6 +161,7 @@ TEST_F(VectorLayer, ADrawingOfAThousandTextsIsWarnedOfInAThousandLines) {
 }
 
 TEST_F(VectorLayer, OnlyTheFirstGeometryColumnIsRead) {
+    GDALAllRegister();
     const std::string path = moFolder.GetPath("a.sqlite");
     GDALDatasetUniquePtr poDataset(GetGDALDriverManager()->GetDriverByName("SQLite")->Create(
         path.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
