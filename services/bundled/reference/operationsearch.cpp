@@ -87,7 +87,7 @@ struct Side {
     bool mbEllipsoidal;
 
     Side(ProjSession& session, const ProjCRS& crs)
-        : mpo(session.CreateFromWkt(crs.GetText().moDefinition)),
+        : mpo(session.CreateFromText(crs.GetText().moDefinition)),
           mbEllipsoidal(crs.GetDatum() == cs::VD_Ellipsoidal) {}
     /// @return the name, with the kind of heights where PROJ's name leaves it out
     std::string GetText() const {

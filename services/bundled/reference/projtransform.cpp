@@ -79,7 +79,7 @@ ProjTransform::ProjTransform(const ProjCRS& source, const ProjCRS& target)
     moMapArea = moOperations.front().moArea;
     if (moMapArea.IsWorld())
         return;
-    const PjPtr map = moSession.CreateFromWkt(source.GetMap().GetText().moDefinition);
+    const PjPtr map = moSession.CreateFromText(source.GetMap().GetText().moDefinition);
     mpoToDegrees = CreateToDegrees(moSession, map.get());
     const char* name = nullptr;
     ReadArea(moSession, map.get(), moMapArea, name);
