@@ -77,6 +77,10 @@ const struct {
     {"EPSG:2193", 1748735, 5427916,
      "+proj=pipeline +step +inv +proj=tmerc +lon_0=173 +k=0.9996 +x_0=1600000 +y_0=10000000 "
      "+ellps=GRS80 "},
+    // In the Canaries: beside the area of the operation, in that of the CRS.
+    {"EPSG:3035", 1835000, 1030000,
+     "+proj=pipeline +step +inv +proj=laea +lat_0=52 +lon_0=10 +x_0=4321000 +y_0=3210000 "
+     "+ellps=GRS80 "},
     {"+proj=longlat +datum=WGS84 +vunits=ft +type=crs", -84.2, 36.3, kFromDegrees, 0.3048},
     {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +type=crs", 738669, 4045105,
      kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart "}};

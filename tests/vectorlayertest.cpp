@@ -144,6 +144,7 @@ TEST_F(VectorLayer, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader
     };
     EXPECT_EQ(GetType({{}, wkbPoint25D}), 1);
     EXPECT_EQ(GetType({{}, wkbMultiLineString25D}), 3);
+    EXPECT_EQ(GetType({{""}, wkbPoint25D}), 1) << "no geometry is no facet";
     EXPECT_EQ(GetType({{point}}), 1);
     EXPECT_EQ(GetType({{point, line}}), 3);
     EXPECT_EQ(GetType({{point, line, MakeTriangle(0, 0, 0)}}), 2);
