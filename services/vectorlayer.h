@@ -37,8 +37,8 @@ struct ZARLayer_t {
 
 /// Spatial reference of a layer, as the store hands it to the coordinate reference services.
 struct ProjInfo_t {
-    /// The CRS as text; empty if the layer has none. The bundled services read WKT and PROJJSON, and
-    /// the bundled store writes PROJJSON.
+    /// The CRS as text; empty if the layer has none. The bundled services read WKT and PROJJSON,
+    /// and the bundled store writes PROJJSON.
     std::string definition;
 };
 

@@ -21,8 +21,9 @@ constexpr std::uint32_t MOST_NODES = std::numeric_limits<std::uint32_t>::max() /
 constexpr double LEAST_MAP_CELLS = 128.0;
 constexpr double MOST_MAP_CELLS = 256.0;
 
-/// A kink in the outermost cell cannot be restored: there is no node beyond. EGM96's greatest, 6 m in
-/// 15 arc minutes, costs less than 1 mm if the cell is this often halved, and a degree has 128 cells.
+/// A kink in the outermost cell cannot be restored: there is no node beyond. EGM96's greatest, 6 m
+/// in 15 arc minutes, costs less than 1 mm if the cell is this often halved, and a degree has 128
+/// cells.
 constexpr int HALVINGS = 6;
 
 /// @return the value on the chord from a to b; exactly a and b at its ends, and a if both are equal
@@ -216,6 +217,6 @@ void InterpGrid3D::GetVal(double x, double y, double z, double* out) const {
         return Interpolate(alongY, [&](int i) { return InRow(p + i * up); });
     };
     const double below = InLayer(low);
-    *out = grid.moZ.GetCount() == 1 ? below
-                                    : FollowChord(below, InLayer(low + layer), alongZ.mdfPart);
+    *out =
+        grid.moZ.GetCount() == 1 ? below : FollowChord(below, InLayer(low + layer), alongZ.mdfPart);
 }

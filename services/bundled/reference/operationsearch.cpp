@@ -1,9 +1,11 @@
 #include "services/bundled/reference/operationsearch.h"
 
+#include "services/bundled/reference/heightmeaning.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
 #include <algorithm>
+#include <cmath>
 #include <string>
 #include <utility>
 
@@ -12,6 +14,11 @@ namespace kelm::ogc {
 namespace {
 
 constexpr const char* SOURCE = "services/bundled/reference/operationsearch";
+
+/// Metres, as PROJ gives it: its figure counts a shift of datum there and back. The common shift of
+/// NAD83 has 9. Those beyond 10 stand for several countries at once (S-JTSK 13, ED50 21), or are
+/// marked as unknown by 999.
+constexpr double COARSEST_ACCURACY = 10.0;
 
 using FactoryContextPtr = std::unique_ptr<PJ_OPERATION_FACTORY_CONTEXT, ProjRelease>;
 
@@ -37,32 +44,57 @@ bool IsBetter(const ProjOperation& a, const ProjOperation& b) {
         return a.mdfAccuracy < b.mdfAccuracy;
     if (a.IsUsable() != b.IsUsable())
         return a.IsUsable();
-    return a.moArea.GetSize() < b.moArea.GetSize();
+    return a.GetSize() < b.GetSize();
 }
 
-/// @return the operations from the best on, without those that a better one covers
+/// Takes an operation over into one of the same steps. @return false if there is none
+bool MergeSame(std::vector<ProjOperation>& kept, const ProjOperation& operation) {
+    const auto same = std::find_if(kept.begin(), kept.end(), [&](const ProjOperation& other) {
+        return !operation.moSteps.empty() && other.moSteps == operation.moSteps;
+    });
+    if (same != kept.end())
+        same->Merge(operation);
+    return same != kept.end();
+}
+
+/// @return the operations from the best on, without those that a better one covers. Operations of
+/// the same steps are one: PROJ's figures of accuracy then differ by a shift that is taken back
 std::vector<ProjOperation> RankOperations(std::vector<ProjOperation> operations) {
     std::stable_sort(operations.begin(), operations.end(), IsBetter);
     std::vector<ProjOperation> kept;
     for (ProjOperation& operation : operations) {
-        const auto Covers = [&](const ProjOperation& better) {
-            return better.moArea.IsAreaInside(operation.moArea);
-        };
-        if (std::none_of(kept.begin(), kept.end(), Covers))
+        const auto covers = [&](const ProjOperation& better) { return better.Covers(operation); };
+        if (!MergeSame(kept, operation) && std::none_of(kept.begin(), kept.end(), covers))
             kept.push_back(std::move(operation));
     }
     return kept;
 }
 
+/// Removes operations that are known to be too coarse. @return the best of them in words, or empty
+std::string RemoveCoarse(std::vector<ProjOperation>& ranked) {
+    const auto coarse = std::find_if(ranked.begin(), ranked.end(), [](const ProjOperation& o) {
+        return std::isfinite(o.mdfAccuracy) && o.mdfAccuracy > COARSEST_ACCURACY;
+    });
+    if (coarse == ranked.end())
+        return {};
+    std::string text =
+        FormatString("PROJ's best operation, '%s' (%s), is coarser than %g m",
+                     coarse->moName.c_str(), coarse->GetAccuracyText().c_str(), COARSEST_ACCURACY);
+    ranked.erase(
+        std::remove_if(coarse, ranked.end(),
+                       [](const ProjOperation& o) { return std::isfinite(o.mdfAccuracy); }),
+        ranked.end());
+    return text;
+}
+
 /// @return all operations that are not mere guesses. A grid file that nobody distributes counts
 /// only if there is no operation without such a file
 std::vector<ProjOperation> FindOperations(ProjSession& session, const PJ* source, const PJ* target,
-                                          bool heightsDiffer) {
+                                          const OperationNeeds& needs) {
     for (const PROJ_GRID_AVAILABILITY_USE grids :
          {PROJ_GRID_AVAILABILITY_KNOWN_AVAILABLE, PROJ_GRID_AVAILABILITY_IGNORED}) {
         const PjListPtr list = SearchOperations(session, source, target, grids, false);
-        std::vector<ProjOperation> operations =
-            DescribeOperations(session, list.get(), heightsDiffer);
+        std::vector<ProjOperation> operations = DescribeOperations(session, list.get(), needs);
         if (!operations.empty())
             return operations;
     }
@@ -96,15 +128,13 @@ struct Side {
     }
 };
 
-/// @throw kelm::DataException unless an operation can be used. @param messages what PROJ has said
+/// @throw kelm::DataException unless an operation can be used. @param otherwise why there is none
 void TestUsable(const std::vector<ProjOperation>& operations, const Side& source,
-                const Side& target, const std::string& messages) {
+                const Side& target, const std::string& otherwise) {
     if (std::any_of(operations.begin(), operations.end(),
                     [](const ProjOperation& operation) { return operation.IsUsable(); }))
         return;
-    const std::string reason = operations.empty()
-                                   ? "PROJ has no operation that is more than a guess" + messages
-                                   : GetMissingText(operations);
+    const std::string reason = operations.empty() ? otherwise : GetMissingText(operations);
     throw DataException(FormatString("No conversion from %s to %s: %s", source.GetText().c_str(),
                                      target.GetText().c_str(), reason.c_str()),
                         SOURCE, __PRETTY_FUNCTION__, __LINE__);
@@ -128,9 +158,15 @@ std::vector<ProjOperation> ListOperations(ProjSession& session, const ProjCRS& s
                                           const ProjCRS& target) {
     const Side from(session, source);
     const Side to(session, target);
-    std::vector<ProjOperation> operations = RankOperations(FindOperations(
-        session, from.mpo.get(), to.mpo.get(), from.mbEllipsoidal != to.mbEllipsoidal));
-    TestUsable(operations, from, to, session.TakeMessages());
+    const OperationNeeds needs{from.mbEllipsoidal != to.mbEllipsoidal,
+                               IsGeocentricEllipsoid(session, from.mpo.get())};
+    std::vector<ProjOperation> operations =
+        RankOperations(FindOperations(session, from.mpo.get(), to.mpo.get(), needs));
+    const std::string messages = session.TakeMessages();
+    const std::string coarse = RemoveCoarse(operations);
+    TestUsable(operations, from, to,
+               coarse.empty() ? "PROJ has no operation that is more than a guess" + messages
+                              : coarse);
     return operations;
 }
 
