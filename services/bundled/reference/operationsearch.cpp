@@ -5,7 +5,6 @@
 #include "services/reporting.h"
 
 #include <algorithm>
-#include <cmath>
 #include <string>
 #include <utility>
 
@@ -14,11 +13,6 @@ namespace kelm::ogc {
 namespace {
 
 constexpr const char* SOURCE = "services/bundled/reference/operationsearch";
-
-/// Metres, as PROJ gives it: its figure counts a shift of datum there and back. The common shift of
-/// NAD83 has 9. Those beyond 10 stand for several countries at once (S-JTSK 13, ED50 21), or are
-/// marked as unknown by 999.
-constexpr double COARSEST_ACCURACY = 10.0;
 
 using FactoryContextPtr = std::unique_ptr<PJ_OPERATION_FACTORY_CONTEXT, ProjRelease>;
 
@@ -70,23 +64,6 @@ std::vector<ProjOperation> RankOperations(std::vector<ProjOperation> operations)
     return kept;
 }
 
-/// Removes operations that are known to be too coarse. @return the best of them in words, or empty
-std::string RemoveCoarse(std::vector<ProjOperation>& ranked) {
-    const auto coarse = std::find_if(ranked.begin(), ranked.end(), [](const ProjOperation& o) {
-        return std::isfinite(o.mdfAccuracy) && o.mdfAccuracy > COARSEST_ACCURACY;
-    });
-    if (coarse == ranked.end())
-        return {};
-    std::string text =
-        FormatString("PROJ's best operation, '%s' (%s), is coarser than %g m",
-                     coarse->moName.c_str(), coarse->GetAccuracyText().c_str(), COARSEST_ACCURACY);
-    ranked.erase(
-        std::remove_if(coarse, ranked.end(),
-                       [](const ProjOperation& o) { return std::isfinite(o.mdfAccuracy); }),
-        ranked.end());
-    return text;
-}
-
 /// @return all operations that are not mere guesses. A grid file that nobody distributes counts
 /// only if there is no operation without such a file
 std::vector<ProjOperation> FindOperations(ProjSession& session, const PJ* source, const PJ* target,
@@ -108,8 +85,9 @@ std::string GetMissingText(const std::vector<ProjOperation>& operations) {
                                     best.moName.c_str(), best.GetAccuracyText().c_str(),
                                     best.moAreaName.c_str(), best.moMissingGrids.c_str());
     for (std::size_t i = 1; i < operations.size(); ++i)
-        text += FormatString("; in %s: %s", operations[i].moAreaName.c_str(),
-                             operations[i].moMissingGrids.c_str());
+        if (!operations[i].IsUsable())
+            text += FormatString("; in %s: %s", operations[i].moAreaName.c_str(),
+                                 operations[i].moMissingGrids.c_str());
     return text;
 }
 
@@ -128,15 +106,24 @@ struct Side {
     }
 };
 
-/// @throw kelm::DataException unless an operation can be used. @param otherwise why there is none
+/// @return why no operation serves. @param messages what PROJ has said
+std::string GetReason(const std::vector<ProjOperation>& operations, const std::string& messages) {
+    if (operations.empty())
+        return "PROJ has no operation that is more than a guess" + messages;
+    return operations.front().IsFine() ? GetMissingText(operations)
+                                       : operations.front().GetCoarseText();
+}
+
+/// @throw kelm::DataException unless an operation serves. @param messages what PROJ has said
 void TestUsable(const std::vector<ProjOperation>& operations, const Side& source,
-                const Side& target, const std::string& otherwise) {
-    if (std::any_of(operations.begin(), operations.end(),
-                    [](const ProjOperation& operation) { return operation.IsUsable(); }))
+                const Side& target, const std::string& messages) {
+    if (std::any_of(operations.begin(), operations.end(), [](const ProjOperation& operation) {
+            return operation.IsUsable() && operation.IsFine();
+        }))
         return;
-    const std::string reason = operations.empty() ? otherwise : GetMissingText(operations);
     throw DataException(FormatString("No conversion from %s to %s: %s", source.GetText().c_str(),
-                                     target.GetText().c_str(), reason.c_str()),
+                                     target.GetText().c_str(),
+                                     GetReason(operations, messages).c_str()),
                         SOURCE, __PRETTY_FUNCTION__, __LINE__);
 }
 
@@ -162,11 +149,7 @@ std::vector<ProjOperation> ListOperations(ProjSession& session, const ProjCRS& s
                                IsGeocentricEllipsoid(session, from.mpo.get())};
     std::vector<ProjOperation> operations =
         RankOperations(FindOperations(session, from.mpo.get(), to.mpo.get(), needs));
-    const std::string messages = session.TakeMessages();
-    const std::string coarse = RemoveCoarse(operations);
-    TestUsable(operations, from, to,
-               coarse.empty() ? "PROJ has no operation that is more than a guess" + messages
-                              : coarse);
+    TestUsable(operations, from, to, session.TakeMessages());
     return operations;
 }
 

@@ -52,8 +52,10 @@ FailureCount CountFailures(const double* source, const double* target, unsigned 
     return error != 0 && failed.mnFailed == 0 ? FailAll(source, count) : failed;
 }
 
-/// @throw kelm::DataException if the operation lacks a grid file
-void TestInstalled(const ProjOperation& operation, const double* source, unsigned int count) {
+/// @throw kelm::DataException if the operation lacks a grid file or is too coarse
+void TestServes(const ProjOperation& operation, const double* source, unsigned int count) {
+    if (!operation.IsFine())
+        FailAll(source, count).Test(count, operation.GetCoarseText());
     if (!operation.IsUsable())
         FailAll(source, count)
             .Test(count, FormatString("'%s' (%s) needs %s, which is not installed",
@@ -128,7 +130,7 @@ const ProjOperation& ProjTransform::ChooseOperation(const double* source, unsign
     if (!mpoToDegrees)
         return moOperations.front();
     const ProjOperation& chosen = moOperations[FindCommon(source, count)];
-    TestInstalled(chosen, source, count);
+    TestServes(chosen, source, count);
     return chosen;
 }
 

@@ -16,6 +16,11 @@ namespace {
 /// Some areas are named by a list of all their counties.
 constexpr std::size_t LONGEST_AREA_NAME = 80;
 
+/// Metres, as PROJ gives it: 5 for a shift of datum, counted there and back, and 1 for a geoid
+/// model. That is NAD27 by its grids. What is coarser stands for several countries at once (S-JTSK
+/// 13, ED50 13 to 21), or for a survey of few points, or is marked as unknown by 999.
+constexpr double COARSEST_ACCURACY = 11.0;
+
 void AppendItem(std::string& list, const std::string& item) {
     list.append(list.empty() ? "" : ", ").append(item);
 }
@@ -107,6 +112,15 @@ ProjOperation DescribeOperation(ProjSession& session, const PJ* object,
 std::string ProjOperation::GetAccuracyText() const {
     return std::isfinite(mdfAccuracy) ? FormatString("accuracy %g m", mdfAccuracy)
                                       : std::string("accuracy unknown");
+}
+
+bool ProjOperation::IsFine() const {
+    return mdfAccuracy <= COARSEST_ACCURACY || std::isinf(mdfAccuracy);
+}
+
+std::string ProjOperation::GetCoarseText() const {
+    return FormatString("the most accurate operation, '%s' (%s), is coarser than %g m",
+                        moName.c_str(), GetAccuracyText().c_str(), COARSEST_ACCURACY);
 }
 
 bool ProjOperation::IsPointInside(double longitude, double latitude) const {

@@ -20,7 +20,11 @@ struct ProjOperation {
     std::string moMissingGrids;     ///< those of them that are not installed
 
     bool IsUsable() const { return moMissingGrids.empty(); }
+    /// @return true unless the accuracy is known to be too coarse for heights
+    bool IsFine() const;
     std::string GetAccuracyText() const;
+    /// @return a sentence for a message, if IsFine denies
+    std::string GetCoarseText() const;
     /// @return true if a position is in one of the areas, see AreaOfUse
     bool IsPointInside(double longitude, double latitude) const;
     /// @return true if the areas of the other operation certainly lie in those of this one

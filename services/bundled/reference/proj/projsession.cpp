@@ -4,6 +4,7 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 
+#include <mutex>
 #include <new>
 #include <vector>
 
@@ -26,12 +27,18 @@ bool IsJson(const std::string& text) {
     return first != std::string::npos && text[first] == '{';
 }
 
+/// Lets a context look for data where the host's GDAL does, if that is not where PROJ looks anyway.
 void SetFolders(PJ_CONTEXT* context) {
-    const std::vector<std::string> folders = services::GetProjFolders();
+    static std::mutex mutex;
+    const std::lock_guard<std::mutex> lock(mutex);
+    std::string joined;
     std::vector<const char*> paths;
-    for (const std::string& folder : folders)
+    const std::vector<std::string> folders = services::GetProjFolders();
+    for (const std::string& folder : folders) {
+        joined.append(joined.empty() ? "" : ":").append(folder);
         paths.push_back(folder.c_str());
-    if (!paths.empty())
+    }
+    if (!paths.empty() && joined != proj_info().searchpath)
         proj_context_set_search_paths(context, static_cast<int>(paths.size()), paths.data());
 }
 
