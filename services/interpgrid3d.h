@@ -4,16 +4,24 @@
 
 #include <memory>
 
-/// A regular 3-D grid of values with interpolation between its nodes.
+/// A 3-D grid of values with interpolation between its nodes.
 ///
-/// On each axis the nodes stand at low, low + spacing, low + 2 spacing and so on, up to the first
-/// that reaches the high end of the box; there are at least two. Positions vary fastest in x, then
-/// in y, then in z.
+/// All nodes lie in the box; the outer ones lie on its faces. An axis of no width has one node.
+/// Positions vary fastest in x, then in y, then in z.
 ///
-/// Between nodes the value is the trilinear interpolation: linear on each axis in turn, x first
-/// (Press et al., Numerical Recipes, 1986, section 3.6, extended to three axes). A position outside
-/// the grid is first moved to the nearest outer plane of nodes. Coordinates, spacings and values
-/// have the units that the caller gives them.
+/// In z the nodes are no farther apart than the given spacing. In x and y the number of cells is
+/// what the spacing asks for, but at least 128 and at most 256: the unit of the map is not known,
+/// and where it is the degree one spacing would span the whole box; and a node costs its user a
+/// transform. Toward the ends of x and y the outermost cell is halved six times.
+///
+/// The values in mind are heights of a geoid model, which is linear between its own nodes on each
+/// axis, with a kink at each. So on x and y a line through the two nodes on either side of a cell
+/// is drawn on into the cell. If the two lines meet there, on one side of the chord, they replace
+/// it (subcell resolution: Harten, Journal of Computational Physics 83, 1989). That restores a
+/// function of one kink in three cells exactly. Elsewhere, in the outermost cells and in z, the
+/// value is linear. x is interpolated first, then y, then z. A position outside the box is first
+/// moved to its nearest face. Coordinates, spacings and values have the units that the caller gives
+/// them.
 ///
 /// One thread sets a grid up; then any number may read it.
 class KELM_SERVICES_EXPORT InterpGrid3D {
@@ -29,9 +37,9 @@ class KELM_SERVICES_EXPORT InterpGrid3D {
 
     /// Defines the nodes over a box and gives every node the value 0.
     /// @throw kelm::DataException if a bound or spacing is not finite, if a high end lies below its
-    /// low end (as it does for the range of no heights at all), if a spacing is not above 0 or is
-    /// lost in the rounding of the bounds, or if the three coordinates of all nodes cannot be
-    /// counted in 32 bits; std::bad_alloc. After a throw the former nodes are kept
+    /// low end (as it does for the range of no heights at all), if a spacing is not above 0, or if
+    /// the three coordinates of all nodes cannot be counted in 32 bits; std::bad_alloc. After a
+    /// throw the former nodes are kept
     void LayoutGrid(double xMin, double yMin, double zMin, double xMax, double yMax, double zMax,
                     double xSpacing, double ySpacing, double zSpacing);
 

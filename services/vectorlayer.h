@@ -37,7 +37,9 @@ struct ZARLayer_t {
 
 /// Spatial reference of a layer, as the store hands it to the coordinate reference services.
 struct ProjInfo_t {
-    std::string definition; ///< the CRS as WKT; empty if the layer has none
+    /// The CRS as text; empty if the layer has none. The bundled services read WKT and PROJJSON,
+    /// and the bundled store writes PROJJSON.
+    std::string definition;
 };
 
 /// Opens a file for reading. @param mode always "r". @return never null; the caller ends it with

@@ -23,7 +23,8 @@ TEST(BadArguments, OfReadersAreRefused) {
     };
     for (const auto& work : std::vector<std::function<void()>>{
              [&] { open("", 1); }, [&] { open("%s%n", 1); }, [&] { open(none, 1); },
-             [&] { open(good, 2); }, [&] { open(good, 1, 0); }, [&] { open(good, 1, 1, 3000); },
+             [&] { open(good, 2); }, [&] { open(good, 1, 0); }, [&] { open(good, 1, NaN); },
+             [&] { open(good, 1, -HUGE_VAL); }, [&] { open(good, 1, 1, 3000); },
              [&] { ZARGetNext(nullptr, -1); }, [&] { ZAROpen(good, "r+"); },
              [&] { ZAROpen(good, none); }, [&] { ZAROpen("", "r"); }, [&] { ZAROpen(none, "r"); }})
         EXPECT_TRUE(transcript.Refuses(work));

@@ -1,11 +1,14 @@
 #include "services/crs.h"
+#include "services/interpgrid3d.h"
 #include "services/vectorlayer.h"
 #include "tests/support/gdaltranscript.h"
 #include "tests/support/temporaryfolder.h"
 
 #include <gtest/gtest.h>
+#include <ogr_srs_api.h>
 #include <proj.h>
 
+#include <algorithm>
 #include <cmath>
 #include <functional>
 #include <memory>
@@ -22,29 +25,43 @@ using Points = std::vector<double>;
 constexpr cs::DatumType kOrtho = cs::VD_Orthometric;
 constexpr cs::DatumType kEllips = cs::VD_Ellipsoidal;
 
-/// A data folder of PROJ of three files, from now on, whatever the machine has.
+/// A data folder of PROJ of few files, from now on, whatever the machine has.
 struct DataFolder : kelm::test::TemporaryFolder {
     DataFolder() {
         using std::filesystem::create_symlink;
         const std::string geoid = proj_grid_info("egm96_15.gtx").filename;
+        const std::string database = proj_context_get_database_path(nullptr);
         create_symlink(geoid, GetPath("egm96_15.gtx"));
         create_symlink(geoid, GetPath("g1999u07.gtx")); // in place of the true one
-        create_symlink(proj_context_get_database_path(nullptr), GetPath("proj.db"));
+        const std::filesystem::path plan =
+            std::filesystem::path(geoid).replace_filename("BETA2007.gsb");
+        create_symlink(plan, GetPath("BETA2007.gsb"));
+        create_symlink(database, GetPath("proj.db"));
+        create_symlink(geoid, moHostFolder.GetPath("g1999u03.gtx"));
+        create_symlink(database, moHostFolder.GetPath("proj.db"));
         for (const char* pszName : {"PROJ_DATA", "PROJ_LIB", "PROJ_USER_WRITABLE_DIRECTORY"})
             setenv(pszName, GetPath("").c_str(), 1);
         proj_log_level(nullptr, PJ_LOG_NONE);
     }
+    kelm::test::TemporaryFolder moHostFolder; ///< another one, of which only GDAL is told
 };
 
 struct CRSTest : testing::Test {
-    static void SetUpTestSuite() { static const DataFolder oFolder; }
+    static const DataFolder& GetFolder() {
+        static const DataFolder oFolder;
+        return oFolder;
+    }
+    static void SetUpTestSuite() { GetFolder(); }
     kelm::test::GdalTranscript moTranscript;
 };
 
-/// @param text anything that PROJ takes for a CRS, and is handed on as WKT; or any other text
-CRSPtr ReadCRS(const std::string& text) {
+/// @param text anything that PROJ takes for a CRS, and is handed on in one of the two forms; or any
+/// other text
+CRSPtr ReadCRS(const std::string& text, bool bWkt = true) {
     const PjPtr po(proj_create(nullptr, text.c_str()), proj_destroy);
-    ProjInfo_t oInfo{po ? proj_as_wkt(nullptr, po.get(), PJ_WKT2_2019, nullptr) : text};
+    ProjInfo_t oInfo{!po    ? text
+                     : bWkt ? proj_as_wkt(nullptr, po.get(), PJ_WKT2_2019, nullptr)
+                            : proj_as_projjson(nullptr, po.get(), nullptr)};
     return CRSPtr(ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(&oInfo));
 }
 
@@ -54,8 +71,8 @@ CRSPtr MakeCompound(const CRSPtr& poMap, cs::DatumType eDatum) {
 
 /// @return the height of the first point
 double Convert(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
-               cs::DatumType eTo = kOrtho) {
-    const CRSPtr poMap = ReadCRS(crs);
+               cs::DatumType eTo = kOrtho, bool bWkt = true) {
+    const CRSPtr poMap = ReadCRS(crs, bWkt);
     const CRSPtr poFrom = MakeCompound(poMap, eFrom), poTo = MakeCompound(poMap, eTo);
     EXPECT_EQ(poMap->GetDimension() + 1, poFrom->GetDimension()) << crs;
     Points target(points.size() + 3);
@@ -65,6 +82,7 @@ double Convert(const std::string& crs, const Points& points, cs::DatumType eFrom
 }
 
 const std::string kFromUtm = "+proj=pipeline +step +inv +proj=utm +zone=16 +ellps=WGS84 ";
+const std::string kFromWebMercator = "+proj=pipeline +step +inv +proj=webmerc +ellps=WGS84 ";
 const std::string kFromDegrees = "+proj=pipeline +step +proj=unitconvert +xy_in=deg +xy_out=rad ";
 const struct {
     const char* mpszCRS;
@@ -83,7 +101,22 @@ const struct {
      "+ellps=GRS80 "},
     {"+proj=longlat +datum=WGS84 +vunits=ft +type=crs", -84.2, 36.3, kFromDegrees, 0.3048},
     {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +type=crs", 738669, 4045105,
-     kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart "}};
+     kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart "},
+    {"EPSG:3857", -9373101, 4344013, kFromWebMercator},
+    {"EPSG:3857+5773", 1e6, 7e6, kFromWebMercator},
+    // Of 17 ways to WGS 84 and back, most for one state, none moves a height or needs its grid.
+    {"EPSG:26916", 738669, 4e6, kFromUtm},
+    {"EPSG:4269", -86.8, 36.5, kFromDegrees}, // on the border of two states
+    // Of these two, one operation shifts positions alone and the other points in space.
+    {"EPSG:31467", 3513000, 5403000,
+     "+proj=pipeline +step +inv +proj=tmerc +lon_0=9 +x_0=3500000 +ellps=bessel +step "
+     "+proj=hgridshift +grids=BETA2007.gsb "},
+    {"EPSG:28992", 155000, 463000,
+     "+proj=pipeline +step +inv +proj=sterea +lat_0=52.1561605555556 +lon_0=5.38763888888889 "
+     "+k=0.9999079 +x_0=155000 +y_0=463000 +ellps=bessel +step +proj=cart +ellps=bessel +step "
+     "+proj=helmert +x=565.4171 +y=50.3319 +z=465.5524 +rx=0.398957388243134 "
+     "+ry=-0.343987817378283 +rz=1.87740163998045 +s=4.0725 +convention=coordinate_frame +step "
+     "+inv +proj=cart +ellps=WGS84 "}};
 
 const struct {
     const char* mpszCRS;
@@ -96,11 +129,11 @@ const struct {
     {"EPSG:32616+3855", {}},
     {"+proj=utm +zone=16 +datum=WGS84 +geoidgrids=no.gtx +type=crs", {}},
     {"+proj=utm +zone=16 +ellps=WGS84 +type=crs", {}},
-    // An operation without grid exists for all of North America; a better one for Tennessee.
-    {"EPSG:26916", {738669, 4e6, 300}},
     {"EPSG:32616+5703", {738669, 4745105, 250}}, // of two zones only the southern has its grid
     // The shifts for Czechia and Slovakia, equally accurate in plan, are 45 m apart in height.
     {"EPSG:5514", {-5e5, -1.26e6, 300, -7.5e5, -1.04e6, 300}},
+    {"EPSG:4131", {}},
+    {"EPSG:4301", {139, 36, 100}}, // a shift of 4 m for Korea, and none below 9 m for Japan
     {"EPSG:4326", {10, 50, 1, 10, 150, 2, 10, 151, 3}},
     {"EPSG:4326", {10, 50, 1, 11, 50, std::nan(""), 10, 50, -3.4e38}},
     {"EPSG:2193", {1748735, 5427916, 1, 1748735, 9e6, 2}}};
@@ -108,15 +141,81 @@ const struct {
 } // namespace
 
 TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
+    bool bWkt = false;
     for (const auto& [pszCRS, x, y, steps, dfUnit] : kConversions) {
+        bWkt = !bWkt;
         const std::string geoid = "+step +inv +proj=vgridshift +grids=egm96_15.gtx +multiplier=1";
         const PjPtr po(proj_create(nullptr, (steps + geoid).c_str()), proj_destroy);
         const PJ_COORD oSource = proj_coord(x, y, 300 * dfUnit, HUGE_VAL);
-        const double dfHeight = Convert(pszCRS, {x, y, 300});
-        EXPECT_NEAR(dfHeight, proj_trans(po.get(), PJ_FWD, oSource).xyz.z, 1e-6);
-        EXPECT_NEAR(Convert(pszCRS, {x, y, dfHeight}, kOrtho, kEllips), 300, 1e-5) << pszCRS;
+        const double dfHeight = Convert(pszCRS, {x, y, 300}, kEllips, kOrtho, bWkt);
+        EXPECT_NEAR(dfHeight, proj_trans(po.get(), PJ_FWD, oSource).xyz.z, 1e-6) << pszCRS;
+        EXPECT_NEAR(Convert(pszCRS, {x, y, dfHeight}, kOrtho, kEllips), 300, 2e-4) << pszCRS;
     }
-    EXPECT_NEAR(Convert("EPSG:32616+5703", {738669, 4045105, 300}), 330.5, 1.5) << "NAD83";
+    const double dfMetres = Convert("EPSG:32616+5703", {738669, 4045105, 300});
+    EXPECT_NEAR(dfMetres, 330.5, 1.5) << "NAD83";
+    EXPECT_NEAR(Convert("EPSG:32616+6360", {738669, 4045105, 300}), dfMetres / 1200 * 3937, 1e-6);
+}
+
+TEST_F(CRSTest, DataIsFoundWhereTheHostsGdalFindsIt) {
+    const std::string folder = GetFolder().moHostFolder.GetPath("");
+    const char* const paths[] = {folder.c_str(), nullptr};
+    OSRSetPROJSearchPaths(paths);
+    EXPECT_NEAR(Convert("EPSG:32616+5703", {738669, 4745105, 250}), 285, 0.5);
+    OSRSetPROJSearchPaths(nullptr);
+}
+
+/// Windows as the reader lays its grid over them, each in the worst place for it.
+const struct {
+    const char* mpszCRS;
+    double x, y, mdfWidth, mdfHeight, mdfMost;           ///< metres
+} kWindows[] = {{"EPSG:4326", -156.1, 18.9, 1, 1, 1e-3}, // Hawaii, where EGM96 is roughest
+                {"EPSG:4326", 10.3, 88.99, 1, 1, 1e-3},
+                {"EPSG:4326", -70.6, -24.9, 1, 1, 1e-3},
+                {"EPSG:4326", -160.3, 14.7, 10, 10, 1e-2},
+                {"EPSG:4326", -74.6, -34.9, 10, 10, 1e-2},
+                {"EPSG:32604", 750000, 2090000, 111000, 111000, 1e-3},
+                {"EPSG:32719", 3e5, 7.25e6, 111000, 111000, 1e-3},
+                {"EPSG:32719", 2e5, 6.5e6, 600000, 1110000, 1e-2},
+                {"EPSG:32616", 7e5, 4e6, 3000, 200, 1e-3}};
+
+TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
+    for (const auto& [pszCRS, x, y, dfWidth, dfHeight, dfMost] : kWindows) {
+        const CRSPtr poMap = ReadCRS(pszCRS), poFrom = MakeCompound(poMap, kEllips),
+                     poTo = MakeCompound(poMap, kOrtho);
+        const std::unique_ptr<ct::IMathTransform> poTransform(
+            utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
+        const auto Transform = [&](const Points& points) {
+            Points target(points.size());
+            const auto nPoints = static_cast<unsigned>(points.size() / 3);
+            poTransform->TransformPoints(points.data(), target.data(), nPoints);
+            return target;
+        };
+        InterpGrid3D oGrid;
+        oGrid.LayoutGrid(x, y, 10, x + dfWidth, y + dfHeight, 1500, 100, 100, 1490);
+        const unsigned nNodes = oGrid.GetNumGridPoints();
+        ASSERT_LE(nNodes, 150000U); // as long as a walk over a few thousand triangles
+        Points nodes(std::size_t{3} * nNodes), centres;
+        oGrid.GetGridPositions(nodes.data());
+        const Points heights = Transform(nodes);
+        for (std::size_t i = 0; i < nNodes; ++i)
+            oGrid.GetArray()[i] = static_cast<double>(static_cast<float>(heights[3 * i + 2]));
+        EXPECT_EQ(Points(nodes.end() - 3, nodes.end()), (Points{x + dfWidth, y + dfHeight, 1500}));
+        std::size_t nRow = 1;
+        while (nodes[3 * nRow + 1] == y)
+            ++nRow;
+        for (std::size_t i = 0; i + nRow + 1 < nNodes / 2; ++i)
+            if (i % nRow + 1 < nRow)
+                for (std::size_t k = 0; k < 3; ++k)
+                    centres.push_back(
+                        k == 2 ? 755 : (nodes[3 * i + k] + nodes[3 * (i + nRow + 1) + k]) / 2);
+        const Points expected = Transform(centres);
+        for (std::size_t i = 0; i < centres.size(); i += 3) {
+            double dfFound = 0;
+            oGrid.GetVal(centres[i], centres[i + 1], centres[i + 2], &dfFound);
+            ASSERT_NEAR(dfFound, expected[i + 2], dfMost) << pszCRS << ' ' << centres[i];
+        }
+        moTranscript.Take();
+    }
 }
 
 TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {

@@ -31,9 +31,9 @@ TEST(InterpGrid3D, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOu
     EXPECT_TRUE(std::isnan(GetValue(oGrid, {}))) << "no nodes yet";
     const double x = 738669.5, y = 4045105.25, z = 300.0;
     const std::pair<Box, unsigned> cases[] = {
-        {{x, y, z, x + 250, y + 100, z + 250, 100, 100, 250}, 4 * 2 * 2},
-        {{x, y, z, x + 33.33, y + 0.55, z + 0.25, 0.1, 0.1, 0.1}, 335 * 7 * 4},
-        {{x, y, z, x, y, z, 100, 100, 1}, 2 * 2 * 2}};
+        {{x, y, z, x + 250, y + 100, z + 250, 100, 100, 250}, 141 * 141 * 2},
+        {{x, y, z, x + 20, y + 333, z + 0.25, 0.1, 0.1, 0.1}, 213 * 269 * 4},
+        {{x, y, z, x, y + 1, z, 100, 100, 1}, 141}};
     std::mt19937 oRandom(4711);
     std::uniform_real_distribution<double> oPart(-0.5, 1.5);
     for (const auto& [oBox, nNodes] : cases) {
@@ -44,11 +44,13 @@ TEST(InterpGrid3D, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOu
         std::transform(nodes.begin(), nodes.end(), oGrid.GetArray(), GetField);
         for (unsigned i = 0; i < nNodes; ++i)
             ASSERT_EQ(GetValue(oGrid, nodes[i]), oGrid.GetArray()[i]);
+        const Triple end{oBox[3], oBox[4], oBox[5]};
+        ASSERT_EQ(nodes.back(), end);
         for (unsigned i = 0; i < 2000; ++i) {
             Triple p{}, inside{};
             for (unsigned k = 0; k < 3; ++k) {
                 const double dfEnd = nodes.back()[k], dfFar = i < 50 ? HUGE_VAL : 1.0;
-                p[k] = oBox[k] + dfFar * oPart(oRandom) * (dfEnd - oBox[k]);
+                p[k] = oBox[k] + dfFar * oPart(oRandom) * (dfEnd - oBox[k] + 1e-9);
                 inside[k] = std::clamp(p[k], oBox[k], dfEnd);
             }
             ASSERT_NEAR(GetValue(oGrid, p), GetField(inside), 1e-8);
@@ -66,14 +68,26 @@ TEST(InterpGrid3D, RefusesWhatItCannotLayOutAndKeepsTheOldGrid) {
     for (const Box& oBox :
          {Box{0, 0, 3.4e38, 1, 1, -3.4e38, 1, 1, 1}, // of no finite height
           Box{0, std::nan(""), 0, 1, 1, 1, 1, 1, 1}, Box{-HUGE_VAL, 0, 0, 1, 1, 1, 1, 1, 1},
-          Box{0, 0, 0, 1, 1, 1, 0, 1, 1}, Box{0, 0, 0, 1e9, 1, 1, 0.5, 1, 1},
-          Box{1e300, 0, 0, 1e300, 1, 1, 1, 1, 1},
-          // 26755 x 26755 x 2 nodes of three values: 2^32 and 12854 more.
-          Box{0, 0, 0, 26754, 26754, 1, 1, 1, 1}}) {
+          Box{0, 0, 0, 1, 1, 1, 0, 1, 1}, Box{0, 0, 0, 1, 1, 1e9, 1, 1, 0.5},
+          // 141 x 141 x 72012 nodes of three values: 2^32 and 44420 more.
+          Box{0, 0, 0, 1, 1, 72011, 1, 1, 1}}) {
         const auto Layout = [&](auto... v) { oGrid.LayoutGrid(v...); };
         EXPECT_TRUE(oTranscript.Refuses([&] { std::apply(Layout, oBox); }));
     }
-    EXPECT_EQ(oGrid.GetNumGridPoints(), 8U);
+    EXPECT_EQ(oGrid.GetNumGridPoints(), 141U * 141U * 2U);
+}
+
+TEST(InterpGrid3D, RestoresTheKinksOfAModelThatIsLinearBetweenItsOwnNodes) {
+    const auto GetHeight = [](const Triple& p) {
+        return std::abs(p[0] - 7.1) - 2 * std::abs(p[1] - 3.3) + 0.1 * p[2];
+    };
+    InterpGrid3D oGrid;
+    oGrid.LayoutGrid(0, 0, 0, 10, 10, 9, 100, 100, 9);
+    std::vector<Triple> nodes(oGrid.GetNumGridPoints());
+    oGrid.GetGridPositions(nodes[0].data());
+    std::transform(nodes.begin(), nodes.end(), oGrid.GetArray(), GetHeight);
+    for (Triple p{0, 0, 5}; p[0] < 10; p[0] += 0.0037, p[1] += 0.0011)
+        ASSERT_NEAR(GetValue(oGrid, p), GetHeight(p), 1e-12) << p[0];
 }
 
 } // namespace

@@ -86,7 +86,7 @@ TEST_F(VectorLayer, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
         ASSERT_EQ(oRings.size(), 400U) << path;
         for (std::size_t n = 0; n < 400; ++n)
             EXPECT_EQ(oRings[n], MakeRing(double(n), 0, double(n))) << path;
-        EXPECT_EQ(GetCrs(Read(path)).find("PROJCRS[\"WGS 84 / UTM zone 32N\""), 0U) << path;
+        EXPECT_NE(GetCrs(Read(path)).find("\"WGS 84 / UTM zone 32N\""), std::string::npos) << path;
         EXPECT_EQ(moTranscript.moLines, "");
         const auto nSize = fs::is_directory(path) ? 0 : fs::file_size(path);
         for (unsigned nCut = nSize > 0 ? 25 : 0; nCut-- > 0;) {

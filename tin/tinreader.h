@@ -124,8 +124,8 @@ class KELM_TIN_EXPORT TinReader {
     /// Sends a grid over the window through the transform and interpolates each vertex in it.
     bool HeightConvertManyPoints(const aabb_t<point2_t<float>>* poWindow, point3_t<float>* poPoints,
                                  unsigned int nCount) const;
-    /// Lays out a new grid over the window, its nodes 100 map units apart, and fills it with
-    /// heights in the output datum.
+    /// Lays out a new grid over the window, of a spacing of 100 map units where the grid does not
+    /// choose another, and fills it with heights in the output datum.
     void BuildInterpGridForWindow(const aabb_t<point2_t<float>>* poWindow, float fZMin, float fZMax,
                                   InterpGrid3D& oGrid) const;
 

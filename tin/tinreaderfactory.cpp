@@ -6,6 +6,7 @@
 #include "tin/load/shapecount.h"
 #include "tin/tinreader.h"
 
+#include <cmath>
 #include <exception>
 #include <memory>
 
@@ -33,6 +34,17 @@ _iobuf* Open(const char* pszFilename) {
         FormatString("The format of file %s is not supported by ZAR", pszFilename));
 }
 
+/// A height of such a factor would be none, and no later step could tell.
+void TestFinite(const char* parameter, double value) {
+    if (!std::isfinite(value))
+        throw ParameterException(parameter, ParameterException::PT_Invalid,
+                                 FormatString("%g", value), "a finite number",
+                                 FormatString("The elevation factor's %s must be a finite number, "
+                                              "but is %g",
+                                              parameter, value),
+                                 "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__);
+}
+
 } // namespace
 
 TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int nLayer,
@@ -58,6 +70,8 @@ TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int 
         THROW_DATA_EXCEPTION(
             FormatString("The provided vector layer %d in the input file %s is empty.", layerNumber,
                          pszFilename));
+    TestFinite("dfOffset", dfOffset);
+    TestFinite("dfScale", dfScale);
     auto reader = std::make_unique<TinReader>(layer, dfOffset, dfScale, eSourceDatum);
     // The reader closes the file by way of its layer.
     static_cast<void>(file.release());

@@ -18,9 +18,9 @@ class KELM_TIN_EXPORT TinReaderFactory {
     /// (h + dfOffset) * dfScale; both finite
     /// @param eSourceDatum vertical datum of the stored heights
     /// @return a new reader, never null; the caller deletes it
-    /// @throw kelm::DataException if the file cannot be opened, or the layer does not exist, is
-    /// empty or holds no polygons; what the constructor of TinReader throws. The file is closed
-    /// then
+    /// @throw kelm::ParameterException if offset or scale is not finite; kelm::DataException if the
+    /// file cannot be opened, or the layer does not exist, is empty or holds no polygons; what the
+    /// constructor of TinReader throws. The file is closed then
     static TinReader* CreateTinReader(const char* pszFilename, const int nLayer,
                                       const double dfOffset, const double dfScale,
                                       const ogc::cs::DatumType eSourceDatum);

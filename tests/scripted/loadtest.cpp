@@ -65,22 +65,6 @@ TEST_F(ReaderTest, AWindowLoadsTheSameTrianglesWithABaseOfTheirOwn) {
     }
 }
 
-TEST_F(ReaderTest, HeightsOfALargeSurfaceInDegreesAreInterpolatedWithAWarning) {
-    for (const ZARVertex& out : {ZARVertex{},
-                                 {360.1, 0, 0},
-                                 {-360.1, 0, 0},
-                                 {0, 90.1, 0},
-                                 {0, -90.1, 0}}) { // only the first is in range
-        script.shapes = {Close({{-360, -90, 1}, {360, 90, 2}, out})};
-        for (int i = 0; i < 500; ++i)
-            script.shapes.push_back(Close({{-360, 90, 1}, {i * 0.7, i * 0.1, 2}, {9, i * 0.1, 3}}));
-        const Reader reader = Open();
-        reader->SetOutputVerticalDatum(DatumType(2001));
-        EXPECT_GT(Load(*reader)->GetVertexCount(), 999U);
-        transcript.moLines += "next\n";
-    }
-}
-
 TEST_F(ReaderTest, OfEachRunOfRepeatsTheFirstVertexGivesTheHeight) {
     script.shapes = {Close({{0, 0, 0}, {0, 9e-10, -1}, {0, 18e-10, -1}, {9, 0, 0}, {0, 9, 9}})};
     const Surface surface = Load(*Open());

@@ -36,7 +36,7 @@ bool Census::Count(const double* position) {
 /// If there is only one operation, the area of the map CRS is enough. That of EPSG:3035 includes
 /// the Canaries; that of its operation, which is the one of ETRS89, does not.
 bool Census::Holds(std::size_t operation, const double* position) const {
-    return moOperations[operation].moArea.IsPointInside(position[0], position[1]) ||
+    return moOperations[operation].IsPointInside(position[0], position[1]) ||
            (moOperations.size() == 1 && moMapArea.IsPointInside(position[0], position[1]));
 }
 

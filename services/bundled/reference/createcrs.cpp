@@ -39,7 +39,7 @@ int GetAxisCount(ProjSession& session, const PJ* crs) {
     return system ? proj_cs_get_axis_count(session.Get(), system.get()) : 0;
 }
 
-/// @return the vertical part of a compound CRS as WKT 2, or empty
+/// @return the vertical part of a compound CRS as PROJJSON, or empty
 std::string FindVertical(ProjSession& session, const PJ* crs) {
     if (proj_get_type(crs) != PJ_TYPE_COMPOUND_CRS)
         return {};
@@ -48,7 +48,7 @@ std::string FindVertical(ProjSession& session, const PJ* crs) {
         if (!part)
             return {};
         if (GetCoreType(session, part.get()) == PJ_TYPE_VERTICAL_CRS)
-            return session.GetWkt(part.get());
+            return session.GetText(part.get());
     }
 }
 
@@ -73,10 +73,10 @@ CRSText ReduceCRS(ProjSession& session, const PJ* crs, const PJ* horizontal) {
     text.mbLocal = false;
     text.moName = proj_get_name(crs);
     const PjPtr flat(proj_crs_demote_to_2D(session.Get(), nullptr, horizontal));
-    text.moDefinition = session.GetWkt(flat.get());
+    text.moDefinition = session.GetText(flat.get());
     text.moVertical = FindVertical(session, crs);
     if (GetAxisCount(session, horizontal) == 3)
-        text.moEllipsoidal = session.GetWkt(horizontal);
+        text.moEllipsoidal = session.GetText(horizontal);
     return text;
 }
 
@@ -84,7 +84,7 @@ CRSText ReduceCRS(ProjSession& session, const PJ* crs, const PJ* horizontal) {
 CRSText DescribeSite(ProjSession& session, const PJ* crs, const PJ* horizontal) {
     CRSText text;
     text.moName = proj_get_name(crs);
-    text.moDefinition = session.GetWkt(horizontal);
+    text.moDefinition = session.GetText(horizontal);
     return text;
 }
 
@@ -107,20 +107,20 @@ CRSText ReadText(ProjSession& session, const PJ* crs) {
                         SOURCE, __PRETTY_FUNCTION__, __LINE__);
 }
 
-/// @return the CRS with ellipsoidal heights as WKT 2
+/// @return the CRS with ellipsoidal heights as PROJJSON
 std::string CreateEllipsoidal(const CRSText& text) {
     if (!text.moEllipsoidal.empty())
         return text.moEllipsoidal;
     ProjSession session;
-    const PjPtr flat = session.CreateFromWkt(text.moDefinition);
+    const PjPtr flat = session.CreateFromText(text.moDefinition);
     const PjPtr spatial(proj_crs_promote_to_3D(session.Get(), nullptr, flat.get()));
-    return session.GetWkt(spatial.get());
+    return session.GetText(spatial.get());
 }
 
 /// @return the vertical CRS that the layer names, or the default one
 PjPtr CreateVertical(ProjSession& session, const CRSText& text) {
     if (!text.moVertical.empty())
-        return session.CreateFromWkt(text.moVertical);
+        return session.CreateFromText(text.moVertical);
     PjPtr vertical(proj_create_from_database(session.Get(), "EPSG", DEFAULT_VERTICAL_CODE,
                                              PJ_CATEGORY_CRS, 0, nullptr));
     if (!vertical)
@@ -130,19 +130,19 @@ PjPtr CreateVertical(ProjSession& session, const CRSText& text) {
     return vertical;
 }
 
-/// @return the CRS with heights above the geoid as WKT 2
+/// @return the CRS with heights above the geoid as PROJJSON
 std::string CreateOrthometric(const CRSText& text) {
     ProjSession session;
-    const PjPtr flat = session.CreateFromWkt(text.moDefinition);
+    const PjPtr flat = session.CreateFromText(text.moDefinition);
     const PjPtr vertical = CreateVertical(session, text);
     const std::string name =
         std::string(proj_get_name(flat.get())) + " + " + proj_get_name(vertical.get());
     const PjPtr compound(
         proj_create_compound_crs(session.Get(), name.c_str(), flat.get(), vertical.get()));
-    return session.GetWkt(compound.get());
+    return session.GetText(compound.get());
 }
 
-/// @return the compound as WKT 2
+/// @return the compound as PROJJSON
 std::string CreateDefinition(const CRSText& text, cs::DatumType datum) {
     if (datum == cs::VD_Ellipsoidal)
         return CreateEllipsoidal(text);
@@ -160,7 +160,7 @@ std::unique_ptr<ProjCRS> ReadCRS(const std::string& definition) {
     if (definition.empty())
         return std::make_unique<ProjCRS>(CRSText{});
     ProjSession session;
-    const PjPtr crs = session.CreateFromWkt(definition);
+    const PjPtr crs = session.CreateFromText(definition);
     return std::make_unique<ProjCRS>(ReadText(session, crs.get()));
 }
 

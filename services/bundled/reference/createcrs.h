@@ -7,7 +7,7 @@
 
 namespace kelm::ogc {
 
-/// Reads a layer's CRS. @param definition WKT, or empty for a local CRS. @return a map CRS
+/// Reads a layer's CRS. @param definition WKT or PROJJSON; empty for a local CRS. @return a map CRS
 /// @throw kelm::DataException if the text is no CRS or has no map coordinates
 std::unique_ptr<ProjCRS> ReadCRS(const std::string& definition);
 

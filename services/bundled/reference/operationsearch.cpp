@@ -1,5 +1,6 @@
 #include "services/bundled/reference/operationsearch.h"
 
+#include "services/bundled/reference/heightmeaning.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
@@ -37,18 +38,27 @@ bool IsBetter(const ProjOperation& a, const ProjOperation& b) {
         return a.mdfAccuracy < b.mdfAccuracy;
     if (a.IsUsable() != b.IsUsable())
         return a.IsUsable();
-    return a.moArea.GetSize() < b.moArea.GetSize();
+    return a.GetSize() < b.GetSize();
 }
 
-/// @return the operations from the best on, without those that a better one covers
+/// Takes an operation over into one of the same steps. @return false if there is none
+bool MergeSame(std::vector<ProjOperation>& kept, const ProjOperation& operation) {
+    const auto same = std::find_if(kept.begin(), kept.end(), [&](const ProjOperation& other) {
+        return !operation.moSteps.empty() && other.moSteps == operation.moSteps;
+    });
+    if (same != kept.end())
+        same->Merge(operation);
+    return same != kept.end();
+}
+
+/// @return the operations from the best on, without those that a better one covers. Operations of
+/// the same steps are one: PROJ's figures of accuracy then differ by a shift that is taken back
 std::vector<ProjOperation> RankOperations(std::vector<ProjOperation> operations) {
     std::stable_sort(operations.begin(), operations.end(), IsBetter);
     std::vector<ProjOperation> kept;
     for (ProjOperation& operation : operations) {
-        const auto Covers = [&](const ProjOperation& better) {
-            return better.moArea.IsAreaInside(operation.moArea);
-        };
-        if (std::none_of(kept.begin(), kept.end(), Covers))
+        const auto covers = [&](const ProjOperation& better) { return better.Covers(operation); };
+        if (!MergeSame(kept, operation) && std::none_of(kept.begin(), kept.end(), covers))
             kept.push_back(std::move(operation));
     }
     return kept;
@@ -57,12 +67,11 @@ std::vector<ProjOperation> RankOperations(std::vector<ProjOperation> operations)
 /// @return all operations that are not mere guesses. A grid file that nobody distributes counts
 /// only if there is no operation without such a file
 std::vector<ProjOperation> FindOperations(ProjSession& session, const PJ* source, const PJ* target,
-                                          bool heightsDiffer) {
+                                          const OperationNeeds& needs) {
     for (const PROJ_GRID_AVAILABILITY_USE grids :
          {PROJ_GRID_AVAILABILITY_KNOWN_AVAILABLE, PROJ_GRID_AVAILABILITY_IGNORED}) {
         const PjListPtr list = SearchOperations(session, source, target, grids, false);
-        std::vector<ProjOperation> operations =
-            DescribeOperations(session, list.get(), heightsDiffer);
+        std::vector<ProjOperation> operations = DescribeOperations(session, list.get(), needs);
         if (!operations.empty())
             return operations;
     }
@@ -76,8 +85,9 @@ std::string GetMissingText(const std::vector<ProjOperation>& operations) {
                                     best.moName.c_str(), best.GetAccuracyText().c_str(),
                                     best.moAreaName.c_str(), best.moMissingGrids.c_str());
     for (std::size_t i = 1; i < operations.size(); ++i)
-        text += FormatString("; in %s: %s", operations[i].moAreaName.c_str(),
-                             operations[i].moMissingGrids.c_str());
+        if (!operations[i].IsUsable())
+            text += FormatString("; in %s: %s", operations[i].moAreaName.c_str(),
+                                 operations[i].moMissingGrids.c_str());
     return text;
 }
 
@@ -87,7 +97,7 @@ struct Side {
     bool mbEllipsoidal;
 
     Side(ProjSession& session, const ProjCRS& crs)
-        : mpo(session.CreateFromWkt(crs.GetText().moDefinition)),
+        : mpo(session.CreateFromText(crs.GetText().moDefinition)),
           mbEllipsoidal(crs.GetDatum() == cs::VD_Ellipsoidal) {}
     /// @return the name, with the kind of heights where PROJ's name leaves it out
     std::string GetText() const {
@@ -96,17 +106,24 @@ struct Side {
     }
 };
 
-/// @throw kelm::DataException unless an operation can be used. @param messages what PROJ has said
+/// @return why no operation serves. @param messages what PROJ has said
+std::string GetReason(const std::vector<ProjOperation>& operations, const std::string& messages) {
+    if (operations.empty())
+        return "PROJ has no operation that is more than a guess" + messages;
+    return operations.front().IsFine() ? GetMissingText(operations)
+                                       : operations.front().GetCoarseText();
+}
+
+/// @throw kelm::DataException unless an operation serves. @param messages what PROJ has said
 void TestUsable(const std::vector<ProjOperation>& operations, const Side& source,
                 const Side& target, const std::string& messages) {
-    if (std::any_of(operations.begin(), operations.end(),
-                    [](const ProjOperation& operation) { return operation.IsUsable(); }))
+    if (std::any_of(operations.begin(), operations.end(), [](const ProjOperation& operation) {
+            return operation.IsUsable() && operation.IsFine();
+        }))
         return;
-    const std::string reason = operations.empty()
-                                   ? "PROJ has no operation that is more than a guess" + messages
-                                   : GetMissingText(operations);
     throw DataException(FormatString("No conversion from %s to %s: %s", source.GetText().c_str(),
-                                     target.GetText().c_str(), reason.c_str()),
+                                     target.GetText().c_str(),
+                                     GetReason(operations, messages).c_str()),
                         SOURCE, __PRETTY_FUNCTION__, __LINE__);
 }
 
@@ -128,8 +145,10 @@ std::vector<ProjOperation> ListOperations(ProjSession& session, const ProjCRS& s
                                           const ProjCRS& target) {
     const Side from(session, source);
     const Side to(session, target);
-    std::vector<ProjOperation> operations = RankOperations(FindOperations(
-        session, from.mpo.get(), to.mpo.get(), from.mbEllipsoidal != to.mbEllipsoidal));
+    const OperationNeeds needs{from.mbEllipsoidal != to.mbEllipsoidal,
+                               IsGeocentricEllipsoid(session, from.mpo.get())};
+    std::vector<ProjOperation> operations =
+        RankOperations(FindOperations(session, from.mpo.get(), to.mpo.get(), needs));
     TestUsable(operations, from, to, session.TakeMessages());
     return operations;
 }

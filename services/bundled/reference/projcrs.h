@@ -7,7 +7,7 @@
 
 namespace kelm::ogc {
 
-/// What is known of a layer's CRS, as WKT 2.
+/// What is known of a layer's CRS, as PROJJSON.
 struct CRSText {
     std::string moName;        ///< for messages
     std::string moDefinition;  ///< two axes; of a local CRS the whole CRS, or empty
@@ -22,7 +22,7 @@ class ProjCRS final : public cs::ICRS {
   public:
     /// A map CRS.
     explicit ProjCRS(CRSText text);
-    /// A compound. @param definition the compound as WKT 2; ignored for a local CRS
+    /// A compound. @param definition the compound as PROJJSON; ignored for a local CRS
     ProjCRS(const ProjCRS& map, cs::DatumType datum, std::string definition);
     ProjCRS(const ProjCRS&) = delete;
     ProjCRS& operator=(const ProjCRS&) = delete;

@@ -2,6 +2,7 @@
 
 #include "services/bundled/reference/areacensus.h"
 #include "services/bundled/reference/failurecount.h"
+#include "services/bundled/reference/heightmeaning.h"
 #include "services/bundled/reference/operationsearch.h"
 #include "services/reporting.h"
 
@@ -51,8 +52,10 @@ FailureCount CountFailures(const double* source, const double* target, unsigned 
     return error != 0 && failed.mnFailed == 0 ? FailAll(source, count) : failed;
 }
 
-/// @throw kelm::DataException if the operation lacks a grid file
-void TestInstalled(const ProjOperation& operation, const double* source, unsigned int count) {
+/// @throw kelm::DataException if the operation lacks a grid file or is too coarse
+void TestServes(const ProjOperation& operation, const double* source, unsigned int count) {
+    if (!operation.IsFine())
+        FailAll(source, count).Test(count, operation.GetCoarseText());
     if (!operation.IsUsable())
         FailAll(source, count)
             .Test(count, FormatString("'%s' (%s) needs %s, which is not installed",
@@ -75,17 +78,22 @@ int TransformTriples(PJ* operation, double* triples, std::size_t count) {
 
 ProjTransform::ProjTransform(const ProjCRS& source, const ProjCRS& target)
     : moOperations(ListOperations(moSession, source, target)) {
-    Report();
-    moMapArea = moOperations.front().moArea;
-    if (moMapArea.IsWorld())
+    ReportOperations();
+    const PjPtr map = moSession.CreateFromText(source.GetMap().GetText().moDefinition);
+    ReportUnits(moSession, source, target);
+    if (source.GetDatum() == cs::VD_Ellipsoidal || target.GetDatum() == cs::VD_Ellipsoidal)
+        moEllipsoid = FindOldEllipsoid(moSession, map.get());
+    moMapName = source.GetMap().GetText().moName;
+    moMapArea = moOperations.front().moAreas.front();
+    const auto& areas = moOperations.front().moAreas;
+    if (std::any_of(areas.begin(), areas.end(), [](const AreaOfUse& a) { return a.IsWorld(); }))
         return;
-    const PjPtr map = moSession.CreateFromWkt(source.GetMap().GetText().moDefinition);
     mpoToDegrees = CreateToDegrees(moSession, map.get());
     const char* name = nullptr;
     ReadArea(moSession, map.get(), moMapArea, name);
 }
 
-void ProjTransform::Report() const {
+void ProjTransform::ReportOperations() const {
     for (const ProjOperation& operation : moOperations)
         tellus::Report::AddInfo(FormatString(
             "Heights in %s: '%s', %s; grids: %s%s%s", operation.moAreaName.c_str(),
@@ -96,8 +104,14 @@ void ProjTransform::Report() const {
 
 bool ProjTransform::TransformPoints(const double* source, double* target, unsigned int nCount) {
     TestSource(source, nCount);
-    if (nCount > 0)
-        Apply(ChooseOperation(source, nCount), source, target, nCount);
+    if (nCount == 0)
+        return true;
+    const ProjOperation& operation = ChooseOperation(source, nCount);
+    tellus::Report::AddInfo(FormatString("%u heights by '%s', %s", nCount, operation.moName.c_str(),
+                                         operation.GetAccuracyText().c_str()));
+    if (!moEllipsoid.empty())
+        WarnOfEllipsoid(moMapName, moEllipsoid, operation);
+    Apply(operation, source, target, nCount);
     return true;
 }
 
@@ -116,9 +130,7 @@ const ProjOperation& ProjTransform::ChooseOperation(const double* source, unsign
     if (!mpoToDegrees)
         return moOperations.front();
     const ProjOperation& chosen = moOperations[FindCommon(source, count)];
-    TestInstalled(chosen, source, count);
-    if (moOperations.size() > 1)
-        tellus::Report::AddInfo(FormatString("%u heights by '%s'", count, chosen.moName.c_str()));
+    TestServes(chosen, source, count);
     return chosen;
 }
 

@@ -21,12 +21,12 @@ std::string WriteText(const OGRSpatialReference& crs, const std::string& subject
                       const GdalCall& call) {
     if (crs.IsEmpty() || services::IsUndefinedCRS(crs.GetName()))
         return {};
-    const char* const options[] = {"FORMAT=WKT2_2019", "MULTILINE=NO", nullptr};
+    const char* const options[] = {"MULTILINE=NO", nullptr};
     char* raw = nullptr;
-    const OGRErr error = crs.exportToWkt(&raw, options);
+    const OGRErr error = crs.exportToPROJJSON(&raw, options);
     const std::unique_ptr<char, decltype(&CPLFree)> text(raw, CPLFree);
     if (error != OGRERR_NONE || !raw || !*raw)
-        throw DataException(FormatString("The CRS of the %s cannot be written as WKT: %s",
+        throw DataException(FormatString("The CRS of the %s cannot be written as PROJJSON: %s",
                                          subject.c_str(), call.GetFailures().c_str()),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
     return raw;

@@ -20,9 +20,9 @@ struct ProjRelease {
 using PjPtr = std::unique_ptr<PJ, ProjRelease>;
 using PjListPtr = std::unique_ptr<PJ_OBJ_LIST, ProjRelease>;
 
-/// A PROJ context of its own, without network access. It keeps PROJ's messages, which would go to
-/// the standard error stream otherwise. Used by one thread at a time. Objects made with it must not
-/// outlive it.
+/// A PROJ context of its own, without network access. It finds PROJ's data where the host's GDAL
+/// does. It keeps PROJ's messages, which would go to the standard error stream otherwise. Used by
+/// one thread at a time. Objects made with it must not outlive it.
 class ProjSession {
   public:
     /// @throw std::bad_alloc
@@ -31,11 +31,12 @@ class ProjSession {
     ProjSession& operator=(const ProjSession&) = delete;
 
     PJ_CONTEXT* Get() const noexcept { return mpoContext.get(); }
+    /// @param definition WKT or PROJJSON, and nothing else that PROJ would take
     /// @return a CRS. @throw kelm::DataException if PROJ cannot read the text, naming it
-    PjPtr CreateFromWkt(const std::string& definition);
-    /// @return the object as WKT 2 on one line. @throw kelm::DataException if there is none, or
+    PjPtr CreateFromText(const std::string& definition);
+    /// @return the object as PROJJSON on one line. @throw kelm::DataException if there is none, or
     /// PROJ cannot write it
-    std::string GetWkt(const PJ* object);
+    std::string GetText(const PJ* object);
     /// @return what PROJ has said since the last call, in brackets with a leading space; or empty
     std::string TakeMessages();
 
