@@ -64,7 +64,7 @@ class DocumentReader final : public XmlHandler {
 
   private:
     Place GetPlace() const { return moPlaces.empty() ? Place::Document : moPlaces.back(); }
-    bool Enter(Place place, std::string_view name, const Attributes& attributes);
+    bool Enter(Place place, const Attributes& attributes);
     bool EnterDefinition(const Attributes& attributes);
     void EnterRecord(const char* attribute);
     void EnterCrs(const Attributes& attributes);
@@ -98,7 +98,7 @@ void DocumentReader::Start(std::string_view name, const Attributes& attributes) 
     if (mnSkipped == 0)
         for (const auto& row : PLACES)
             if (row.meParent == GetPlace() && row.moName == name &&
-                Enter(row.mePlace, name, attributes)) {
+                Enter(row.mePlace, attributes)) {
                 moPlaces.push_back(row.mePlace);
                 return;
             }
@@ -129,7 +129,7 @@ void DocumentReader::AddText(std::string_view piece) {
 }
 
 /// @return false if the element is to be skipped
-bool DocumentReader::Enter(Place place, std::string_view name, const Attributes& attributes) {
+bool DocumentReader::Enter(Place place, const Attributes& attributes) {
     if (place == Place::Point)
         EnterRecord(attributes.Find("id"));
     else if (place == Place::Face)
