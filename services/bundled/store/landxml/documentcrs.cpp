@@ -7,6 +7,7 @@
 #include <cpl_conv.h>
 #include <ogr_spatialref.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstdlib>
 #include <memory>
@@ -54,17 +55,33 @@ std::string ExportWkt(const OGRSpatialReference& crs) {
     return error == OGRERR_NONE && raw ? raw : "";
 }
 
-/// @return true if PROJ knows a CRS of exactly this name
-bool ImportName(OGRSpatialReference& crs, const std::string& name) {
-    // The name may be anything; as a path or an address it must not be followed.
-    const char* const options[] = {"ALLOW_NETWORK_ACCESS=NO", "ALLOW_FILE_ACCESS=NO", nullptr};
-    return !name.empty() && crs.SetFromUserInput(name.c_str(), options) == OGRERR_NONE &&
-           crs.GetName() && EQUAL(crs.GetName(), name.c_str());
+/// What a CRS is looked for by its name.
+constexpr OSRCRSType MAP_TYPES[] = {OSR_CRS_TYPE_PROJECTED, OSR_CRS_TYPE_GEOGRAPHIC_2D,
+                                    OSR_CRS_TYPE_COMPOUND};
+constexpr OSRCRSType VERTICAL_TYPES[] = {OSR_CRS_TYPE_VERTICAL};
+
+/// @return the number that EPSG gives a CRS of exactly this name, in any case of letters; else 0
+template <std::size_t N>
+int FindCode(const std::string& name, const OSRCRSType (&types)[N]) {
+    int count = 0;
+    const std::unique_ptr<OSRCRSInfo*, decltype(&OSRDestroyCRSInfoList)> list(
+        OSRGetCRSInfoListFromDatabase("EPSG", nullptr, &count), OSRDestroyCRSInfoList);
+    for (int n = 0; n < count && !name.empty(); ++n) {
+        const OSRCRSInfo& info = *list.get()[n];
+        if (!info.bDeprecated && EQUAL(info.pszName, name.c_str()) &&
+            std::find(types, types + N, info.eType) != types + N)
+            return std::atoi(info.pszCode);
+    }
+    return 0;
+}
+
+bool ImportNumber(OGRSpatialReference& crs, int number) {
+    return number > 0 && crs.importFromEPSG(number) == OGRERR_NONE;
 }
 
 bool ImportCode(OGRSpatialReference& crs, const std::string& code) {
     const int number = std::atoi(code.c_str() + (STARTS_WITH_CI(code.c_str(), "EPSG:") ? 5 : 0));
-    return number > 0 && crs.importFromEPSG(number) == OGRERR_NONE;
+    return ImportNumber(crs, number);
 }
 
 /// Builds the CRS of one document.
@@ -102,6 +119,8 @@ std::string CrsBuilder::Build(Warnings& warnings) {
         return {};
     }
     TakeApart();
+    if (!moHorizontal.IsProjected() && !moHorizontal.IsGeographic())
+        return ExportWkt(moHorizontal);
     if (moVertical.IsEmpty() && !FindVertical() && !IsSame(mpoUnit->mdfMetres, 1.0))
         static_cast<void>(moVertical.importFromEPSG(DEFAULT_VERTICAL_CODE));
     SetHorizontalUnit();
@@ -114,7 +133,7 @@ bool CrsBuilder::FindHorizontal() {
     if (ImportCode(moHorizontal, record.moCode) ||
         (!record.moWkt.empty() &&
          moHorizontal.importFromWkt(record.moWkt.c_str()) == OGRERR_NONE) ||
-        ImportName(moHorizontal, record.moName))
+        ImportNumber(moHorizontal, FindCode(record.moName, MAP_TYPES)))
         return true;
     if (!record.moCode.empty() || !record.moWkt.empty() || !record.moName.empty())
         Warn(FormatString("its CRS is not known and not used (epsgCode '%s', name '%s')",
@@ -140,9 +159,8 @@ bool CrsBuilder::FindVertical() {
     if (name.empty())
         return false;
     for (const std::string& tried : {name, name + " height"})
-        if (ImportName(moVertical, tried) && moVertical.IsVertical() && !moVertical.IsCompound())
+        if (ImportNumber(moVertical, FindCode(tried, VERTICAL_TYPES)))
             return true;
-    moVertical.Clear();
     Warn(FormatString("its vertical datum '%s' is not known and not used", name.c_str()));
     return false;
 }

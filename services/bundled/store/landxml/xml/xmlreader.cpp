@@ -13,7 +13,7 @@ namespace {
 
 constexpr int PIECE = 1 << 18;
 /// A tag or comment is read again with each piece until its end is there.
-constexpr std::int64_t LONGEST_TOKEN = 1 << 24;
+constexpr std::int64_t LONGEST_TOKEN = 1 << 22;
 /// A root element begins within so many bytes, behind a comment or two.
 constexpr std::int64_t LONGEST_PROLOG = 1 << 16;
 
@@ -66,6 +66,21 @@ int XMLCALL FindEncoding(void*, const XML_Char* name, XML_Encoding* encoding) {
             return XML_STATUS_OK;
         }
     return XML_STATUS_ERROR;
+}
+
+/// @return what is wrong, or null
+const char* GetErrorText(XML_Error error) {
+    switch (error) {
+    case XML_ERROR_NONE:
+        return nullptr;
+    case XML_ERROR_NO_ELEMENTS:
+    case XML_ERROR_UNCLOSED_TOKEN:
+    case XML_ERROR_UNCLOSED_CDATA_SECTION:
+    case XML_ERROR_PARTIAL_CHAR:
+        return "the document ends early";
+    default:
+        return XML_ErrorString(error);
+    }
 }
 
 /// Keeps the name of the first element.
@@ -144,16 +159,14 @@ bool XmlReader::ReadPiece(std::istream& stream, std::int64_t& rest) {
 
 void XmlReader::TestToken() {
     if (mnGiven - XML_GetCurrentByteIndex(mpoParser.get()) > LONGEST_TOKEN)
-        mpszFault = "a tag or comment of more than 16 MiB";
+        mpszFault = "a tag or comment of more than 4 MiB";
 }
 
 std::string XmlReader::GetFault() const {
     const XML_Error error = XML_GetErrorCode(mpoParser.get());
     if (error == XML_ERROR_NO_MEMORY)
         throw std::bad_alloc();
-    const char* fault = mpszFault                 ? mpszFault
-                        : error == XML_ERROR_NONE ? nullptr
-                                                  : XML_ErrorString(error);
+    const char* fault = mpszFault ? mpszFault : GetErrorText(error);
     return fault ? FormatString("line %llu: %s", static_cast<unsigned long long>(GetLine()), fault)
                  : std::string();
 }
