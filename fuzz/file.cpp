@@ -3,6 +3,7 @@
 
 #include "fuzz/bytes.h"
 #include "services/bundled/store/files/opendataset.h"
+#include "services/bundled/store/landxml/landxmlfile.h"
 #include "services/bundled/store/storefile.h"
 #include "services/exception.h"
 #include "services/vectorlayer.h"
@@ -11,6 +12,7 @@
 #include <cpl_vsi.h>
 
 #include <memory>
+#include <sstream>
 #include <string>
 
 namespace {
@@ -36,11 +38,10 @@ void WriteParts(fuzz::Bytes& rBytes, const Name& getName) {
 }
 
 /// @return the name to open
-std::string WriteFile(fuzz::Bytes& rBytes) {
+std::string WriteFile(fuzz::Bytes& rBytes, unsigned format) {
     static const char* const ENDINGS[] = {"gpkg", "fgb",    "geojson", "gml",
                                           "dxf",  "sqlite", "shp",     "gdb"};
     static const char* const SHAPE_PARTS[] = {".shp", ".shx", ".dbf", ".prj"};
-    const unsigned format = rBytes.TakeFrom(0, 7);
     std::string name = std::string(FOLDER) + "/input." + ENDINGS[format];
     if (format == 6)
         WriteParts(rBytes, [](unsigned id) {
@@ -57,10 +58,20 @@ std::string WriteFile(fuzz::Bytes& rBytes) {
     return name;
 }
 
-void Load(const std::string& name) {
+/// LandXML is read from a stream, without GDAL.
+std::unique_ptr<_iobuf> Open(fuzz::Bytes& rBytes) {
+    using namespace kelm::store;
+    const unsigned format = rBytes.TakeFrom(0, 8);
+    if (format < 8)
+        return std::make_unique<StoreFile>(OpenDataset(WriteFile(rBytes, format), "input"));
+    const auto* text = reinterpret_cast<const char*>(rBytes.GetNext());
+    std::istringstream stream(std::string(text, rBytes.GetSize()));
+    return std::make_unique<landxml::LandXmlFile>(stream, "input");
+}
+
+void Load(fuzz::Bytes& rBytes) {
     using namespace kelm;
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(new _iobuf(store::OpenDataset(name, "input")),
-                                                      &ZARClose);
+    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(Open(rBytes).release(), &ZARClose);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     if (layer == nullptr || ZARGetLayerType(layer, 0) == 0)
         return;
@@ -78,9 +89,8 @@ void Load(const std::string& name) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     fuzz::Bytes bytes(data, size);
-    const std::string name = WriteFile(bytes);
     try {
-        Load(name);
+        Load(bytes);
     } catch (const kelm::Exception& e) {
         fuzz::Require(e.what()[0] != '\0');
     }

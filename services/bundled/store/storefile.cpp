@@ -4,17 +4,19 @@
 
 #include <utility>
 
-using kelm::store::StoreLayer;
+namespace kelm::store {
 
-_iobuf::_iobuf(std::unique_ptr<kelm::store::Dataset> dataset)
+StoreFile::StoreFile(std::unique_ptr<Dataset> dataset)
     : mpoDataset(std::move(dataset)), moLayers(mpoDataset->GetLayers().size()) {}
 
-StoreLayer& _iobuf::GetLayer(int segment) {
+OpenLayer& StoreFile::GetLayer(int segment) {
     const auto index = static_cast<std::size_t>(segment) - 1;
     std::unique_ptr<StoreLayer>& layer = moLayers[index];
     if (!layer) {
-        const kelm::store::Confinement confinement;
+        const Confinement confinement;
         layer = std::make_unique<StoreLayer>(*this, *mpoDataset, *mpoDataset->GetLayers()[index]);
     }
     return *layer;
 }
+
+} // namespace kelm::store

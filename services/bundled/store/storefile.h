@@ -1,27 +1,27 @@
 #pragma once
 
 #include "services/bundled/store/files/dataset.h"
+#include "services/bundled/store/handles/openfile.h"
 #include "services/bundled/store/storelayer.h"
-#include "services/vectorlayer.h"
 
 #include <memory>
 #include <vector>
 
-/// An open file as the store hands it out: the dataset, and the layers that were taken from it.
-struct _iobuf {
-  public:
-    explicit _iobuf(std::unique_ptr<kelm::store::Dataset> dataset);
-    _iobuf(const _iobuf&) = delete;
-    _iobuf& operator=(const _iobuf&) = delete;
+namespace kelm::store {
 
-    /// @return the number of layers: the segments 1, 2 and so on
-    int GetLayerCount() const { return static_cast<int>(moLayers.size()); }
-    /// @param segment from 1 to the number of layers. @return the layer, surveyed by the first call
-    /// @throw kelm::DataException, see SurveyLayer
-    kelm::store::StoreLayer& GetLayer(int segment);
+/// An open file that GDAL reads: the dataset, and the layers that were taken from it.
+class StoreFile final : public _iobuf {
+  public:
+    explicit StoreFile(std::unique_ptr<Dataset> dataset);
+
+    int GetLayerCount() const override { return static_cast<int>(moLayers.size()); }
+    /// Surveys the layer by the first call. @throw kelm::DataException, see SurveyLayer
+    OpenLayer& GetLayer(int segment) override;
 
   private:
-    std::unique_ptr<kelm::store::Dataset> mpoDataset;
+    std::unique_ptr<Dataset> mpoDataset;
     /// Null until the layer is taken. Declared behind the dataset, which must end last.
-    std::vector<std::unique_ptr<kelm::store::StoreLayer>> moLayers;
+    std::vector<std::unique_ptr<StoreLayer>> moLayers;
 };
+
+} // namespace kelm::store

@@ -13,7 +13,7 @@ constexpr const char* SOURCE = "services/bundled/store/storelayer";
 } // namespace
 
 StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, OGRLayer& layer)
-    : ZARLayer_t{}, moFile(file), moWalk(dataset, layer), moSurvey(SurveyLayer(moWalk)) {
+    : moFile(file), moWalk(dataset, layer), moSurvey(SurveyLayer(moWalk)) {
     shapeCount = moSurvey.mnShapes;
     shapeCountValid = 1;
 }

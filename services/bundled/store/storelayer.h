@@ -1,36 +1,33 @@
 #pragma once
 
+#include "services/bundled/store/handles/openlayer.h"
 #include "services/bundled/store/layercrs.h"
 #include "services/bundled/store/layersurvey.h"
-#include "services/vectorlayer.h"
 
 #include <vector>
 
 namespace kelm::store {
 
-/// An open layer: its record, what the survey found, and one walk that all questions share.
-class StoreLayer : public ZARLayer_t {
+/// An open layer that GDAL reads: its record, what the survey found, and one walk that all
+/// questions share.
+class StoreLayer final : public OpenLayer {
   public:
     /// Surveys the layer. @param file the handle that GetFile gives back, not used otherwise
     /// @param dataset owns the layer, and outlives this object
     /// @throw kelm::DataException, see SurveyLayer
     StoreLayer(_iobuf& file, Dataset& dataset, OGRLayer& layer);
 
-    /// @return the first shape id, or -1
-    int GetFirst();
-    /// @return the shape id behind `id`, or -1. @throw kelm::DataException if there is no shape
-    /// `id`, or the layer has changed since it was opened
-    int GetBehind(int id);
-    /// @return the shape, good until the next call for one. @throw kelm::DataException if there is
-    /// no such shape or it cannot be delivered
-    ZARShape& GetShape(int id);
-
-    _iobuf& GetFile() const { return moFile; }
-    const LayerSurvey& GetSurvey() const { return moSurvey; }
-    /// @return the CRS as text, see ReadCrsText
-    std::string GetCrsText() const {
+    int GetFirst() override;
+    int GetBehind(int id) override;
+    ZARShape& GetShape(int id) override;
+    int GetType() const override { return moSurvey.mnType; }
+    ZARVertex GetLow() const override { return moSurvey.moLow; }
+    ZARVertex GetHigh() const override { return moSurvey.moHigh; }
+    /// See ReadCrsText.
+    std::string GetCrsText() const override {
         return ReadCrsText(moWalk.GetReader().GetLayer(), GetSubject());
     }
+    _iobuf& GetFile() const override { return moFile; }
 
   private:
     int Step();

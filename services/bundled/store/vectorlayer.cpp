@@ -1,32 +1,48 @@
-// The vector layer store by GDAL. It reads the formats that files/formats.h lists, and numbers
-// shapes by the rule of shapeids.h. A null layer is refused with a kelm::ParameterException.
+// The vector layer store. GDAL reads the formats that files/formats.h lists, and shapeids.h tells
+// how their shapes are numbered; landxml/ reads LandXML. A null layer is refused with a
+// kelm::ParameterException.
 
 #include "services/vectorlayer.h"
 
+#include "services/bundled/store/files/foreignfile.h"
 #include "services/bundled/store/files/opendataset.h"
 #include "services/bundled/store/gdal/gdalcall.h"
+#include "services/bundled/store/landxml/landxmlfile.h"
 #include "services/bundled/store/storefile.h"
 #include "services/exception.h"
 
 #include <cstring>
+#include <memory>
 
-using kelm::store::StoreLayer;
+using kelm::store::OpenLayer;
 
 namespace {
 
 constexpr const char* SOURCE = "services/bundled/store/vectorlayer";
 
-/// Every layer that is handed out is a StoreLayer.
-StoreLayer& Get(ZARLayer_t* layer) {
+/// Every layer that is handed out is an OpenLayer.
+OpenLayer& Get(ZARLayer_t* layer) {
     if (layer == nullptr)
         throw kelm::ParameterException("layer", kelm::ParameterException::PT_Invalid, "null", "",
                                        "A layer of an open file is needed", SOURCE,
                                        __PRETTY_FUNCTION__, __LINE__);
-    return *static_cast<StoreLayer*>(layer);
+    return *static_cast<OpenLayer*>(layer);
 }
 
 int CountSegments(const _iobuf* file, int type) {
     return file != nullptr && type == ZAR_SEGMENT_VECTOR ? file->GetLayerCount() : 0;
+}
+
+/// Tells LandXML by its content. All else is GDAL's.
+std::unique_ptr<_iobuf> Open(const char* name) {
+    if (std::unique_ptr<_iobuf> file = kelm::store::landxml::OpenLandXml(name))
+        return file;
+    try {
+        return std::make_unique<kelm::store::StoreFile>(kelm::store::OpenFile(name));
+    } catch (const kelm::DataException&) {
+        kelm::store::RefuseForeignFile(name);
+        throw;
+    }
 }
 
 } // namespace
@@ -37,7 +53,7 @@ _iobuf* ZAROpen(const char* name, const char* mode) {
                                        mode ? mode : "null", "r",
                                        "The vector layer store opens files for reading only",
                                        SOURCE, __PRETTY_FUNCTION__, __LINE__);
-    return new _iobuf(kelm::store::OpenFile(name));
+    return Open(name).release();
 }
 
 void ZARClose(_iobuf* file) {
@@ -62,7 +78,7 @@ ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {
 }
 
 int ZARGetLayerType(ZARLayer_t* layer, int) {
-    return Get(layer).GetSurvey().mnType;
+    return Get(layer).GetType();
 }
 
 int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* info) {
@@ -71,8 +87,8 @@ int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* info) {
 }
 
 int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high) {
-    *low = Get(layer).GetSurvey().moLow;
-    *high = Get(layer).GetSurvey().moHigh;
+    *low = Get(layer).GetLow();
+    *high = Get(layer).GetHigh();
     return 0;
 }
 

@@ -34,7 +34,7 @@ std::string GetFormatNames() {
     std::string names;
     for (const Format& format : GetFormats())
         names.append(names.empty() ? "" : ", ").append(format.mpszName);
-    return names;
+    return names + ", LandXML";
 }
 
 void RegisterFormats() {

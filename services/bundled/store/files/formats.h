@@ -24,7 +24,7 @@ struct Format {
 /// because many of them open connections, or further files that the first one names.
 const std::vector<Format>& GetFormats();
 
-/// @return the names of the formats, for a message
+/// @return the names of all formats that the store reads, LandXML included, for a message
 std::string GetFormatNames();
 
 /// Registers GDAL's drivers, once a process and only if the host has not done it. Safe to call from

@@ -1,0 +1,333 @@
+#include "services/reporting.h"
+#include "services/vectorlayer.h"
+#include "tests/support/gdaltranscript.h"
+#include "tests/support/temporaryfolder.h"
+#include "tin/tin.h"
+#include "tin/tinreader.h"
+#include "tin/tinreaderfactory.h"
+
+#include <gtest/gtest.h>
+#include <ogr_spatialref.h>
+
+#include <memory>
+
+using namespace kelm::test;
+using File = std::unique_ptr<_iobuf, decltype(&ZARClose)>;
+
+namespace {
+
+/// A square of one unit; the height of a point is its number. The fifth lies within, near 1.
+const std::string kPoints = "<Pnts><P id='1'>0 10 1</P><P id='2'>0 11 2</P><P id='3'>1 10 3</P>"
+                            "<P id='4'>1 11 4</P><P id='5'>.2 10.2 5</P></Pnts>";
+
+std::string Definition(const std::string& content, const std::string& type = "TIN") {
+    return "<Surface name='EG'><Definition surfType='" + type + "'>" + content +
+           "</Definition></Surface>\n";
+}
+std::string Tin(const std::string& faces, const std::string& points = kPoints) {
+    return "<Surfaces>\n" + Definition(points + "\n<Faces>" + faces + "</Faces>") + "</Surfaces>";
+}
+const std::string kTin = Tin("<F>1 2 3</F><F>2 4 3</F>");
+
+std::string Document(const std::string& content, const std::string& attributes = "") {
+    return "<?xml version='1.0'?>\n<LandXML" + attributes + ">" + content + "</LandXML>\n";
+}
+
+/// @return a layer's type, and its shapes: the id, and the heights of the ring
+std::string Describe(ZARLayer_t* poLayer) {
+    std::string text = "type " + std::to_string(ZARGetLayerType(poLayer, 0));
+    int nShapes = 0;
+    for (int nId = ZARGetNext(poLayer, -1); nId != -1; nId = ZARGetNext(poLayer, nId)) {
+        const ZARShape& oShape = *ZARGetShapeRef(poLayer, nId);
+        text += ' ' + std::to_string(nId) + '=';
+        for (int n = 0; n < oShape.vertexCount; ++n)
+            text += std::to_string(int(oShape.vertices[n].z));
+        ++nShapes;
+    }
+    EXPECT_EQ(nShapes, poLayer->shapeCount);
+    return text;
+}
+
+class LandXml : public testing::Test {
+  protected:
+    LandXml() { moTranscript.moFolder = moFolder.GetPath(""); }
+    File Open(const std::string& text, const std::string& name = "a.xml") const {
+        return {ZAROpen(moFolder.WriteFile(name, text).c_str(), "r"), ZARClose};
+    }
+    /// @return the layers of a document, or empty if it is refused
+    std::string Read(const std::string& text) {
+        std::string layers;
+        moTranscript.Refuses([&] {
+            const File poFile = Open(text);
+            for (int n = 0; (n = ZARSegNext(poFile.get(), ZAR_SEGMENT_VECTOR, n)) != 0;)
+                layers += (n > 1 ? "; " : "") + Describe(ZARGetLayer(poFile.get(), n));
+        });
+        return layers;
+    }
+
+    TemporaryFolder moFolder;
+    GdalTranscript moTranscript;
+};
+
+TEST_F(LandXml, EachVersionAndEncodingGivesTheSameSurface) {
+    const std::string expected = "type 2 1=1231 2=2432";
+    for (const char* pszAttributes :
+         {"", " version='1.0' xmlns='http://www.landxml.org/schema/LandXML-1.0'",
+          " version='1.1' xmlns='http://www.landxml.org/schema/LandXML-1.1'",
+          " version='1.2' xmlns='http://www.landxml.org/schema/LandXML-1.2'",
+          " version='2.0' xmlns='http://www.landxml.org/schema/LandXML-2.0'"})
+        EXPECT_EQ(Read(Document("<Project/>" + kTin, pszAttributes)), expected) << pszAttributes;
+    std::string prefixed = Document(kTin, " xmlns:l='http://www.landxml.org/schema/LandXML-1.2'");
+    for (std::size_t n = 30; (n = prefixed.find('<', n)) != std::string::npos; ++n)
+        prefixed.insert(prefixed[n + 1] == '/' ? n + 2 : n + 1, "l:");
+    prefixed.replace(prefixed.find("<LandXML"), 2, "<l:L");
+    EXPECT_EQ(Read(prefixed), expected) << prefixed;
+
+    const std::string latin = Document("<!-- \xE9 -->" + kTin).replace(19, 0, " encoding='X'");
+    for (const char* pszName : {"ISO-8859-1", "iso-8859-15", "Windows-1252"})
+        EXPECT_EQ(Read(std::string(latin).replace(latin.find('X'), 1, pszName)), expected);
+    EXPECT_EQ(Read(latin), "") << "no such encoding";
+    EXPECT_EQ(Read("\xEF\xBB\xBF" + Document(kTin)), expected);
+    std::string wide = "\xFF\xFE";
+    for (const char c : Document(kTin))
+        wide.append({c, '\0'});
+    EXPECT_EQ(Read(wide), expected);
+}
+
+TEST_F(LandXml, PointsAreNorthingEastingElevation) {
+    const std::string points =
+        "<Pnts><P id='7'>\n4e6\t+500000.25 -1.5 </P>"
+        "<P id='8'><![CDATA[4000001 500001]]> 2</P><P id='9'>&n; 3</P></Pnts>";
+    const std::string text = Document(Tin("<F>7 8 9</F>", points));
+    const File poFile = Open("<!DOCTYPE LandXML [<!ENTITY n '4000002 500000'>]>" + text.substr(22));
+    ZARLayer_t* poLayer = ZARGetLayer(poFile.get(), 1);
+    const ZARShape& oShape = *ZARGetShapeRef(poLayer, 1);
+    const double aadfCorners[][3] = {
+        {500000.25, 4e6, -1.5}, {500001, 4000001, 2}, {500000, 4000002, 3}};
+    for (int n = 0; n < 4; ++n) {
+        const ZARVertex& oVertex = oShape.vertices[n];
+        EXPECT_TRUE(oVertex.x == aadfCorners[n % 3][0] && oVertex.y == aadfCorners[n % 3][1] &&
+                    oVertex.z == aadfCorners[n % 3][2]);
+    }
+    ZARVertex oLow, oHigh;
+    ZARGetExtents(poLayer, &oLow, &oHigh);
+    EXPECT_TRUE(oLow.x == 500000 && oLow.y == 4e6 && oLow.z == -1.5 && oHigh.x == 500001 &&
+                oHigh.y == 4000002 && oHigh.z == 3);
+    EXPECT_EQ(ZARLayer2fp(poLayer), poFile.get());
+}
+
+const struct {
+    std::string moContent;
+    const char* mpszLayers;
+} kContents[] = {
+    // Invisible faces and neighbours; several blocks; elements of others.
+    {Tin("<F i='1'>1 2 3</F><F i='0' n='0 1 0'>2 4 3</F>"), "type 2 2=2432"},
+    {Tin("<F>1 2 3</F></Faces>" + kPoints +
+             "<Faces>x<Feature><F>1 2 3</F></Feature>"
+             "<F>2 <x>9</x>4 3</F>",
+         "<Faces><F>4 2 1</F></Faces>"),
+     "type 2 1=4214 2=1231 3=2432"},
+    {Tin("<F>2147483648 7 4294967295</F><F>7 11 2147483648</F>",
+         "<Pnts><P id='4294967295'>0 0 3</P><P id='11'>1 1 4</P><P id='2147483648'>1 0 1</P>"
+         "<P id='7'>0 1 2</P></Pnts>"),
+     "type 2 1=1231 2=2412"},
+    // Four corners: both diagonals, upright, crossing itself, one corner on a side, a triangle.
+    {Tin("<F>1 2 4 3</F><F>2 5 3 1</F><F>5 3 1 2</F>"), "type 2 10=1241 11=1431 20=2512 21=5315 "
+                                                        "30=5315 31=5125"},
+    {Tin("<F>6 7 8 9</F>", "<Pnts><P id='6'>0 0 1</P><P id='7'>0 1 2</P><P id='8'>0 1 3</P>"
+                           "<P id='9'>0 0 4</P></Pnts>"),
+     "type 2 10=1231 11=1341"},
+    {Tin("<F>1 2 3 4</F><F>1 2 3 3</F><F>1 1 2 3</F><F>3 1 2 3</F>"),
+     "type 2 2=1231 3=1231 4=3123"},
+    // Damaged records cost themselves.
+    {Tin("<F>1 2 3</F>\n<F>1 2 9</F><F>1 2</F>\n\n<F>1 2 3 4 5</F><F>1 2 x</F><F>1 2 -3</F><F>1 2 "
+         "2</F>"
+         "<F/><F>1 2 4294967296</F><F>1 2 1 3</F><F>2 4 3</F>"),
+     "type 2 1=1231 11=2432"},
+    {Tin("<F>1 2 3</F><F>1 2 6</F><F>1 2 7</F><F>1 3 8</F><F>1 3 9</F><F>2 4 3</F>",
+         kPoints +
+             "<Pnts>\n<P id='6'>1 2</P>\n<P id='7'>1 2 nan</P><P>1 2 3</P><P id='x'>1 2 3</P>"
+             "<P id='8'>1 2 1e999</P><P id='9'>0,5 1 2</P><P id='6'>1 2 3 4</P>\n<P id='10'>" +
+             std::string(5000, ' ') + "1 2 3</P></Pnts>"),
+     "type 2 1=1231 6=2432"},
+    {Tin("<F>1 2 3</F><F>2 4 3</F>", kPoints + "<Pnts><P id='1'>0 10 1</P><P id='4'>0 10 1</P>"
+                                               "<P id='4'>1 11 4</P></Pnts>"),
+     "type 2 1=1231"},
+    // Several surfaces.
+    {"<Surfaces>" + Definition(kPoints + "<Faces><F>1 2 3</F></Faces>") + Definition("", "grid") +
+         Definition(kPoints) + "<Surface name='no'/></Surfaces>" + kTin,
+     "type 2 1=1231; type 1; type 2 1=1231 2=2432"},
+    // Without a TIN surface.
+    {"<Surfaces>" + Definition("", "grid") + "<Surface name='FG'/></Surfaces>", ""},
+    {"<Alignments/><CgPoints/><Alignments/>", ""},
+    {"", ""},
+};
+
+TEST_F(LandXml, EachContentGivesItsLayersOrIsRefused) {
+    for (const auto& oRow : kContents)
+        EXPECT_EQ(Read(Document(oRow.moContent)), oRow.mpszLayers) << oRow.moContent;
+}
+
+TEST_F(LandXml, OfManyDamagedRecordsTheFirstHundredAreNamed) {
+    std::string faces;
+    for (int n = 0; n < 103; ++n)
+        faces += "<F/>";
+    EXPECT_EQ(Read(Document(Tin(faces))), "type 1");
+    const std::string lines = moTranscript.Take();
+    EXPECT_EQ(std::count(lines.begin(), lines.end(), '\n'), 101);
+    moTranscript.moLines = lines.substr(lines.rfind("The surface", lines.size() - 2));
+}
+
+TEST_F(LandXml, AnIncompleteOrHarmfulDocumentIsRefusedWhole) {
+    const std::string whole = Document(kTin);
+    for (std::size_t nCut = 25; nCut-- > 0;) {
+        EXPECT_EQ(Read(whole.substr(0, (whole.size() - 2) * nCut / 24)), "") << nCut;
+        if (nCut != 12)
+            moTranscript.moLines.erase(
+                moTranscript.moLines.rfind('\n', moTranscript.moLines.size() - 2) + 1);
+    }
+    std::string bomb = "<!ENTITY e0 '0 10 1'>";
+    for (int n = 0; n < 9; ++n)
+        bomb += "<!ENTITY e" + std::to_string(n + 1) + " '" +
+                FormatString("&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;", n, n, n, n, n, n,
+                             n, n, n, n) +
+                "'>";
+    const std::string secret = moFolder.WriteFile("secret", "<P id='1'>0 10 1</P>");
+    for (const std::string& doctype :
+         {bomb, "<!ENTITY e9 SYSTEM '" + secret + "'>",
+          std::string("<!ENTITY % x SYSTEM 'http://127.0.0.1:9/x'> %x;")})
+        EXPECT_EQ(Read("<!DOCTYPE LandXML [" + doctype + "]>\n<LandXML>" +
+                       Tin("<F>1 2 3</F>", "<Pnts>&e9;</Pnts>") + "</LandXML>"),
+                  "");
+    EXPECT_EQ(Read("<LandXML><!--" + std::string(5 << 20, ' ') + "--></LandXML>"), "");
+}
+
+/// @return the CRS of a layer, its unit, and those of its heights; or empty
+std::string DescribeCrs(ZARLayer_t* poLayer) {
+    ProjInfo_t oInfo;
+    ZARGetProjectionInfo(poLayer, &oInfo);
+    OGRSpatialReference oCrs;
+    if (oInfo.definition.empty() || oCrs.SetFromUserInput(oInfo.definition.c_str()) != OGRERR_NONE)
+        return oInfo.definition;
+    const char *pszName = oCrs.GetAttrValue("PROJCS"),
+               *pszVertical = oCrs.GetAttrValue("COMPD_CS|VERT_CS");
+    const double dfUnit = oCrs.GetTargetLinearUnits("PROJCS");
+    return FormatString("%s, %.10g; %s, %.10g", pszName ? pszName : oCrs.GetName(), dfUnit,
+                        pszVertical ? pszVertical : "-",
+                        pszVertical ? oCrs.GetTargetLinearUnits("VERT_CS") : 0.0);
+}
+
+TEST_F(LandXml, UnitsAndCoordinateSystemBecomeTheCrs) {
+    const struct {
+        const char* mpszUnit;
+        std::string moAttributes;
+        const char* mpszExpected;
+    } rows[] = {
+        {"meter", "", ""},
+        {"foot", "name='Site'", ""},
+        {"meter", "epsgCode='25832'", "ETRS89 / UTM zone 32N, 1; -, 0"},
+        {"meter", "epsgCode='EPSG:25832' verticalDatum='DHHN2016'",
+         "ETRS89 / UTM zone 32N, 1; DHHN2016 height, 1"},
+        {"meter", "epsgCode='5555'", "ETRS89 / UTM zone 32N, 1; DHHN92 height, 1"},
+        {"meter", "name='etrs89 / utm zone 32n'", "ETRS89 / UTM zone 32N, 1; -, 0"},
+        {"meter", "name='utm zone 32'", ""},
+        {"meter",
+         "epsgCode='999999' horizontalCoordinateSystemName='WGS 84 / UTM zone 16N' name='-'",
+         "WGS 84 / UTM zone 16N, 1; -, 0"},
+        {"meter", "ogcWktCode='LOCAL_CS[&quot;Site&quot;]' name='x'", "Site, 1; -, 0"},
+        {"USSurveyFoot", "epsgCode='2274' verticalDatum='NAVD88'",
+         "NAD83 / Tennessee (ftUS), 0.3048006096; NAVD88 height (US survey foot), 0.3048006096"},
+        {"foot", "epsgCode='2274' verticalDatum='Pier'",
+         "NAD83 / Tennessee (ftUS), 0.3048; EGM96 height (foot), 0.3048"},
+        {"millimeter", "epsgCode='25832'",
+         "ETRS89 / UTM zone 32N, 0.001; EGM96 height (millimetre), 0.001"},
+        {"mile", "epsgCode='25832'",
+         "ETRS89 / UTM zone 32N, 1609.344; EGM96 height (Statute mile), 1609.344"},
+        {"inch", "epsgCode='4326'", "WGS 84 + EGM96 height (inch), 1; EGM96 height (inch), 0.0254"},
+        {"cubit", "epsgCode='25832'", ""},
+    };
+    for (const auto& oRow : rows) {
+        const File poFile = Open(Document(
+            FormatString("%s<CoordinateSystem %s/><Units><Metric linearUnit='%s'/></Units>",
+                         kTin.c_str(), oRow.moAttributes.c_str(), oRow.mpszUnit)));
+        EXPECT_EQ(DescribeCrs(ZARGetLayer(poFile.get(), 1)), oRow.mpszExpected)
+            << oRow.moAttributes;
+    }
+}
+
+TEST_F(LandXml, HeightsInFeetAreConvertedAsFeet) {
+    using namespace kelm;
+    std::vector<double> heights;
+    for (const double dfUnit : {1.0, 0.3048}) {
+        std::string points;
+        for (int n = 0; n < 3; ++n)
+            points +=
+                FormatString("<P id='%d'>%.9f %.9f %.9f</P>", n, (5300000 + n / 2 * 9) / dfUnit,
+                             (500000 + n % 2 * 9) / dfUnit, 300 / dfUnit);
+        const std::string text = FormatString("<Units><Imperial linearUnit='%s'/></Units>"
+                                              "<CoordinateSystem epsgCode='32632'/>",
+                                              dfUnit == 1 ? "meter" : "foot");
+        const std::unique_ptr<tin::TinReader> poReader(tin::TinReaderFactory::CreateTinReader(
+            moFolder
+                .WriteFile("a.xml",
+                           Document(text + Tin("<F>0 1 2</F>", "<Pnts>" + points + "</Pnts>")))
+                .c_str(),
+            0, 0, 1, ogc::cs::VD_Orthometric));
+        poReader->SetOutputVerticalDatum(ogc::cs::VD_Ellipsoidal);
+        const std::unique_ptr<tin::Tin> poTin(poReader->Load(nullptr));
+        heights.push_back(double(poTin->GetVertex(0)->z));
+    }
+    EXPECT_NEAR(heights[0], 347, 2) << "the geoid lies 47 m above the ellipsoid";
+    EXPECT_NEAR(heights[1], heights[0], 1e-3);
+    moTranscript.Take();
+}
+
+TEST_F(LandXml, AReaderLoadsAndLoadsAgainByWindow) {
+    std::string points, faces;
+    for (int n = 1; n <= 300; ++n) {
+        points += FormatString("<P id='%d'>%d %d %d</P>", n * 3, n % 2, n, n);
+        if (n > 2)
+            faces += FormatString("<F>%d %d %d</F>", n * 3 - 6, n * 3 - 3, n * 3);
+    }
+    const std::string path =
+        moFolder.WriteFile("a.txt", Document(Tin(faces, "<Pnts>" + points + "</Pnts>")));
+    const std::unique_ptr<kelm::tin::TinReader> poReader(
+        kelm::tin::TinReaderFactory::CreateTinReader(path.c_str(), 0, 0, 1,
+                                                     kelm::ogc::cs::VD_Other));
+    kelm::tin::BBox<double, point2_t<double>> oWindow;
+    oWindow.min = {100.25, 0.5};
+    oWindow.max = {100.5, 0.6};
+    for (int n = 0; n < 2; ++n) {
+        const std::unique_ptr<kelm::tin::Tin> poPart(poReader->Load(&oWindow)),
+            poAll(poReader->Load(nullptr));
+        EXPECT_EQ(poPart->GetTriangleCount(), 2U);
+        EXPECT_EQ(poAll->GetTriangleCount(), 298U);
+    }
+    const File poFile = Open(Document(Tin("<F>1 2 4 3</F><F i='1'>1 2 3</F><F>1 2 3</F>")));
+    ZARLayer_t* poLayer = ZARGetLayer(poFile.get(), 1);
+    EXPECT_EQ(ZARGetNext(poLayer, 11), 30);
+    EXPECT_EQ(ZARGetShapeRef(poLayer, 10)->vertices[1].z, 2) << "in any order";
+    for (const int nUnknown : {-2, 1, 12, 20, 31, 2147483647})
+        EXPECT_TRUE(moTranscript.Refuses([&] { ZARGetNext(poLayer, nUnknown); }));
+}
+
+TEST_F(LandXml, FormatsThatAreNotReadAreRefusedWithAWayToConvertThem) {
+    const std::string city =
+        "{\n \"type\": \"CityJSON\", \"version\": \"1.1\", \"CityObjects\": {}, "
+        "\"vertices\": []}";
+    for (const char* pszName : {"a.city.json", "a.json"})
+        EXPECT_TRUE(moTranscript.Refuses([&] { Open(city, pszName); }));
+    for (const char* pszName : {"tnxy.adf", "tnz.adf"})
+        moFolder.WriteFile(pszName, "");
+    for (const char* pszName : {"", "tnz.adf"})
+        EXPECT_TRUE(moTranscript.Refuses([&] { ZAROpen(moFolder.GetPath(pszName).c_str(), "r"); }));
+    EXPECT_TRUE(moTranscript.Refuses([&] { Open("<html/>"); })) << "other XML";
+    const std::string square = R"({"type":"Polygon","coordinates":[[[0,0],[1,0],[0,1],[0,0]]]})";
+    const File poFile =
+        Open(R"({"type":"Feature","properties":{"type":"CityJSON"},"geometry":)" + square + "}",
+             "b.json");
+    EXPECT_EQ(Describe(ZARGetLayer(poFile.get(), 1)), "type 2 0=0000");
+    moTranscript.moLines.erase(moTranscript.moLines.rfind("The layer"));
+}
+
+} // namespace
