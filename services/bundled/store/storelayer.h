@@ -36,7 +36,6 @@ class StoreLayer : public ZARLayer_t {
     int Step();
     void TestUnchanged(bool more, int id) const;
     void Seek(int id);
-    FacetFault ReadFacet();
     const std::string& GetSubject() const { return moWalk.GetReader().GetSubject(); }
 
     _iobuf& moFile;
