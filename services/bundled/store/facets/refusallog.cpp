@@ -19,6 +19,7 @@ std::string GetFeaturesText(const std::vector<std::int64_t>& features) {
 } // namespace
 
 void RefusalLog::Add(std::int64_t feature, FacetFault fault, double area) {
+    ++mnShapes;
     mdfArea += area;
     if (fault == FacetFault::None)
         return;
@@ -33,9 +34,10 @@ void RefusalLog::Add(std::int64_t feature, FacetFault fault, double area) {
 void RefusalLog::Finish() const {
     for (const auto& [fault, refused] : moRefused)
         tellus::Warning::Warn(
-            FormatString("The %s: shapes that cannot be used: %lld%s: %s (%s)", moSubject.c_str(),
-                         static_cast<long long>(refused.mnShapes), GetShareText(refused).c_str(),
-                         GetFaultText(fault), GetFeaturesText(refused.moFeatures).c_str()),
+            FormatString("The %s: %lld of %lld shapes cannot be used%s: %s (%s)", moSubject.c_str(),
+                         static_cast<long long>(refused.mnShapes), static_cast<long long>(mnShapes),
+                         GetShareText(refused).c_str(), GetFaultText(fault),
+                         GetFeaturesText(refused.moFeatures).c_str()),
             SOURCE, __LINE__);
 }
 

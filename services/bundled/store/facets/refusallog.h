@@ -34,6 +34,7 @@ class RefusalLog {
     std::string GetShareText(const Refused& refused) const;
 
     std::string moSubject;
+    std::int64_t mnShapes = 0;
     double mdfArea = 0.0; ///< of all facets
     std::map<FacetFault, Refused> moRefused;
 };
