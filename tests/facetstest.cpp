@@ -134,8 +134,8 @@ const struct {
      "6))",
      10, 68.5},
     {"POLYGON Z ((0 0 1,9 0 2,9 9 3,0 9 4,0 0 1),(1 1 5,2 2 5,1 1 5))", 2, 81}, // encloses nothing
-    {"POLYGON Z ((0 0 1,9 0 2,9 9 3,0 9 4,0 4 8,3 6 6,3 3 5,0 4 8,0 0 1))", 7,
-     76.5}, // the ring is a hole
+    {"POLYGON Z ((0 0 1,9 0 2,9 9 3,0 9 4,0 4 8,3 6 6,3 3 5,0 4 8,0 0 1))", 6,
+     76.5}, // the ring makes a hole of itself
     // Upright: quads along x, along y and aslant, not quite in one plane, a gable, two windows.
     {"POLYGON Z ((0 5 0,8 5 0,8 5 3,0 5 3,0 5 0))", 2, 24, true},
     {"POLYGON Z ((5 0 0,5 8 0,5 8 3,5 0 3))", 2, 24, true}, // not closed, though closed in plan

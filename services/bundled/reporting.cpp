@@ -59,17 +59,23 @@ std::int64_t Count(const Kind& kind) {
     return 0;
 }
 
-/// @return the numbers left out. A kind that was loud has to be brief next time.
+/// A kind that was loud has to be brief when it is met next.
+std::int64_t GetAllowed(const Repeats& last) {
+    if (last.mnCount == 0)
+        return last.mnAllowed;
+    return last.mnCount > MOST_GIVEN ? 1 : MOST_GIVEN;
+}
+
 std::map<Kind, Repeats> TakeRepeats() {
     const std::lock_guard<std::mutex> lock(GetMutex());
     std::map<Kind, Repeats> taken = GetRepeats();
     for (auto& [kind, repeats] : GetRepeats())
-        repeats = {repeats.mnCount > MOST_GIVEN ? 1 : MOST_GIVEN, 0, 0};
+        repeats = {GetAllowed(repeats), 0, 0};
     return taken;
 }
 
 const char* GetNote(std::int64_t number) {
-    return number == MOST_GIVEN ? " [the hundredth of its kind; more are counted]" : "";
+    return number == MOST_GIVEN ? " (the hundredth of its kind; more are counted)" : "";
 }
 
 } // namespace
