@@ -1,12 +1,12 @@
 #include "services/bundled/store/layersurvey.h"
 
 #include "services/bundled/store/facets/refusallog.h"
-#include "services/bundled/store/facets/ring.h"
 #include "services/bundled/store/layertype.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
 #include <algorithm>
+#include <cmath>
 #include <limits>
 
 namespace kelm::store {
@@ -41,8 +41,8 @@ class Survey {
     void TestCount() const;
     void TakeWarnings();
     void FinishWarnings();
-    FacetFault ReadFacet();
     void AddRing(bool flat);
+    double ComputeArea() const;
     LayerSurvey GetResult() const;
     void WarnOfHeights() const;
     void WarnOfColumns() const;
@@ -99,8 +99,13 @@ void Survey::AddShape() {
     TestCount();
     if (moWalk.GetFacetNumber() == 0)
         moIds.AddFeature(moWalk.GetFeature(), moWalk.GetFacetCount());
-    const FacetFault fault = ReadFacet();
-    moRefusals.Add(moWalk.GetFeature(), fault);
+    const Facet& facet = moWalk.GetFacet();
+    const FacetFault fault = ReadFacet(facet, moVertices);
+    if (fault == FacetFault::None)
+        AddRing(!facet.mpoRing->Is3D());
+    const FacetFault reason = fault == FacetFault::None ? facet.meFault : fault;
+    moRefusals.Add(moWalk.GetFeature(), reason,
+                   reason == FacetFault::None ? ComputeArea() : facet.mdfRefusedArea);
     moType.Add(fault);
 }
 
@@ -111,21 +116,21 @@ void Survey::TestCount() const {
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
 }
 
-FacetFault Survey::ReadFacet() {
-    const Facet& facet = moWalk.GetFacet();
-    if (facet.meFault != FacetFault::None)
-        return facet.meFault;
-    const FacetFault fault = ReadRing(*facet.mpoRing, moVertices);
-    if (fault == FacetFault::None)
-        AddRing(!facet.mpoRing->Is3D());
-    return fault;
-}
-
 void Survey::AddRing(bool flat) {
     for (const ZARVertex& vertex : moVertices)
         moExtents.Add(vertex);
     ++mnDeliverable;
     mnFlat += flat;
+}
+
+/// @return the area of the ring in plan. Products of map coordinates would lose what is small
+double Survey::ComputeArea() const {
+    const ZARVertex& from = moVertices.front();
+    double sum = 0.0;
+    for (std::size_t i = 1; i + 1 < moVertices.size(); ++i)
+        sum += (moVertices[i].x - from.x) * (moVertices[i + 1].y - from.y) -
+               (moVertices[i].y - from.y) * (moVertices[i + 1].x - from.x);
+    return std::fabs(sum) / 2;
 }
 
 LayerSurvey Survey::GetResult() const {

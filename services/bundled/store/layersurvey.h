@@ -16,8 +16,8 @@ struct LayerSurvey {
     ZARVertex moHigh{};
 };
 
-/// Walks a layer once from its first facet to its last. Warns of each facet that cannot be
-/// delivered, of missing heights and of what GDAL warned of.
+/// Walks a layer once from its first facet to its last. Warns of the facets that cannot
+/// be used, once a reason, of missing heights and of what GDAL warned of.
 /// @throw kelm::DataException if the layer cannot be read or holds more shapes than an int counts
 LayerSurvey SurveyLayer(LayerWalk& walk);
 

@@ -1,6 +1,5 @@
 #include "services/bundled/store/storelayer.h"
 
-#include "services/bundled/store/facets/ring.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
@@ -30,7 +29,7 @@ int StoreLayer::GetBehind(int id) {
 
 ZARShape& StoreLayer::GetShape(int id) {
     Seek(id);
-    const FacetFault fault = ReadFacet();
+    const FacetFault fault = ReadFacet(moWalk.GetFacet(), moVertices);
     if (fault != FacetFault::None)
         throw DataException(FormatString("Shape %d (feature %lld) of %s cannot be used: %s", id,
                                          static_cast<long long>(moWalk.GetFeature()),
@@ -38,11 +37,6 @@ ZARShape& StoreLayer::GetShape(int id) {
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
     moShape = {moVertices.data(), static_cast<int>(moVertices.size())};
     return moShape;
-}
-
-FacetFault StoreLayer::ReadFacet() {
-    const Facet& facet = moWalk.GetFacet();
-    return facet.meFault == FacetFault::None ? ReadRing(*facet.mpoRing, moVertices) : facet.meFault;
 }
 
 int StoreLayer::Step() {

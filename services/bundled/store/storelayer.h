@@ -33,7 +33,6 @@ class StoreLayer final : public OpenLayer {
     int Step();
     void TestUnchanged(bool more, int id) const;
     void Seek(int id);
-    FacetFault ReadFacet();
     const std::string& GetSubject() const { return moWalk.GetReader().GetSubject(); }
 
     _iobuf& moFile;

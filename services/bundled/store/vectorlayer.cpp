@@ -4,6 +4,7 @@
 
 #include "services/vectorlayer.h"
 
+#include "services/bundled/reportingrepeats.h"
 #include "services/bundled/store/files/foreignfile.h"
 #include "services/bundled/store/files/opendataset.h"
 #include "services/bundled/store/gdal/gdalcall.h"
@@ -57,8 +58,11 @@ _iobuf* ZAROpen(const char* name, const char* mode) {
 }
 
 void ZARClose(_iobuf* file) {
-    const kelm::store::GdalCall call;
-    delete file;
+    {
+        const kelm::store::GdalCall call;
+        delete file;
+    }
+    kelm::tellus::TellLeftOut();
 }
 
 int ZARSegCount(_iobuf* file, int type) {

@@ -14,12 +14,18 @@ const char* GetFaultText(FacetFault fault) {
         return "lines instead of a polygon";
     case FacetFault::Curve:
         return "a curved polygon that cannot be linearised";
-    case FacetFault::Holes:
-        return "a polygon with holes";
     case FacetFault::FewCorners:
         return "a ring of fewer than three corners";
     case FacetFault::NotFinite:
         return "an ordinate that is not a finite number";
+    case FacetFault::Crosses:
+        return "a ring that crosses itself or another ring";
+    case FacetFault::NoArea:
+        return "a polygon without area";
+    case FacetFault::NotPlanar:
+        return "an upright polygon that is not planar";
+    case FacetFault::Uncut:
+        return "a polygon that cannot be cut into triangles";
     case FacetFault::None:
         break;
     }

@@ -4,7 +4,7 @@ namespace kelm::store {
 
 void LayerWalk::Restart() {
     moReader.Restart();
-    moFacets.Clear();
+    moFacets.Restart();
     mnFacet = 0;
     mnShapes = 0;
 }

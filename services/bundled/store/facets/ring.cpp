@@ -17,6 +17,8 @@ bool IsClosed(const std::vector<ZARVertex>& vertices) {
     return vertices.front().x == vertices.back().x && vertices.front().y == vertices.back().y;
 }
 
+} // namespace
+
 void CopyVertices(const OGRSimpleCurve& ring, std::vector<ZARVertex>& vertices) {
     constexpr int STRIDE = sizeof(ZARVertex);
     vertices.resize(static_cast<std::size_t>(ring.getNumPoints()));
@@ -24,11 +26,13 @@ void CopyVertices(const OGRSimpleCurve& ring, std::vector<ZARVertex>& vertices) 
     ring.getPoints(&first->x, STRIDE, &first->y, STRIDE, &first->z, STRIDE);
 }
 
-} // namespace
+bool AreFinite(const std::vector<ZARVertex>& vertices) {
+    return std::all_of(vertices.begin(), vertices.end(), IsFinite);
+}
 
 FacetFault ReadRing(const OGRSimpleCurve& ring, std::vector<ZARVertex>& vertices) {
     CopyVertices(ring, vertices);
-    if (!std::all_of(vertices.begin(), vertices.end(), IsFinite))
+    if (!AreFinite(vertices))
         return FacetFault::NotFinite;
     if (!IsClosed(vertices))
         vertices.push_back(vertices.front());

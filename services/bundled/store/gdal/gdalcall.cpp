@@ -1,5 +1,7 @@
 #include "services/bundled/store/gdal/gdalcall.h"
 
+#include "services/bundled/store/gdal/advice.h"
+
 #include <cpl_conv.h>
 #include <cpl_error.h>
 #include <cpl_http.h>
@@ -42,9 +44,9 @@ void GdalCall::Add(bool failure, const char* text) noexcept {
     mbFailed = mbFailed || failure;
     try {
         if (!failure)
-            AddWarning(moWarnings, text, 1);
+            AddWarning(moWarnings, StripAdvice(text), 1);
         else if (moFailures.size() < LONGEST_FAILURES)
-            moFailures.append(moFailures.empty() ? "" : "; ").append(text);
+            moFailures.append(moFailures.empty() ? "" : "; ").append(StripAdvice(text));
     } catch (...) {
         // The callers are GDAL's functions, which an exception must not cross. mbFailed is set.
     }
