@@ -32,8 +32,8 @@ inline bool IsInside(const EarPoint& p, const EarPoint& q, const EarPoint& r, do
 
 /// @return position of the first point of first .. last-1 inside the triangle P, Q, R; last if
 /// there is none. Points are taken in blocks without a branch.
-std::size_t FindInside(const EarPoint& p, const EarPoint& q, const EarPoint& r,
-                       const EarCoordinates& points, std::size_t first, std::size_t last) {
+inline std::size_t FindInside(const EarPoint& p, const EarPoint& q, const EarPoint& r,
+                              const EarCoordinates& points, std::size_t first, std::size_t last) {
     constexpr std::size_t BLOCK = 64;
     const double* const x = points.x.data();
     const double* const y = points.y.data();
