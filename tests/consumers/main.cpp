@@ -23,14 +23,11 @@
 #include <tin/vector3.h>
 
 #include <cstdio>
-#include <exception>
 #include <memory>
 
 using namespace kelm::tin;
 
-namespace {
-
-void PrintHeight(const char* file) {
+static void PrintHeight(const char* file) {
     const std::unique_ptr<TinReader> reader(
         TinReaderFactory::CreateTinReader(file, 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
     const std::unique_ptr<Tin> terrain(reader->Load(nullptr));
@@ -41,19 +38,13 @@ void PrintHeight(const char* file) {
     std::printf("%.3f m\n", static_cast<double>(height));
 }
 
-} // namespace
-
 int main(int argc, char** argv) {
     // An exception of the library has to be caught by its class, across the shared object's border.
     try {
         PrintHeight("no such file");
     } catch (const kelm::DataException&) {
-        try {
-            PrintHeight(argc > 1 ? argv[1] : "");
-            return 0;
-        } catch (const std::exception& failure) {
-            std::fprintf(stderr, "%s\n", failure.what());
-        }
+        PrintHeight(argc > 1 ? argv[1] : "");
+        return 0;
     }
     return 1;
 }

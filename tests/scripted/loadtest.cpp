@@ -81,6 +81,15 @@ TEST_F(ReaderTest, AWildCornerSpoilsNeitherTheWeldingNorTheBase) {
     EXPECT_EQ(welded->GetVertexCount(), 4U);
     for (const int corner : {1, 2})
         EXPECT_EQ(welded->GetTriangle(0)->GetVertex(corner), welded->GetVertex(0));
+    const double side = 0.63 / 1048576; // of a cell of the hash: both corners next to it are one
+    for (const ZARVertex& far : {ZARVertex{1, 0, 0}, {0, 1, 0}, {0, 0, 1}})
+        for (const double low : {side - 5e-11, side + 8.5e-10}) {
+            const double high = 2 * side + 8e-10 - low;
+            script.shapes = {
+                Close({{low * far.x, low * far.y, low * far.z}, {7, 0, 1}, {0, 7, 2}}),
+                Close({{high * far.x, high * far.y, high * far.z}, {8, 0, 1}, {0, 9, 2}})};
+            EXPECT_EQ(Load(*Open())->GetVertexCount(), 5U);
+        }
     script.shapes = {Close({{7, HUGE_VAL, 3}, {100, 200, NaN}, {103, 201, 5}})};
     EXPECT_EQ(Load(*Open())->GetVertex(2)->x, 3.0F);
 }
