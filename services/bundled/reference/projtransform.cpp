@@ -96,8 +96,9 @@ ProjTransform::ProjTransform(const ProjCRS& source, const ProjCRS& target)
 void ProjTransform::ReportOperations() const {
     for (const ProjOperation& operation : moOperations)
         tellus::Report::AddInfo(FormatString(
-            "Heights in %s: '%s', %s; grids: %s%s%s", operation.moAreaName.c_str(),
+            "Heights in %s: '%s', %s%s; grids: %s%s%s", operation.moAreaName.c_str(),
             operation.moName.c_str(), operation.GetAccuracyText().c_str(),
+            operation.IsFine() ? "" : ", which is too coarse",
             operation.moGrids.empty() ? "none" : operation.moGrids.c_str(),
             operation.IsUsable() ? "" : "; not usable without ", operation.moMissingGrids.c_str()));
 }
