@@ -37,6 +37,8 @@ namespace kelm::tellus {
 // characters and a note at 25,000. A text may hold percent signs, so it is never the format.
 
 void Warning::Warn(const std::string& text, const char* sourcePath, unsigned line) {
+    // The last error stays that of the host.
+    const CPLErrorStateBackuper state;
     CPLError(CE_Warning, CPLE_AppDefined, "%s (%s:%u)", text.c_str(), sourcePath, line);
 }
 

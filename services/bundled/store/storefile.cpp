@@ -1,20 +1,72 @@
 #include "services/bundled/store/storefile.h"
 
-#include "services/bundled/store/gdal/confinement.h"
+#include "services/bundled/store/layertype.h"
+#include "services/exception.h"
+#include "services/reporting.h"
 
 #include <utility>
 
 using kelm::store::StoreLayer;
 
+namespace {
+
+constexpr const char* SOURCE = "services/bundled/store/storefile";
+/// A geodatabase can have hundreds of layers.
+constexpr int MOST_NAMED = 10;
+
+} // namespace
+
 _iobuf::_iobuf(std::unique_ptr<kelm::store::Dataset> dataset)
     : mpoDataset(std::move(dataset)), moLayers(mpoDataset->GetLayers().size()) {}
 
+OGRLayer& _iobuf::Get(int segment) const {
+    return *mpoDataset->GetLayers()[static_cast<std::size_t>(segment) - 1];
+}
+
 StoreLayer& _iobuf::GetLayer(int segment) {
-    const auto index = static_cast<std::size_t>(segment) - 1;
-    std::unique_ptr<StoreLayer>& layer = moLayers[index];
+    std::unique_ptr<StoreLayer>& layer = moLayers[static_cast<std::size_t>(segment) - 1];
     if (!layer) {
-        const kelm::store::Confinement confinement;
-        layer = std::make_unique<StoreLayer>(*this, *mpoDataset, *mpoDataset->GetLayers()[index]);
+        layer = std::make_unique<StoreLayer>(*this, *mpoDataset, Get(segment));
+        if (layer->GetSurvey().mnType != 2 || layer->GetSurvey().mnShapes == 0)
+            WarnOfChoice(FormatString("The layer %s of file %s holds no polygons",
+                                      Get(segment).GetName(), mpoDataset->GetName().c_str()));
     }
     return *layer;
+}
+
+int _iobuf::FindFirst() {
+    if (GetLayerCount() == 1)
+        return 1;
+    for (int segment = 1; segment <= GetLayerCount(); ++segment)
+        try {
+            if (HoldsFacets(*mpoDataset, Get(segment)))
+                return segment;
+        } catch (const kelm::DataException&) {
+            return segment; // whoever takes it is told the reason
+        }
+    return 1;
+}
+
+void _iobuf::WarnOfChoice(const std::string& found) {
+    const std::string choice = GetChoice();
+    kelm::tellus::Warning::Warn(
+        found + (choice.empty() ? "; nor does any other layer" : "; those that do: " + choice),
+        SOURCE, __LINE__);
+}
+
+/// @return layers that hold polygons, as "2 (roofs), 3 (walls)"
+std::string _iobuf::GetChoice() {
+    std::string choice;
+    int named = 0;
+    for (int segment = 1; segment <= GetLayerCount() && named < MOST_NAMED; ++segment)
+        try {
+            if (!HoldsFacets(*mpoDataset, Get(segment)))
+                continue;
+            ++named;
+            choice += FormatString("%s%d (%s)", choice.empty() ? "" : ", ", segment,
+                                   Get(segment).GetName());
+        } catch (const kelm::DataException&) {
+            continue; // it is no choice
+        }
+    return choice;
 }

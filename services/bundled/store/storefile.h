@@ -5,6 +5,7 @@
 #include "services/vectorlayer.h"
 
 #include <memory>
+#include <string>
 #include <vector>
 
 /// An open file as the store hands it out: the dataset, and the layers that were taken from it.
@@ -19,8 +20,15 @@ struct _iobuf {
     /// @param segment from 1 to the number of layers. @return the layer, surveyed by the first call
     /// @throw kelm::DataException, see SurveyLayer
     kelm::store::StoreLayer& GetLayer(int segment);
+    /// @return the first layer with polygons, or that cannot be read; 1 if there is none
+    int FindFirst();
+    /// Warns, with the names of layers that hold polygons. @param found what is wrong with another
+    void WarnOfChoice(const std::string& found);
 
   private:
+    OGRLayer& Get(int segment) const;
+    std::string GetChoice();
+
     std::unique_ptr<kelm::store::Dataset> mpoDataset;
     /// Null until the layer is taken. Declared behind the dataset, which must end last.
     std::vector<std::unique_ptr<kelm::store::StoreLayer>> moLayers;

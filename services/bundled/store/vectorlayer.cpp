@@ -1,5 +1,9 @@
 // The vector layer store by GDAL. It reads the formats that files/formats.h lists, and numbers
 // shapes by the rule of shapeids.h. A null layer is refused with a kelm::ParameterException.
+//
+// Segments are the layers that have a geometry, numbered from 1 as they stand in the file. Whoever
+// names none (ZARSegNext behind 0) gets the first that holds polygons, since that is what surfaces
+// are made of; behind another number comes the next one, whatever it holds.
 
 #include "services/vectorlayer.h"
 
@@ -50,9 +54,10 @@ int ZARSegCount(_iobuf* file, int type) {
 }
 
 int ZARSegNext(_iobuf* file, int type, int after) {
-    if (after < 0)
-        after = 0;
-    return after < CountSegments(file, type) ? after + 1 : 0;
+    const int count = CountSegments(file, type);
+    if (after <= 0)
+        return count > 0 ? file->FindFirst() : 0;
+    return after < count ? after + 1 : 0;
 }
 
 ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {

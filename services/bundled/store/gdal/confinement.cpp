@@ -13,6 +13,12 @@ constexpr std::pair<const char*, const char*> SETTINGS[] = {
     {"GML_PARSER", "EXPAT"},
     {"GML_SKIP_RESOLVE_ELEMS", "ALL"},
     {"GML_SKIP_CORRUPTED_FEATURES", "NO"},
+    {"GML_INVERT_AXIS_ORDER_IF_LAT_LONG", "YES"},
+    {"GML_CONSIDER_EPSG_AS_URN", "AUTO"},
+    {"GML_SWAP_COORDINATES", "AUTO"},
+    // Without it the vertical part of a CRS is lost.
+    {"GML_REPORT_COMPD_CS", "YES"},
+    {"OGR_GEOMETRY_ACCEPT_UNCLOSED_RING", "YES"},
     {"OGR_SQLITE_LOAD_EXTENSIONS", ""},
     {"OGR_SQLITE_STATIC_VIRTUAL_OGR", "NO"},
     // Its virtual tables read files that the database names. OGR decodes the geometries itself.
@@ -22,18 +28,16 @@ constexpr std::pair<const char*, const char*> SETTINGS[] = {
 
 } // namespace
 
-Confinement::Confinement() {
-    moSaved.reserve(std::size(SETTINGS));
-    for (const auto& [key, value] : SETTINGS) {
-        const char* old = CPLGetThreadLocalConfigOption(key, nullptr);
-        moSaved.push_back({key, old != nullptr, old ? old : ""});
-        CPLSetThreadLocalConfigOption(key, value);
-    }
+Confinement::Confinement(const char* rings) : moHost(CPLGetThreadLocalConfigOptions(), TRUE) {
+    CPLStringList settings(moHost);
+    for (const auto& [key, value] : SETTINGS)
+        settings.SetNameValue(key, value);
+    settings.SetNameValue("OGR_ORGANIZE_POLYGONS", rings);
+    CPLSetThreadLocalConfigOptions(settings.List());
 }
 
 Confinement::~Confinement() {
-    for (const Saved& saved : moSaved)
-        CPLSetThreadLocalConfigOption(saved.mpszKey, saved.mbSet ? saved.moValue.c_str() : nullptr);
+    CPLSetThreadLocalConfigOptions(moHost.List());
 }
 
 } // namespace kelm::store
