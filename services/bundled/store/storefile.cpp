@@ -27,7 +27,8 @@ StoreLayer& _iobuf::GetLayer(int segment) {
     std::unique_ptr<StoreLayer>& layer = moLayers[static_cast<std::size_t>(segment) - 1];
     if (!layer) {
         layer = std::make_unique<StoreLayer>(*this, *mpoDataset, Get(segment));
-        if (layer->GetSurvey().mnType != 2 || layer->GetSurvey().mnShapes == 0)
+        if (GetLayerCount() > 1 &&
+            (layer->GetSurvey().mnType != 2 || layer->GetSurvey().mnShapes == 0))
             WarnOfChoice(FormatString("The layer %s of file %s holds no polygons",
                                       Get(segment).GetName(), mpoDataset->GetName().c_str()));
     }
@@ -49,9 +50,13 @@ int _iobuf::FindFirst() {
 
 void _iobuf::WarnOfChoice(const std::string& found) {
     const std::string choice = GetChoice();
-    kelm::tellus::Warning::Warn(
-        found + (choice.empty() ? "; nor does any other layer" : "; those that do: " + choice),
-        SOURCE, __LINE__);
+    if (!choice.empty())
+        kelm::tellus::Warning::Warn(found + "; layers with polygons: " + choice, SOURCE, __LINE__);
+}
+
+void _iobuf::WarnOfNumber(int segment) {
+    WarnOfChoice(
+        FormatString("The file %s has no layer %d", mpoDataset->GetName().c_str(), segment));
 }
 
 /// @return layers that hold polygons, as "2 (roofs), 3 (walls)"

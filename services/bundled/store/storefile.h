@@ -22,10 +22,11 @@ struct _iobuf {
     kelm::store::StoreLayer& GetLayer(int segment);
     /// @return the first layer with polygons, or that cannot be read; 1 if there is none
     int FindFirst();
-    /// Warns, with the names of layers that hold polygons. @param found what is wrong with another
-    void WarnOfChoice(const std::string& found);
+    /// Warns that there is no such layer, if any hold polygons, and names these.
+    void WarnOfNumber(int segment);
 
   private:
+    void WarnOfChoice(const std::string& found);
     OGRLayer& Get(int segment) const;
     std::string GetChoice();
 

@@ -61,8 +61,12 @@ int ZARSegNext(_iobuf* file, int type, int after) {
 }
 
 ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {
-    if (segment < 1 || segment > CountSegments(file, ZAR_SEGMENT_VECTOR))
+    if (file == nullptr)
         return nullptr;
+    if (segment < 1 || segment > file->GetLayerCount()) {
+        file->WarnOfNumber(segment);
+        return nullptr;
+    }
     return &file->GetLayer(segment);
 }
 

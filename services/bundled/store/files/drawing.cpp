@@ -5,22 +5,21 @@
 
 #include <cpl_string.h>
 
+#include <algorithm>
+#include <charconv>
+#include <cstddef>
+#include <string_view>
+#include <system_error>
+#include <utility>
 #include <vector>
 
 namespace kelm::store {
 
 namespace {
 
-constexpr int END = -1;
-/// Longer than any text that is compared.
-constexpr std::size_t KEPT = 32;
-constexpr const char* BINARY_MARK = "AutoCAD Binary DXF";
+constexpr std::string_view BINARY_MARK = "AutoCAD Binary DXF";
+constexpr std::string_view BYTE_ORDER_MARK = "\xEF\xBB\xBF";
 constexpr int COMMENT = 999;
-
-/// 26 ended texts in old systems.
-bool IsBlank(int byte) {
-    return byte == ' ' || byte == '\t' || byte == 26;
-}
 
 /// The lines of a file, as GDAL parts them: at CR, LF, CR LF or LF CR.
 class LineReader {
@@ -29,69 +28,110 @@ class LineReader {
 
     /// Reads the next line. @return false behind the last one
     bool Next();
-    /// @return the beginning of the line, without the blanks around it
-    const std::string& GetText() const { return moText; }
+    /// @return the line without the blanks around it, good until the next call of Next; of a very
+    /// long one not all
+    std::string_view GetText() const;
     long long GetNumber() const { return mnNumber; }
     bool HasZeroByte() const { return mbZeroByte; }
     /// @return true if a carriage return ends the line and the file
-    bool EndsInReturn() const { return mbReturn && mbLast; }
+    bool EndsInReturn() const { return mbEndsInReturn; }
 
   private:
     static constexpr std::size_t BUFFER = 1 << 16;
+    static constexpr std::size_t KEPT = 1 << 10;
 
-    int Peek();
-    void EndLine(int end);
+    std::size_t FindBreak(std::size_t at) const;
+    bool Refill(std::size_t& rAt);
+    std::size_t ScanLine();
+    void EndLine(std::size_t at);
 
     VSILFILE& mrFile;
     std::vector<char> moBuffer;
-    std::size_t mnNext = 0;
+    std::size_t mnLine = 0; ///< where the line begins in the buffer
+    std::size_t mnSize = 0; ///< of the line
+    std::size_t mnNext = 0; ///< where the next one begins
     std::size_t mnFilled = 0;
-    std::string moText;
     long long mnNumber = 0;
     bool mbZeroByte = false;
-    bool mbReturn = false;
-    bool mbLast = false;
+    bool mbEndsInReturn = false;
 };
 
-/// @return the next byte, which stays the next one, or END
-int LineReader::Peek() {
-    if (mnNext == mnFilled) {
-        mnNext = 0;
-        mnFilled = VSIFReadL(moBuffer.data(), 1, moBuffer.size(), &mrFile);
-        if (mnFilled == 0)
-            return END;
+/// @return the place of the next line end or zero byte, or the end of what is read
+std::size_t LineReader::FindBreak(std::size_t at) const {
+    const char* const bytes = moBuffer.data();
+    for (; at < mnFilled; ++at)
+        if (static_cast<unsigned char>(bytes[at]) <= '\r' &&
+            (bytes[at] == '\n' || bytes[at] == '\r' || bytes[at] == 0))
+            break;
+    return at;
+}
+
+/// Reads on, with the bytes from the beginning of the line kept. @param rAt a place behind that
+/// beginning, which moves with the bytes. @return false at the end of the file
+bool LineReader::Refill(std::size_t& rAt) {
+    std::copy(moBuffer.begin() + static_cast<std::ptrdiff_t>(mnLine),
+              moBuffer.begin() + static_cast<std::ptrdiff_t>(mnFilled), moBuffer.begin());
+    rAt -= mnLine;
+    mnFilled -= std::exchange(mnLine, 0);
+    if (mnFilled == moBuffer.size())
+        rAt = mnFilled = KEPT;
+    const std::size_t count =
+        VSIFReadL(moBuffer.data() + mnFilled, 1, moBuffer.size() - mnFilled, &mrFile);
+    mnFilled += count;
+    return count > 0;
+}
+
+/// @return the place of the line end, or the end of the file
+std::size_t LineReader::ScanLine() {
+    std::size_t at = FindBreak(mnLine);
+    while ((at < mnFilled && moBuffer[at] == 0) || (at == mnFilled && Refill(at))) {
+        if (at < mnFilled && moBuffer[at] == 0) {
+            mbZeroByte = true;
+            ++at;
+        }
+        at = FindBreak(at);
     }
-    return static_cast<unsigned char>(moBuffer[mnNext]);
+    return at;
 }
 
 bool LineReader::Next() {
-    if (Peek() == END)
+    mnLine = mnNext;
+    mbZeroByte = false;
+    const std::size_t end = ScanLine();
+    if (mnLine == mnFilled)
         return false;
     ++mnNumber;
-    moText.clear();
-    mbZeroByte = false;
-    int byte = Peek();
-    for (; byte != END && byte != '\n' && byte != '\r'; byte = Peek()) {
-        ++mnNext;
-        mbZeroByte = mbZeroByte || byte == 0;
-        if (moText.size() < KEPT && !(moText.empty() && IsBlank(byte)))
-            moText.push_back(static_cast<char>(byte));
-    }
-    EndLine(byte);
-    while (!moText.empty() && IsBlank(moText.back()))
-        moText.pop_back();
+    EndLine(end);
     return true;
 }
 
-void LineReader::EndLine(int end) {
-    if (end != END)
-        ++mnNext;
-    const int partner = end == '\r' ? '\n' : '\r';
-    const bool pair = end != END && Peek() == partner;
-    if (pair)
-        ++mnNext;
-    mbReturn = end == '\r' && !pair;
-    mbLast = Peek() == END;
+void LineReader::EndLine(std::size_t at) {
+    while (mnFilled - at < 3 && Refill(at))
+        continue;
+    mnSize = at - mnLine;
+    const auto peek = [this](std::size_t place) {
+        return place < mnFilled ? moBuffer[place] : '\0';
+    };
+    const char end = peek(at);
+    const bool pair = peek(at + 1) == (end == '\r' ? '\n' : '\r');
+    mnNext = std::min(mnFilled, at + (pair ? 2 : 1));
+    mbEndsInReturn = end == '\r' && !pair && mnNext == mnFilled;
+}
+
+std::string_view LineReader::GetText() const {
+    // 26 ended texts in old systems.
+    constexpr std::string_view BLANKS = " \t\x1a";
+    std::string_view text(moBuffer.data() + mnLine, mnSize);
+    text.remove_prefix(std::min(text.size(), text.find_first_not_of(BLANKS)));
+    return text.substr(0, text.find_last_not_of(BLANKS) + 1);
+}
+
+bool StartsWith(std::string_view text, std::string_view start) {
+    return text.substr(0, start.size()) == start;
+}
+
+bool IsWord(std::string_view text, const char* word) {
+    return EQUAL(std::string(text).c_str(), word);
 }
 
 /// Follows the pairs of a group code and a value.
@@ -129,21 +169,18 @@ bool DrawingTest::Fail(const char* found) {
 bool DrawingTest::ReadCode() {
     if (!moLines.Next())
         return false;
-    const std::string& text = moLines.GetText();
-    if (moLines.GetNumber() == 1 && STARTS_WITH(text.c_str(), BINARY_MARK))
-        return Fail("the drawing is a binary one, only those of text are read");
     if (moLines.HasZeroByte())
         return Fail("it holds a zero byte");
+    std::string_view text = moLines.GetText();
     if (text.empty())
         return SkipBlankEnd();
-    constexpr const char* BYTE_ORDER_MARK = "\xEF\xBB\xBF";
-    const std::size_t from = STARTS_WITH(text.c_str(), BYTE_ORDER_MARK) ? 3 : 0;
-    const std::size_t digits = text.find_first_not_of(' ', from);
-    const std::size_t sign = text.find_first_of("+-", digits) == digits ? 1 : 0;
-    if (text.size() == digits + sign ||
-        text.find_first_not_of("0123456789", digits + sign) != std::string::npos)
+    if (moLines.GetNumber() == 1 && StartsWith(text, BINARY_MARK))
+        return Fail("the drawing is a binary one, only those of text are read");
+    if (moLines.GetNumber() == 1 && StartsWith(text, BYTE_ORDER_MARK))
+        text.remove_prefix(BYTE_ORDER_MARK.size());
+    const auto [end, error] = std::from_chars(text.data(), text.data() + text.size(), mnCode);
+    if (error != std::errc() || end != text.data() + text.size())
         return Fail("a group code must be a whole number");
-    mnCode = std::atoi(text.c_str() + digits);
     return true;
 }
 
@@ -169,10 +206,14 @@ bool DrawingTest::ReadValue() {
 bool DrawingTest::IsAtEnd() {
     if (mnCode == COMMENT)
         return false;
-    const char* value = moLines.GetText().c_str();
-    mbEntities = mbEntities || (mbSection && mnCode == 2 && EQUAL(value, "ENTITIES"));
-    mbSection = mnCode == 0 && EQUAL(value, "SECTION");
-    return mnCode == 0 && ((mbEntities && EQUAL(value, "ENDSEC")) || EQUAL(value, "EOF"));
+    const bool section = std::exchange(mbSection, false);
+    if (mnCode == 2 && section)
+        mbEntities = mbEntities || IsWord(moLines.GetText(), "ENTITIES");
+    if (mnCode != 0)
+        return false;
+    const std::string_view value = moLines.GetText();
+    mbSection = IsWord(value, "SECTION");
+    return (mbEntities && IsWord(value, "ENDSEC")) || IsWord(value, "EOF");
 }
 
 } // namespace

@@ -1,8 +1,11 @@
 #include "services/bundled/store/files/formats.h"
 
+#include <cpl_conv.h>
+#include <cpl_string.h>
 #include <gdal_priv.h>
 #include <ogrsf_frmts.h>
 
+#include <cstring>
 #include <mutex>
 
 // A GDAL without one of these drivers, or with one as a plugin, still links.
@@ -19,15 +22,22 @@ namespace kelm::store {
 
 namespace {
 
-/// @return true if a driver was missing
-bool Register(const Format& format) {
-    if (GetGDALDriverManager()->GetDriverByName(format.mpszDriver) != nullptr)
-        return false;
+/// @return true if the host has said that this driver is not to be used
+bool IsSkipped(const char* driver) {
+    const char* const names = CPLGetConfigOption("GDAL_SKIP", "");
+    const CPLStringList skipped(CSLTokenizeString2(names, std::strchr(names, ',') ? "," : " ", 0));
+    const CPLStringList others(CSLTokenizeString2(CPLGetConfigOption("OGR_SKIP", ""), ",", 0));
+    return skipped.FindString(driver) >= 0 || others.FindString(driver) >= 0;
+}
+
+void Register(const Format& format) {
+    if (GetGDALDriverManager()->GetDriverByName(format.mpszDriver) != nullptr ||
+        IsSkipped(format.mpszDriver))
+        return;
     if (format.mpfnRegister != nullptr)
         format.mpfnRegister();
     else
         GDALAllRegister(); // loads plugins
-    return true;
 }
 
 } // namespace
@@ -80,11 +90,8 @@ std::string GetFormatNames() {
 void RegisterFormats() {
     static std::mutex mutex;
     const std::lock_guard<std::mutex> lock(mutex);
-    bool added = false;
     for (const Format& format : GetFormats())
-        added = Register(format) || added;
-    if (added)
-        GetGDALDriverManager()->AutoSkipDrivers();
+        Register(format);
 }
 
 } // namespace kelm::store

@@ -97,7 +97,12 @@ std::string FindFaultBehind(const Format& format, GDALDataset& handle,
                             const std::string& gdalName) {
     if (format.Has(FT_Pages))
         return FindPageFault(handle, gdalName);
-    return EQUAL(format.mpszDriver, "ESRI Shapefile") ? FindShapefileFault(handle) : "";
+    if (!EQUAL(format.mpszDriver, "ESRI Shapefile"))
+        return {};
+    if (HasUnreadCrs(handle))
+        CPLError(CE_Warning, CPLE_AppDefined,
+                 "the .prj cannot be read, so the file counts as one without a CRS");
+    return FindShapefileFault(handle);
 }
 
 /// @return true if rows may stand in a log beside the database

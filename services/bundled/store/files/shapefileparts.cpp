@@ -5,6 +5,7 @@
 
 #include <cpl_conv.h>
 #include <gdal_priv.h>
+#include <ogrsf_frmts.h>
 
 #include <algorithm>
 #include <cstdint>
@@ -123,6 +124,14 @@ std::string FindShapefileFault(GDALDataset& handle) {
     if (fault.empty() && !table.empty())
         fault = TestTable(Part(table), listed);
     return fault;
+}
+
+bool HasUnreadCrs(GDALDataset& handle) {
+    OGRLayer* const layer = handle.GetLayer(0);
+    if (!layer || layer->GetSpatialRef())
+        return false;
+    const std::string shapes = FindFile(CPLStringList(handle.GetFileList(), TRUE), "shp");
+    return OpenVsiFile(CPLResetExtension(shapes.c_str(), "prj")) != nullptr;
 }
 
 } // namespace kelm::store

@@ -11,4 +11,7 @@ namespace kelm::store {
 /// @return what is wrong, if records would be left out; else empty
 std::string FindShapefileFault(GDALDataset& handle);
 
+/// @return true if there is a CRS (.prj) that cannot be read. GDAL says nothing of it.
+bool HasUnreadCrs(GDALDataset& handle);
+
 } // namespace kelm::store
