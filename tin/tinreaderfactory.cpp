@@ -22,16 +22,23 @@ using OpenFile = std::unique_ptr<_iobuf, FileCloser>;
 #define THROW_DATA_EXCEPTION(text)                                                                 \
     throw DataException(text, "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__)
 
-/// The message is the same whatever went wrong; the store's own reason goes to the report.
+/// The message is the same whatever went wrong; the exception of the store is nested in it. To be
+/// called where that exception is being handled.
+[[noreturn]] void ThrowUnsupported(const char* pszFilename) {
+    std::throw_with_nested(
+        DataException(FormatString("The format of file %s is not supported by ZAR", pszFilename),
+                      "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__));
+}
+
 _iobuf* Open(const char* pszFilename) {
     try {
         return ZAROpen(pszFilename, "r");
     } catch (const std::exception& reason) {
         tellus::Report::AddInfo(reason.what());
+        ThrowUnsupported(pszFilename);
     } catch (...) {
+        ThrowUnsupported(pszFilename);
     }
-    THROW_DATA_EXCEPTION(
-        FormatString("The format of file %s is not supported by ZAR", pszFilename));
 }
 
 /// A height of such a factor would be none, and no later step could tell.

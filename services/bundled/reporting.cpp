@@ -101,12 +101,16 @@ namespace kelm::tellus {
 // characters and a note at 25,000. A text may hold percent signs, so it is never the format.
 
 void Warning::Warn(const std::string& text, const char* sourcePath, unsigned line) {
-    if (const std::int64_t number = Count({sourcePath, line}))
-        CPLError(CE_Warning, CPLE_AppDefined, "%s%s (%s:%u)", text.c_str(), GetNote(number),
-                 sourcePath, line);
+    const std::int64_t number = Count({sourcePath, line});
+    if (number == 0)
+        return;
+    const CPLErrorStateBackuper state; // the last error stays that of the host
+    CPLError(CE_Warning, CPLE_AppDefined, "%s%s (%s:%u)", text.c_str(), GetNote(number), sourcePath,
+             line);
 }
 
 void TellLeftOut() noexcept try {
+    const CPLErrorStateBackuper state;
     for (const auto& [kind, repeats] : TakeRepeats())
         if (repeats.mnLeftOut > 0)
             CPLError(CE_Warning, CPLE_AppDefined,

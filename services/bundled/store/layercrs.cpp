@@ -1,6 +1,5 @@
 #include "services/bundled/store/layercrs.h"
 
-#include "services/bundled/store/gdal/confinement.h"
 #include "services/bundled/store/gdal/gdalcall.h"
 #include "services/bundled/undefinedcrs.h"
 #include "services/exception.h"
@@ -17,10 +16,23 @@ namespace {
 
 constexpr const char* SOURCE = "services/bundled/store/layercrs";
 
+/// The store delivers x as easting or longitude. Drivers turn coordinates to that order, and tell
+/// so.
+void TestAxes(const OGRSpatialReference& crs, const std::string& subject) {
+    OGRSpatialReference turned(crs);
+    turned.SetAxisMappingStrategy(OAMS_TRADITIONAL_GIS_ORDER);
+    if (turned.GetDataAxisToSRSAxisMapping() != crs.GetDataAxisToSRSAxisMapping())
+        throw DataException(FormatString("The coordinates of the %s do not stand in the order "
+                                         "easting, northing",
+                                         subject.c_str()),
+                            SOURCE, __PRETTY_FUNCTION__, __LINE__);
+}
+
 std::string WriteText(const OGRSpatialReference& crs, const std::string& subject,
                       const GdalCall& call) {
     if (crs.IsEmpty() || services::IsUndefinedCRS(crs.GetName()))
         return {};
+    TestAxes(crs, subject);
     const char* const options[] = {"MULTILINE=NO", nullptr};
     char* raw = nullptr;
     const OGRErr error = crs.exportToPROJJSON(&raw, options);
@@ -39,7 +51,6 @@ std::string ReadCrsText(OGRLayer& layer, const std::string& subject) {
     Warnings warnings;
     {
         GdalCall call;
-        const Confinement confinement;
         if (const OGRSpatialReference* crs = layer.GetSpatialRef())
             text = WriteText(*crs, subject, call);
         warnings = call.TakeWarnings();

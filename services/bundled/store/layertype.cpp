@@ -43,4 +43,15 @@ int LayerType::Get(OGRLayer& layer) const {
     return mbPoints ? POINTS : GetDeclaredType(layer);
 }
 
+bool HoldsFacets(Dataset& dataset, OGRLayer& layer) {
+    if (GetDeclaredType(layer) != FACETS)
+        return false;
+    LayerWalk walk(dataset, layer);
+    LayerType type;
+    walk.Restart();
+    while (!type.HasFacets() && walk.Advance())
+        type.Add(walk.GetFacet().meFault);
+    return type.HasFacets();
+}
+
 } // namespace kelm::store

@@ -1,6 +1,10 @@
 // The vector layer store. GDAL reads the formats that files/formats.h lists, and shapeids.h tells
 // how their shapes are numbered; landxml/ reads LandXML. A null layer is refused with a
 // kelm::ParameterException.
+//
+// Segments are the layers that have a geometry, numbered from 1 as they stand in the file. Whoever
+// names none (ZARSegNext behind 0) gets the first that holds polygons, since that is what surfaces
+// are made of; behind another number comes the next one, whatever it holds.
 
 #include "services/vectorlayer.h"
 
@@ -70,14 +74,19 @@ int ZARSegCount(_iobuf* file, int type) {
 }
 
 int ZARSegNext(_iobuf* file, int type, int after) {
-    if (after < 0)
-        after = 0;
-    return after < CountSegments(file, type) ? after + 1 : 0;
+    const int count = CountSegments(file, type);
+    if (after <= 0)
+        return count > 0 ? file->FindFirst() : 0;
+    return after < count ? after + 1 : 0;
 }
 
 ZARLayer_t* ZARGetLayer(_iobuf* file, int segment) {
-    if (segment < 1 || segment > CountSegments(file, ZAR_SEGMENT_VECTOR))
+    if (file == nullptr)
         return nullptr;
+    if (segment < 1 || segment > file->GetLayerCount()) {
+        file->WarnOfNumber(segment);
+        return nullptr;
+    }
     return &file->GetLayer(segment);
 }
 

@@ -3,8 +3,6 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 
-#include <cpl_error.h>
-
 #include <utility>
 
 namespace kelm::store {
@@ -39,16 +37,38 @@ std::size_t CountBytes(const OGRFeature& feature) {
 FeatureReader::FeatureReader(Dataset& dataset, OGRLayer& layer)
     : moDataset(dataset), moLayer(layer),
       moSubject(FormatString("layer %s of file %s", layer.GetName(), dataset.GetName().c_str())) {
-    Warnings warnings;
-    {
-        GdalCall call;
-        IgnoreAttributes(layer);
-        if (dataset.GetFormat().mbExactCount)
-            mnKnown = layer.GetFeatureCount(FALSE);
-        TestCall(call);
-        warnings = call.TakeWarnings();
-    }
-    PassOn(warnings, "The " + moSubject);
+    Prepare(ReadCrs());
+    PassOn(std::exchange(moWarnings, {}), "The " + moSubject);
+}
+
+/// Drivers read the CRS of a layer when they are first asked about the layer. One that cannot be
+/// read is no reason to refuse the layer. @return false if something could not be read
+bool FeatureReader::ReadCrs() {
+    GdalCall call;
+    static_cast<void>(moLayer.GetSpatialRef());
+    moWarnings = call.TakeWarnings();
+    if (!call.HasFailed())
+        return true;
+    AddWarning(moWarnings,
+               "its CRS cannot be read, so it counts as a layer without one: " + call.GetFailures(),
+               1);
+    return false;
+}
+
+/// @param sound if false, the features are counted: a layer of which more than the CRS cannot be
+/// read must not pass for an empty one
+void FeatureReader::Prepare(bool sound) {
+    GdalCall call;
+    IgnoreAttributes(moLayer);
+    if (!sound || moDataset.GetFormat().Has(FT_ExactCount))
+        mnKnown = moLayer.GetFeatureCount(sound ? FALSE : TRUE);
+    TestFailure(call.TakeFailures());
+    AddWarnings(call);
+}
+
+void FeatureReader::AddWarnings(GdalCall& call) {
+    for (const auto& [text, times] : call.TakeWarnings())
+        AddWarning(moWarnings, text, times);
 }
 
 void FeatureReader::Restart() {
@@ -56,6 +76,7 @@ void FeatureReader::Restart() {
     moFeatures.clear();
     mnNext = 0;
     mnRead = 0;
+    mnSkipped = 0;
     moWarnings.clear();
 }
 
@@ -72,53 +93,81 @@ Warnings FeatureReader::TakeWarnings() {
 void FeatureReader::ReadAhead() {
     moFeatures.clear();
     mnNext = 0;
-    GdalCall call;
+    moFailure.clear();
+    moWarnings.clear();
+    GdalCall call(moDataset.GetFormat().mpszRings);
     if (!moDataset.IsTurnOf(*this))
-        TakeTurn();
-    FetchBatch();
-    moWarnings = call.TakeWarnings();
-    TestCall(call);
+        TakeTurn(call);
+    FetchBatch(call);
+    AddWarnings(call);
+    TestFailure(moFailure);
 }
 
-void FeatureReader::FetchBatch() {
-    for (std::size_t bytes = 0; moFeatures.size() < MOST_AHEAD && bytes < MOST_BYTES_AHEAD;) {
-        Fetch();
-        if (!moFeatures.back())
-            return TestEnd();
-        bytes += CountBytes(*moFeatures.back());
-    }
-}
-
-void FeatureReader::TestCall(const GdalCall& call) const {
-    if (call.HasFailed())
+void FeatureReader::TestFailure(const std::string& failures) const {
+    if (!failures.empty())
         throw DataException(FormatString("The %s cannot be read, near feature number %lld: %s",
                                          moSubject.c_str(), static_cast<long long>(mnRead),
-                                         call.GetFailures().c_str()),
+                                         failures.c_str()),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
 }
 
-void FeatureReader::TakeTurn() {
+void FeatureReader::TakeTurn(GdalCall& call) {
     moDataset.TakeTurn(*this);
     moLayer.ResetReading();
     const std::int64_t known = std::exchange(mnRead, 0);
-    while (mnRead < known) {
-        Fetch();
-        if (!moFeatures.back())
-            break;
+    mnSkipped = 0;
+    while (mnRead < known && Fetch(call) != nullptr)
         moFeatures.clear();
+}
+
+void FeatureReader::FetchBatch(GdalCall& call) {
+    for (std::size_t bytes = 0; moFeatures.size() < MOST_AHEAD && bytes < MOST_BYTES_AHEAD;) {
+        const OGRFeature* feature = Fetch(call);
+        if (feature == nullptr)
+            return;
+        bytes += CountBytes(*feature);
     }
 }
 
-void FeatureReader::TestEnd() const {
-    if (mnKnown >= 0 && mnRead != mnKnown)
-        CPLError(CE_Failure, CPLE_FileIO, "the file ends early, it should have %lld features",
-                 static_cast<long long>(mnKnown));
+/// @return the next feature, which is kept, or null behind the last one or if the reading fails
+const OGRFeature* FeatureReader::Fetch(GdalCall& call) {
+    OGRFeatureUniquePtr feature(moLayer.GetNextFeature());
+    std::string failures = call.TakeFailures();
+    while (!feature && !failures.empty() && SkipsDamaged()) {
+        ++mnSkipped;
+        AddWarning(moWarnings, "a feature cannot be read: " + failures, 1);
+        feature.reset(moLayer.GetNextFeature());
+        failures = call.TakeFailures();
+    }
+    mnRead += feature != nullptr;
+    if (!feature)
+        TestEnd(failures);
+    else if (!failures.empty())
+        MarkDamage(*feature, failures);
+    moFeatures.push_back(std::move(feature));
+    return moFeatures.back().get();
 }
 
-void FeatureReader::Fetch() {
-    OGRFeatureUniquePtr feature(moLayer.GetNextFeature());
-    moFeatures.push_back(std::move(feature));
-    mnRead += moFeatures.back() != nullptr;
+/// The number of features bounds the reading: a driver could fail for ever.
+bool FeatureReader::SkipsDamaged() const {
+    return moDataset.GetFormat().Has(FT_SkipsDamaged) && mnRead + mnSkipped < mnKnown;
+}
+
+void FeatureReader::MarkDamage(OGRFeature& feature, const std::string& failures) {
+    if (moDataset.GetFormat().Has(FT_ReadsAhead))
+        return AddWarning(moWarnings, failures, 1);
+    feature.SetGeometryDirectly(nullptr);
+    AddWarning(moWarnings,
+               FormatString("feature %lld cannot be read: %s",
+                            static_cast<long long>(feature.GetFID()), failures.c_str()),
+               1);
+}
+
+void FeatureReader::TestEnd(const std::string& failures) {
+    moFailure = failures;
+    if (mnKnown >= 0 && mnRead + mnSkipped != mnKnown)
+        moFailure += FormatString("%sthe file ends early, it should have %lld features",
+                                  failures.empty() ? "" : "; ", static_cast<long long>(mnKnown));
 }
 
 } // namespace kelm::store

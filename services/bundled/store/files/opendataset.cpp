@@ -1,10 +1,12 @@
 #include "services/bundled/store/files/opendataset.h"
 
-#include "services/bundled/store/gdal/confinement.h"
+#include "services/bundled/store/files/drawing.h"
+#include "services/bundled/store/files/shapefileparts.h"
 #include "services/bundled/store/gdal/gdalcall.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
+#include <cpl_string.h>
 #include <ogrsf_frmts.h>
 
 #include <cerrno>
@@ -71,34 +73,80 @@ int ReadPageSize(GDALDataset& handle) {
     return size;
 }
 
-/// @return true, with an error as a driver would give it, if a database ends within a page
-bool IsTorn(GDALDataset& handle, const Format& format, const std::string& gdalName) {
+/// @return what is wrong if a database ends within a page; else empty
+std::string FindPageFault(GDALDataset& handle, const std::string& gdalName) {
     VSIStatBufL status;
-    if (!format.mbPages || VSIStatL(gdalName.c_str(), &status) != 0)
-        return false;
+    if (VSIStatL(gdalName.c_str(), &status) != 0)
+        return {};
     const int size = ReadPageSize(handle);
-    if (size <= 0 || status.st_size % size == 0)
-        return false;
-    CPLError(CE_Failure, CPLE_FileIO, "the file ends within a page of the database");
-    return true;
+    return size <= 0 || status.st_size % size == 0 ? ""
+                                                   : "the file ends within a page of the database";
+}
+
+/// @return what is wrong with a file that a driver is about to open; else empty
+std::string FindFaultBefore(const Format& format, const std::string& gdalName) {
+    const char* const drivers[] = {format.mpszDriver, nullptr};
+    if (!EQUAL(format.mpszDriver, "DXF") ||
+        !GDALIdentifyDriverEx(gdalName.c_str(), GDAL_OF_VECTOR, drivers, nullptr))
+        return {};
+    return FindDrawingFault(gdalName);
+}
+
+/// @return what is wrong with a file that a driver has opened; else empty
+std::string FindFaultBehind(const Format& format, GDALDataset& handle,
+                            const std::string& gdalName) {
+    if (format.Has(FT_Pages))
+        return FindPageFault(handle, gdalName);
+    if (!EQUAL(format.mpszDriver, "ESRI Shapefile"))
+        return {};
+    if (HasUnreadCrs(handle))
+        CPLError(CE_Warning, CPLE_AppDefined,
+                 "the .prj cannot be read, so the file counts as one without a CRS");
+    return FindShapefileFault(handle);
+}
+
+/// @return true if rows may stand in a log beside the database
+bool HasLog(const std::string& gdalName) {
+    VSIStatBufL status;
+    return VSIStatL((gdalName + "-wal").c_str(), &status) == 0 && status.st_size > 0;
 }
 
 GDALDatasetUniquePtr OpenAs(const Format& format, const std::string& gdalName) {
     const char* const drivers[] = {format.mpszDriver, nullptr};
-    return GDALDatasetUniquePtr(GDALDataset::Open(gdalName.c_str(),
-                                                  GDAL_OF_VECTOR | GDAL_OF_READONLY, drivers,
-                                                  format.moOptions.data(), nullptr));
+    CPLStringList options(CSLDuplicate(const_cast<char**>(format.moOptions.data())), TRUE);
+    // Where SQLite cannot share the log, GDAL would open the database without it.
+    if (format.Has(FT_Pages) && HasLog(gdalName))
+        options.SetNameValue("IMMUTABLE", "NO");
+    return GDALDatasetUniquePtr(GDALDataset::Open(
+        gdalName.c_str(), GDAL_OF_VECTOR | GDAL_OF_READONLY, drivers, options.List(), nullptr));
 }
 
-/// @return the dataset, or null if no format takes the file or the file is torn
-std::unique_ptr<Dataset> OpenAsAny(const std::string& gdalName, const std::string& shownName) {
-    for (const Format& format : GetFormats())
-        if (GDALDatasetUniquePtr handle = OpenAs(format, gdalName)) {
-            if (IsTorn(*handle, format, gdalName))
-                return nullptr;
-            return std::make_unique<Dataset>(shownName, format, std::move(handle));
-        }
+/// @param fault what is wrong with the file, if a test finds it. @return the dataset, or null if no
+/// format takes the file or there is a fault
+std::unique_ptr<Dataset> OpenAsAny(const std::string& gdalName, const std::string& shownName,
+                                   std::string& fault) {
+    for (const Format& format : GetFormats()) {
+        fault = FindFaultBefore(format, gdalName);
+        if (!fault.empty())
+            return nullptr;
+        GDALDatasetUniquePtr handle = OpenAs(format, gdalName);
+        if (!handle)
+            continue;
+        fault = FindFaultBehind(format, *handle, gdalName);
+        if (!fault.empty())
+            return nullptr;
+        return std::make_unique<Dataset>(shownName, format, std::move(handle));
+    }
     return nullptr;
+}
+
+/// @return the formats that this GDAL does not read, for a message; empty if it reads them all
+std::string GetMissingNames() {
+    std::string names;
+    for (const Format& format : GetFormats())
+        if (GetGDALDriverManager()->GetDriverByName(format.mpszDriver) == nullptr)
+            names.append(names.empty() ? "" : ", ").append(format.mpszName);
+    return names.empty() ? names : " (this GDAL has no driver for " + names + ")";
 }
 
 } // namespace
@@ -123,15 +171,18 @@ std::unique_ptr<Dataset> OpenDataset(const std::string& gdalName, const std::str
     std::unique_ptr<Dataset> dataset;
     Warnings warnings;
     std::string failures;
+    std::string fault;
     {
         GdalCall call;
-        const Confinement confinement;
-        dataset = OpenAsAny(gdalName, shownName);
+        dataset = OpenAsAny(gdalName, shownName, fault);
         warnings = call.TakeWarnings();
-        failures = call.GetFailures();
+        failures = call.TakeFailures();
     }
+    if (!dataset && !fault.empty())
+        ThrowUnusable(shownName, fault, __LINE__);
     if (!dataset)
-        ThrowUnusable(shownName, failures.empty() ? "none of them" : failures, __LINE__);
+        ThrowUnusable(shownName, failures.empty() ? "none of them" + GetMissingNames() : failures,
+                      __LINE__);
     if (!failures.empty())
         AddWarning(warnings, failures, 1);
     PassOn(warnings, "The file " + shownName);

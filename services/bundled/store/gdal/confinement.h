@@ -1,27 +1,24 @@
 #pragma once
 
-#include <string>
-#include <vector>
+#include <cpl_string.h>
 
 namespace kelm::store {
 
-/// Settings that let GDAL read no file but the one it opens, and write none beside it. They hold on
-/// this thread while the object lives, whatever the host has set.
+/// Settings of GDAL that hold on this thread while the object lives, whatever the host has set.
+/// GDAL then reads no file but the one it opens, writes none beside it, and takes coordinates,
+/// rings and CRSs of a file the same way everywhere. The host's own settings of the thread come
+/// back with the end of the object.
 class Confinement {
   public:
-    Confinement();
+    /// @param rings how the rings of a polygon are sorted into outer and inner ones: a value of
+    /// GDAL's OGR_ORGANIZE_POLYGONS, or "" for the driver's own way
+    explicit Confinement(const char* rings);
     ~Confinement();
     Confinement(const Confinement&) = delete;
     Confinement& operator=(const Confinement&) = delete;
 
   private:
-    /// What a setting was before.
-    struct Saved {
-        const char* mpszKey;
-        bool mbSet;
-        std::string moValue;
-    };
-    std::vector<Saved> moSaved;
+    CPLStringList moHost;
 };
 
 } // namespace kelm::store

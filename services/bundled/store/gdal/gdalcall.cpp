@@ -3,7 +3,6 @@
 #include "services/bundled/store/gdal/advice.h"
 
 #include <cpl_conv.h>
-#include <cpl_error.h>
 #include <cpl_http.h>
 
 namespace kelm::store {
@@ -29,7 +28,7 @@ CPLHTTPResult* Refuse(const char*, CSLConstList, GDALProgressFunc, void*, CPLHTT
 
 } // namespace
 
-GdalCall::GdalCall() {
+GdalCall::GdalCall(const char* rings) : moConfinement(rings) {
     CPLPushErrorHandlerEx(Keep, this);
     CPLSetCurrentErrorHandlerCatchDebug(FALSE);
     CPLHTTPPushFetchCallback(Refuse, nullptr);
@@ -38,6 +37,13 @@ GdalCall::GdalCall() {
 GdalCall::~GdalCall() {
     CPLHTTPPopFetchCallback();
     CPLPopErrorHandler();
+}
+
+std::string GdalCall::TakeFailures() {
+    if (!std::exchange(mbFailed, false))
+        return {};
+    std::string failures = std::exchange(moFailures, {});
+    return failures.empty() ? "an error without a text" : failures;
 }
 
 void GdalCall::Add(bool failure, const char* text) noexcept {

@@ -15,4 +15,8 @@ struct _iobuf {
     /// @param segment from 1 to the number of layers. @return the layer, owned by the file
     /// @throw kelm::DataException if the layer cannot be read
     virtual kelm::store::OpenLayer& GetLayer(int segment) = 0;
+    /// @return the first layer with polygons, or that cannot be read; 1 if there is none
+    virtual int FindFirst() { return 1; }
+    /// Warns that there is no such layer, if any hold polygons, and names these.
+    virtual void WarnOfNumber(int /*segment*/) {}
 };

@@ -1,6 +1,5 @@
 #include "services/bundled/store/landxml/documentcrs.h"
 
-#include "services/bundled/store/gdal/confinement.h"
 #include "services/bundled/store/gdal/gdalcall.h"
 #include "services/reporting.h"
 
@@ -208,7 +207,6 @@ std::string CreateCrsText(const Document& document, const std::string& file) {
     {
         // What GDAL says of texts that are no CRS is told in our words.
         const GdalCall call;
-        const Confinement confinement;
         text = CrsBuilder(document).Build(warnings);
     }
     PassOn(warnings, "The file " + file);
