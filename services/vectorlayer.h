@@ -53,8 +53,9 @@ KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
 /// @return the number of segments of this type; a null file has none
 KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
 
-/// @param after a segment number, or 0 for the start. @return the number of the next segment of
-/// this type, or 0 if there is none or the file is null
+/// @param after a segment number, or 0 for the start, where a store may pass over segments without
+/// polygons. @return the number of the next segment of this type, or 0 if there is none or the file
+/// is null
 KELM_SERVICES_EXPORT int ZARSegNext(_iobuf* file, int type, int after);
 
 /// @return the layer of a segment, owned by the file; null if there is no such layer or the file is
