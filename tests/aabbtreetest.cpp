@@ -46,7 +46,7 @@ void ExpectDivided(const AabbNode* node, const OpenTin& tin, const Indices& list
                       isBest, nCapacity, nNodes, leaves, rNotes);
 }
 
-TEST(AabbTree, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
+TEST(AabbTreeTest, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
     Random random;
     AabbTree tree;
     kelm::test::GdalTranscript transcript;
@@ -78,7 +78,7 @@ TEST(AabbTree, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
 }
 
 // Wrong releases show under the address sanitizer.
-TEST(AabbNode, OnlyTheTopOfABuildReleasesIt) {
+TEST(AabbNodeTest, OnlyTheTopOfABuildReleasesIt) {
     Random random;
     const OpenTin tin = MakeSheet(3, random).MakeTin();
     AabbTree tree(&tin);

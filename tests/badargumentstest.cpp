@@ -13,7 +13,7 @@ constexpr double NaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double FAR = std::numeric_limits<double>::max();
 using MapPoint = point2_t<double>;
 
-TEST(BadArguments, OfReadersAreRefused) {
+TEST(BadArgumentsTest, OfReadersAreRefused) {
     kelm::test::GdalTranscript transcript;
     transcript.moFolder = KELM_TIN_DATA_DIR;
     const char *const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg", *const none = nullptr;
@@ -33,7 +33,7 @@ TEST(BadArguments, OfReadersAreRefused) {
     EXPECT_EQ(open(good, -9)->Load(&window), nullptr); // the first layer
 }
 
-TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
+TEST(BadArgumentsTest, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     kelm::test::Transcript transcript;
     Mesh mesh;
     mesh.Add({0, 0, 1}, {8, 0, 2}, {0, 8, 3});
@@ -65,7 +65,7 @@ TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     EXPECT_EQ(t.GetGridPointsNum(9, 0) + t.GetGridPointsNum(-9, 9), 0U);
 }
 
-TEST(BadArguments, ARefusalIsCopiedWholeAndATextForTheHostIsNoFormat) {
+TEST(BadArgumentsTest, ARefusalIsCopiedWholeAndATextForTheHostIsNoFormat) {
     kelm::test::GdalTranscript transcript;
     ParameterException kept("", ParameterException::PT_Invalid, "", "", "", "", "", 0);
     DataException plain("", "", "", 0);

@@ -33,9 +33,9 @@ Damage Cut(std::size_t size) {
     return [=](Bytes& rBytes) { rBytes.resize(size); };
 }
 
-class DamagedFile : public testing::Test {
+class DamagedFileTest : public testing::Test {
   protected:
-    DamagedFile() { moTranscript.moFolder = moFolder.GetPath(""); }
+    DamagedFileTest() { moTranscript.moFolder = moFolder.GetPath(""); }
 
     /// Writes triangles at x = 0 to 3, each with heights from x on.
     std::string Write(const char* pszFormat, const std::string& name) {
@@ -114,7 +114,7 @@ const struct {
      [](Bytes& rBytes) { rBytes.replace(rBytes.size() - 80, 3, "\xff\xff\xff"); }},
 };
 
-TEST_F(DamagedFile, ADamagedRecordCostsThatRecord) {
+TEST_F(DamagedFileTest, ADamagedRecordCostsThatRecord) {
     for (const auto& [pszFormat, pszFile, pszDamaged, oDamage] : kDamagedRecords) {
         const std::string path = Write(pszFormat, pszFile);
         Edit(pszDamaged, oDamage);
@@ -130,7 +130,7 @@ TEST_F(DamagedFile, ADamagedRecordCostsThatRecord) {
     EXPECT_EQ(Load(path), "0 1 3 ") << path;
 }
 
-TEST_F(DamagedFile, AShapefileIsReadWholeOrNotAtAll) {
+TEST_F(DamagedFileTest, AShapefileIsReadWholeOrNotAtAll) {
     const struct {
         const char* mpszDamaged;
         Damage moDamage;
@@ -157,7 +157,7 @@ TEST_F(DamagedFile, AShapefileIsReadWholeOrNotAtAll) {
     }
 }
 
-TEST_F(DamagedFile, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {
+TEST_F(DamagedFileTest, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {
     const std::string path = Write("GPKG", "a.gpkg"), copy = moFolder.GetPath("b.gpkg"),
                       blocked = moFolder.GetPath("c.gpkg");
     CPLSetThreadLocalConfigOption("OGR_SQLITE_JOURNAL", "WAL");
@@ -178,7 +178,7 @@ TEST_F(DamagedFile, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {
     EXPECT_EQ(Load(blocked), "0 1 2 3 4 ");
 }
 
-TEST_F(DamagedFile, LayerZeroIsTheFirstWithPolygonsAndARefusalNamesThem) {
+TEST_F(DamagedFileTest, LayerZeroIsTheFirstWithPolygonsAndARefusalNamesThem) {
     const std::pair<const char*, LayerText> layers[] = {
         {"stakes", {{"POINT Z (0 0 1)"}, wkbPoint25D}},
         {"empty", {{MakeTriangle(6, 0, 0)}, wkbPolygon25D}},
@@ -201,7 +201,7 @@ TEST_F(DamagedFile, LayerZeroIsTheFirstWithPolygonsAndARefusalNamesThem) {
     }
 }
 
-TEST_F(DamagedFile, TheReasonWhyAFileCannotBeOpenedIsNested) {
+TEST_F(DamagedFileTest, TheReasonWhyAFileCannotBeOpenedIsNested) {
     const std::string loop = moFolder.GetPath("loop.gpkg"), locked = Write("GPKG", "locked.gpkg");
     fs::create_symlink(loop, loop);
     CPLSetThreadLocalConfigOption("SQLITE_BUSY_TIMEOUT", "0");
@@ -233,7 +233,7 @@ std::string Replace(std::string text, const std::string& old, const std::string&
     return text;
 }
 
-TEST_F(DamagedFile, ADrawingThatWouldNeverEndIsRefusedAndNoOther) {
+TEST_F(DamagedFileTest, ADrawingThatWouldNeverEndIsRefusedAndNoOther) {
     const std::string whole = kBegin + kFace + kEnd, zero("\0", 1);
     std::ifstream stream(KELM_TIN_DATA_DIR "/../fuzz/regressions/file/endless.dxf");
     std::string endless{std::istreambuf_iterator<char>(stream), {}};
@@ -252,7 +252,7 @@ TEST_F(DamagedFile, ADrawingThatWouldNeverEndIsRefusedAndNoOther) {
         EXPECT_EQ(Load(moFolder.WriteFile("a.dxf", text)), "0 ") << text.substr(0, 200);
 }
 
-TEST_F(DamagedFile, ManyPartsOfAGeodatabaseAreNotComparedWithEachOther) {
+TEST_F(DamagedFileTest, ManyPartsOfAGeodatabaseAreNotComparedWithEachOther) {
     std::string parts = "MULTIPOLYGON Z (((0 0 0,0 9 0,9 0 0,0 0 0),(1 1 0,2 1 0,1 2 0,1 1 0))";
     for (int n = 1; n < 200; ++n)
         parts += ',' + MakeTriangle(20 * n, 0, n).substr(10);
@@ -260,10 +260,11 @@ TEST_F(DamagedFile, ManyPartsOfAGeodatabaseAreNotComparedWithEachOther) {
     WriteLayer(path, "OpenFileGDB", {{parts + ")"}, wkbMultiPolygon25D});
     moTranscript.Take();
     const std::unique_ptr<_iobuf, decltype(&ZARClose)> poFile(ZAROpen(path.c_str(), "r"), ZARClose);
-    EXPECT_EQ(ZARGetLayer(poFile.get(), 1)->shapeCount, 205) << "the hole is no facet; its polygon is cut in six";
+    EXPECT_EQ(ZARGetLayer(poFile.get(), 1)->shapeCount, 205)
+        << "the hole is no facet; its polygon is cut in six";
 }
 
-TEST_F(DamagedFile, AGmlKeepsItsVerticalCrsAndItsAxesWhateverTheHostHasSet) {
+TEST_F(DamagedFileTest, AGmlKeepsItsVerticalCrsAndItsAxesWhateverTheHostHasSet) {
     const struct {
         const char* mpszCrs;
         const char* mpszName;
@@ -299,7 +300,7 @@ TEST_F(DamagedFile, AGmlKeepsItsVerticalCrsAndItsAxesWhateverTheHostHasSet) {
         CPLSetConfigOption(pszKey, nullptr);
 }
 
-TEST_F(DamagedFile, ALayerWhoseCrsCannotBeReadCountsAsOneWithout) {
+TEST_F(DamagedFileTest, ALayerWhoseCrsCannotBeReadCountsAsOneWithout) {
     const std::string path = Write("GPKG", "a.gpkg"), shape = Write("ESRI Shapefile", "a.shp");
     Execute(path, "UPDATE gpkg_spatial_ref_sys SET definition = 'PROJCS[\"x\"', "
                   "organization = 'NONE' WHERE srs_id = 32632");
@@ -310,7 +311,7 @@ TEST_F(DamagedFile, ALayerWhoseCrsCannotBeReadCountsAsOneWithout) {
     EXPECT_EQ(Load(path), "");
 }
 
-TEST_F(DamagedFile, GdalsLastErrorOfTheHostOutlivesAWarningOfOurs) {
+TEST_F(DamagedFileTest, GdalsLastErrorOfTheHostOutlivesAWarningOfOurs) {
     const std::string path = Write("ESRI Shapefile", "a.shp");
     Edit("a.shp", kDamagedRecords[0].moDamage);
     CPLErrorSetState(CE_Failure, CPLE_AppDefined, "the host's own");

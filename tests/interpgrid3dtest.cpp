@@ -26,7 +26,7 @@ double GetField(const Triple& p) {
     return 0.1 + 0.7 * u - 0.3 * v + 1.1 * w + 0.001 * u * v * w;
 }
 
-TEST(InterpGrid3D, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOutside) {
+TEST(InterpGrid3DTest, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOutside) {
     InterpGrid3D oGrid;
     EXPECT_TRUE(std::isnan(GetValue(oGrid, {}))) << "no nodes yet";
     const double x = 738669.5, y = 4045105.25, z = 300.0;
@@ -60,7 +60,7 @@ TEST(InterpGrid3D, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOu
     }
 }
 
-TEST(InterpGrid3D, RefusesWhatItCannotLayOutAndKeepsTheOldGrid) {
+TEST(InterpGrid3DTest, RefusesWhatItCannotLayOutAndKeepsTheOldGrid) {
     kelm::test::Transcript oTranscript;
     InterpGrid3D oGrid;
     EXPECT_TRUE(oTranscript.Refuses([&] { oGrid.SetDimension(2); }));
@@ -77,7 +77,7 @@ TEST(InterpGrid3D, RefusesWhatItCannotLayOutAndKeepsTheOldGrid) {
     EXPECT_EQ(oGrid.GetNumGridPoints(), 141U * 141U * 2U);
 }
 
-TEST(InterpGrid3D, RestoresTheKinksOfAModelThatIsLinearBetweenItsOwnNodes) {
+TEST(InterpGrid3DTest, RestoresTheKinksOfAModelThatIsLinearBetweenItsOwnNodes) {
     const auto GetHeight = [](const Triple& p) {
         return std::abs(p[0] - 7.1) - 2 * std::abs(p[1] - 3.3) + 0.1 * p[2];
     };

@@ -48,9 +48,9 @@ std::string Describe(ZARLayer_t* poLayer) {
     return text;
 }
 
-class LandXml : public testing::Test {
+class LandXmlTest : public testing::Test {
   protected:
-    LandXml() { moTranscript.moFolder = moFolder.GetPath(""); }
+    LandXmlTest() { moTranscript.moFolder = moFolder.GetPath(""); }
     File Open(const std::string& text, const std::string& name = "a.xml") const {
         return {ZAROpen(moFolder.WriteFile(name, text).c_str(), "r"), ZARClose};
     }
@@ -69,7 +69,7 @@ class LandXml : public testing::Test {
     GdalTranscript moTranscript;
 };
 
-TEST_F(LandXml, EachVersionAndEncodingGivesTheSameSurface) {
+TEST_F(LandXmlTest, EachVersionAndEncodingGivesTheSameSurface) {
     const std::string expected = "type 2 1=1231 2=2432";
     for (const char* pszAttributes :
          {"", " version='1.0' xmlns='http://www.landxml.org/schema/LandXML-1.0'",
@@ -94,7 +94,7 @@ TEST_F(LandXml, EachVersionAndEncodingGivesTheSameSurface) {
     EXPECT_EQ(Read(wide), expected);
 }
 
-TEST_F(LandXml, PointsAreNorthingEastingElevation) {
+TEST_F(LandXmlTest, PointsAreNorthingEastingElevation) {
     const std::string points =
         "<Pnts><P id='7'>\n4e6\t+500000.25 -1.5 </P>"
         "<P id='8'><![CDATA[4000001 500001]]> 2</P><P id='9'>&n; 3</P></Pnts>";
@@ -163,12 +163,12 @@ const struct {
     {"", ""},
 };
 
-TEST_F(LandXml, EachContentGivesItsLayersOrIsRefused) {
+TEST_F(LandXmlTest, EachContentGivesItsLayersOrIsRefused) {
     for (const auto& oRow : kContents)
         EXPECT_EQ(Read(Document(oRow.moContent)), oRow.mpszLayers) << oRow.moContent;
 }
 
-TEST_F(LandXml, OfManyDamagedRecordsTheFirstHundredAreNamed) {
+TEST_F(LandXmlTest, OfManyDamagedRecordsTheFirstHundredAreNamed) {
     std::string faces;
     for (int n = 0; n < 103; ++n)
         faces += "<F/>";
@@ -178,7 +178,7 @@ TEST_F(LandXml, OfManyDamagedRecordsTheFirstHundredAreNamed) {
     moTranscript.moLines = lines.substr(lines.rfind("The surface", lines.size() - 2));
 }
 
-TEST_F(LandXml, AnIncompleteOrHarmfulDocumentIsRefusedWhole) {
+TEST_F(LandXmlTest, AnIncompleteOrHarmfulDocumentIsRefusedWhole) {
     const std::string whole = Document(kTin);
     for (std::size_t nCut = 25; nCut-- > 0;) {
         EXPECT_EQ(Read(whole.substr(0, (whole.size() - 2) * nCut / 24)), "") << nCut;
@@ -217,7 +217,7 @@ std::string DescribeCrs(ZARLayer_t* poLayer) {
                         pszVertical ? oCrs.GetTargetLinearUnits("VERT_CS") : 0.0);
 }
 
-TEST_F(LandXml, UnitsAndCoordinateSystemBecomeTheCrs) {
+TEST_F(LandXmlTest, UnitsAndCoordinateSystemBecomeTheCrs) {
     const struct {
         const char* mpszUnit;
         std::string moAttributes;
@@ -255,7 +255,7 @@ TEST_F(LandXml, UnitsAndCoordinateSystemBecomeTheCrs) {
     }
 }
 
-TEST_F(LandXml, HeightsInFeetAreConvertedAsFeet) {
+TEST_F(LandXmlTest, HeightsInFeetAreConvertedAsFeet) {
     using namespace kelm;
     std::vector<double> heights;
     for (const double dfUnit : {1.0, 0.3048}) {
@@ -282,7 +282,7 @@ TEST_F(LandXml, HeightsInFeetAreConvertedAsFeet) {
     moTranscript.Take();
 }
 
-TEST_F(LandXml, AReaderLoadsAndLoadsAgainByWindow) {
+TEST_F(LandXmlTest, AReaderLoadsAndLoadsAgainByWindow) {
     std::string points, faces;
     for (int n = 1; n <= 300; ++n) {
         points += FormatString("<P id='%d'>%d %d %d</P>", n * 3, n % 2, n, n);
@@ -311,7 +311,7 @@ TEST_F(LandXml, AReaderLoadsAndLoadsAgainByWindow) {
         EXPECT_TRUE(moTranscript.Refuses([&] { ZARGetNext(poLayer, nUnknown); }));
 }
 
-TEST_F(LandXml, FormatsThatAreNotReadAreRefusedWithAWayToConvertThem) {
+TEST_F(LandXmlTest, FormatsThatAreNotReadAreRefusedWithAWayToConvertThem) {
     const std::string city =
         "{\n \"type\": \"CityJSON\", \"version\": \"1.1\", \"CityObjects\": {}, "
         "\"vertices\": []}";

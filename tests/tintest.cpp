@@ -105,7 +105,7 @@ void ExpectSubset(const Mesh& mesh, const Tin& origin, const Indices& list, cons
     }
 }
 
-TEST(TinSearch, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
+TEST(TinSearchTest, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
     Random random;
     std::size_t missed = 0;
     for (const int nThreads : {1, 2, 8})
@@ -128,7 +128,7 @@ TEST(TinSearch, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
     EXPECT_LT(missed, 300U); // a box test may lose what ends at the rim of a box
 }
 
-TEST(TinSubset, RenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
+TEST(TinSubsetTest, RenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
     Random random;
     for (const Mesh& mesh : MakeMeshes(random))
         for (unsigned i = 0; i < 20; ++i) {
@@ -161,7 +161,7 @@ TEST(TinSubset, RenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
 }
 
 // Leaks and double releases show under the address sanitizer.
-TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
+TEST(TinTest, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     Point vertices[3] = {{1, 2, 3}, {4, 5, 6}, {7, 9, 9}};
     Triangle triangle;
     for (const unsigned n : {0U, 1U}) {
@@ -191,7 +191,7 @@ TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     EXPECT_TRUE(tin.GetVertex(3)->y == 50 && kept->GetVertex(3)->y == 50);
 }
 
-TEST(Tin, CopiesAndMovedSurfacesStandWhereTheirOriginStood) {
+TEST(TinTest, CopiesAndMovedSurfacesStandWhereTheirOriginStood) {
     Random random;
     const Mesh mesh = MakeSheet(3, random);
     OpenTin origin = mesh.MakeTin(BASE_X, BASE_Y), assigned = Mesh(mesh).MakeTin(), last(assigned);

@@ -34,7 +34,7 @@ bool IsMet(const Corners& v, const Corners& w) {
     });
 }
 
-TEST(Triangle, JudgesAsExactArithmeticDoes) {
+TEST(TriangleTest, JudgesAsExactArithmeticDoes) {
     Random random;
     const auto digit = [&] { return static_cast<float>(random.Below(6)); };
     const auto part = [&] { return static_cast<float>(random.Below(7)) / 4 - 0.25F; };
@@ -74,7 +74,7 @@ TEST(Triangle, JudgesAsExactArithmeticDoes) {
     }
 }
 
-TEST(Triangle, SumsInItsOrderAndLetsNotANumberPass) {
+TEST(TriangleTest, SumsInItsOrderAndLetsNotANumberPass) {
     float h;
     const OwnTriangle steep({{0, 0, 0x1p60F}, {4, 0, -0x1p60F}, {0, 4, 1}});
     EXPECT_TRUE(steep.GetHeight(1, 2, h) && h == 0.5F); // the third term last
@@ -92,7 +92,7 @@ TEST(Triangle, SumsInItsOrderAndLetsNotANumberPass) {
     EXPECT_EQ(huge.GetGridPointsNum(4, 4), 16U);
 }
 
-TEST(Triangle, VectorsAreSummedAndScaledByComponents) {
+TEST(TriangleTest, VectorsAreSummedAndScaledByComponents) {
     const auto is = [](const Vector3& v, double x, double y, double z) {
         return v._x() == x && v._y() == y && v._z() == z;
     };
@@ -111,7 +111,7 @@ TEST(Triangle, VectorsAreSummedAndScaledByComponents) {
     EXPECT_EQ(out.z, 6);
 }
 
-TEST(TriangleGrid, ListsTheCellsThatExactArithmeticFinds) {
+TEST(TriangleGridTest, ListsTheCellsThatExactArithmeticFinds) {
     Random random;
     for (int i = 0; i < 20000; ++i) {
         const auto quarter = [&] { return static_cast<float>(random.Below(64)) / 4 - 3; };

@@ -55,9 +55,9 @@ std::string GetCrs(const Layer& oLayer) {
 using Format = std::pair<const char*, const char*>; // driver and file
 const Format kGpkg{"GPKG", "a.gpkg"}, kShape{"ESRI Shapefile", "a.shp"}, kGml{"GML", "a.gml"};
 
-class VectorLayer : public testing::Test {
+class VectorLayerTest : public testing::Test {
   protected:
-    VectorLayer() { moTranscript.moFolder = moFolder.GetPath(""); }
+    VectorLayerTest() { moTranscript.moFolder = moFolder.GetPath(""); }
     Layer Read(const std::string& path) { return Layer(path, moTranscript); }
     Layer Read(const LayerText& oText) {
         WriteLayer(moPath, "GPKG", oText);
@@ -76,7 +76,7 @@ class VectorLayer : public testing::Test {
     GdalTranscript moTranscript;
 };
 
-TEST_F(VectorLayer, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
+TEST_F(VectorLayerTest, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
     std::string half; // what is said of files of half their length
     for (const Format& oFormat :
          {kGpkg, kShape, kGml, Format{"FlatGeobuf", "a.fgb"}, Format{"GeoJSON", "a.geojson"},
@@ -123,7 +123,7 @@ const struct {
     {"POLYGON ((3 3,4 3,3 4,3 3))", {4}},
     {"GEOMETRYCOLLECTION Z (POINT Z (0 0 1),LINESTRING Z (0 0 1,1 1 1))", {0, 0}}};
 
-TEST_F(VectorLayer, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
+TEST_F(VectorLayerTest, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
     LayerText oText;
     for (const auto& oKind : kKinds)
         oText.moGeometries.emplace_back(oKind.mpszText);
@@ -137,7 +137,7 @@ TEST_F(VectorLayer, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
     EXPECT_TRUE(oLow.z == 0 && oHigh.z == 9 && oHigh.x == 9);
 }
 
-TEST_F(VectorLayer, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader) {
+TEST_F(VectorLayerTest, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader) {
     const std::string point = "POINT Z (0 0 1)", line = "LINESTRING Z (0 0 1,1 1 1)";
     const auto GetType = [&](const LayerText& oText) {
         return ZARGetLayerType(Read(oText).mpo, 0);
@@ -150,7 +150,7 @@ TEST_F(VectorLayer, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader
     EXPECT_EQ(GetType({{point, line, MakeTriangle(0, 0, 0)}}), 2);
 }
 
-TEST_F(VectorLayer, OnlyTheFirstGeometryColumnIsRead) {
+TEST_F(VectorLayerTest, OnlyTheFirstGeometryColumnIsRead) {
     GDALAllRegister();
     const std::string path = moFolder.GetPath("a.sqlite");
     GDALDatasetUniquePtr poDataset(GetGDALDriverManager()->GetDriverByName("SQLite")->Create(
@@ -163,7 +163,7 @@ TEST_F(VectorLayer, OnlyTheFirstGeometryColumnIsRead) {
     EXPECT_EQ(Read(path).moRings[0], MakeRing(0, 0, 0));
 }
 
-TEST_F(VectorLayer, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
+TEST_F(VectorLayerTest, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
     // The ids of two features, the number of facets of the second, the ids of the shapes.
     const std::tuple<std::vector<GIntBig>, int, std::vector<int>> cases[] = {
         {{0, 2147483647}, 1, {0, 2147483647}}, // the feature ids themselves
@@ -191,7 +191,7 @@ TEST_F(VectorLayer, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
     }
 }
 
-TEST_F(VectorLayer, LayersOfOneFileCanBeReadInTurns) {
+TEST_F(VectorLayerTest, LayersOfOneFileCanBeReadInTurns) {
     for (const Format& oFormat : {kGpkg, kGml}) {
         const Layer oFirst = Read(WriteRow(oFormat, 200, true));
         ZARLayer_t* apoLayers[] = {oFirst.mpo, ZARGetLayer(oFirst.mpoFile.get(), 2)};
@@ -204,7 +204,7 @@ TEST_F(VectorLayer, LayersOfOneFileCanBeReadInTurns) {
     }
 }
 
-TEST_F(VectorLayer, WhatIsNoLocalFileOfAKnownFormatIsRefusedByName) {
+TEST_F(VectorLayerTest, WhatIsNoLocalFileOfAKnownFormatIsRefusedByName) {
     const std::string shape = WriteRow(kShape, 1), pipe = moFolder.GetPath("pipe.geojson");
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
     Read(LayerText{{MakeTriangle(0, 0, 0)}});
@@ -216,7 +216,7 @@ TEST_F(VectorLayer, WhatIsNoLocalFileOfAKnownFormatIsRefusedByName) {
         EXPECT_TRUE(moTranscript.Refuses([&] { Read(name); })) << name;
 }
 
-TEST_F(VectorLayer, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
+TEST_F(VectorLayerTest, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
     const std::string json = // of rings that are not closed
         R"({"type":"MultiPolygon","coordinates":[[[[0,0,1],[1,0,1],[0,1,1]]],[[[2,0,1],[3,0,1],)"
         R"([2,1,1]]]],"crs":{"type":"link","properties":{"type":"ogcwkt",)"
@@ -248,7 +248,7 @@ TEST_F(VectorLayer, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
     EXPECT_EQ(Read(spy).mpo, nullptr);
 }
 
-TEST_F(VectorLayer, AFileThatChangesWhileItIsOpenEndsEachWalkWithAnException) {
+TEST_F(VectorLayerTest, AFileThatChangesWhileItIsOpenEndsEachWalkWithAnException) {
     // Fewer features, or more facets in one; then the last shape that is delivered.
     for (const auto& [pszChange, nLast] :
          {std::pair("DELETE FROM facets WHERE fid > 200", 200),
@@ -272,7 +272,7 @@ TEST_F(VectorLayer, AFileThatChangesWhileItIsOpenEndsEachWalkWithAnException) {
     }
 }
 
-TEST_F(VectorLayer, TheHostGetsBackItsStateOfGdal) {
+TEST_F(VectorLayerTest, TheHostGetsBackItsStateOfGdal) {
     const std::pair<const char*, const char*> options[] = {{"GML_PARSER", "XERCES"},
                                                            {"GML_SKIP_RESOLVE_ELEMS", nullptr},
                                                            {"SPATIALITE_LOAD", "YES"},
