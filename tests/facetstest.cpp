@@ -175,8 +175,8 @@ TEST_F(FacetsTest, WhatIsValidIsCoveredExactlyAndKeepsItsCornersAndHeights) {
         EXPECT_EQ(triangles.size(), count) << text.substr(0, 200);
         EXPECT_EQ(layer->shapeCount, static_cast<int>(shapes.size()));
         EXPECT_TRUE(area == 0 || std::fabs(sum - area) <= (upright ? 1e-2 : 0)) << text << sum;
-        for (std::size_t i = shapes.size(), step = 1 + i / 9; i >= step; i -= step)
-            EXPECT_EQ(ReadShape(layer, shapes[i - step].first), shapes[i - step].second);
+        for (const std::size_t i : {shapes.size() - 1, shapes.size() / 2, std::size_t{0}})
+            EXPECT_EQ(ReadShape(layer, shapes[i].first), shapes[i].second);
     }
     moTranscript.Take(); // the rule of the shape ids
 }

@@ -112,8 +112,11 @@ void FacetList::AddCut(const OGRCurvePolygon& polygon) {
         moMade.push_back(std::move(made));
         moFacets.push_back({ring, &moMade.back()});
     });
-    if (fault != FacetFault::None)
-        moFacets.push_back({ring, nullptr, fault, rings.size() == 1, moCutter.GetArea()});
+    if (fault == FacetFault::None)
+        return;
+    moFacets.push_back({ring, nullptr, fault, rings.size() == 1, moCutter.GetArea()});
+    // The reason was told. Later walks need not look for it again.
+    moWhole[mnPolygon - 1] = rings.size() == 1;
 }
 
 void FacetList::AddCurved(const OGRGeometry& curved) {

@@ -17,8 +17,8 @@ struct Facet {
     const OGRSimpleCurve* mpoRing = nullptr; ///< the outer ring; null if there is none
     /// What is delivered in place of the ring; null if the ring is delivered as it is stored.
     const std::vector<ZARVertex>* mpoMade = nullptr;
-    /// Why it cannot be used. A ring without holes is delivered all the same, and the library
-    /// refuses it.
+    /// Why it cannot be used, told in the first walk over the layer. A ring without holes is
+    /// delivered all the same, and the library refuses it.
     FacetFault meFault = FacetFault::None;
     bool mbDelivered = true;
     double mdfRefusedArea = 0.0; ///< in plan, of a polygon that cannot be used

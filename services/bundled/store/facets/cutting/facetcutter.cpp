@@ -74,8 +74,10 @@ FacetFault FacetCutter::CutInViews(const Polygon& polygon, const Add& add) {
         const FacetFault aside = CutInView(polygon, upright, add);
         return aside == FacetFault::NoArea ? inPlan : aside;
     }
-    return inPlan == FacetFault::NoArea && HasAreaInSpace(polygon.front()) ? FacetFault::NotPlanar
-                                                                           : inPlan;
+    if (!stance.IsFolded())
+        return inPlan;
+    mdfArea = 0.0;
+    return FacetFault::NotPlanar;
 }
 
 FacetFault FacetCutter::CutInView(const Polygon& polygon, View view, const Add& add) {

@@ -143,12 +143,10 @@ bool PlaneCutter::IsWithoutArea() const {
     return mdfArea <= LEAST_SHARE * (right->x - left->x) * (high->y - low->y);
 }
 
-/// The fault of a polygon that is not valid. Its own area adds what is left of it and takes away
-/// what is right, so the area of what it encloses is asked for.
 PlaneCutter::Outcome PlaneCutter::GetFault(const GEOSGeometry* polygon) {
-    const Geometry enclosed = Own(GEOSMakeValid_r(mpoContext.get(), polygon));
-    mdfArea = enclosed ? ComputeArea(enclosed.get()) : mdfArea;
-    return enclosed && IsWithoutArea() ? Outcome::NoArea : Outcome::Crosses;
+    const Geometry hull = Own(GEOSConvexHull_r(mpoContext.get(), polygon));
+    mdfArea = hull ? ComputeArea(hull.get()) : mdfArea;
+    return hull && IsWithoutArea() ? Outcome::NoArea : Outcome::Crosses;
 }
 
 /// @return false if the triangles do not cover the polygon

@@ -34,8 +34,8 @@ class PlaneCutter {
     /// @param rings three points or more in each. A hole may touch other rings at points
     /// @param triangles replaced, counter-clockwise, none of them without area
     Outcome Cut(const PlaneRings& rings, std::vector<CornerTriple>& triangles);
-    /// @return the area of the last polygon. If it crosses itself, that of the parts inside by the
-    /// even-odd rule
+    /// @return the area of the last polygon; of one that crosses itself the area of its convex
+    /// hull, since lobes to the left and to the right would cancel each other
     double GetArea() const { return mdfArea; }
 
   private:

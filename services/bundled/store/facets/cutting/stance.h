@@ -18,6 +18,9 @@ class Stance {
     bool IsExactlyUpright() const;
     /// Are the corners in one vertical plane, as far as anybody builds and measures walls?
     bool IsUpright() const;
+    /// Do corners stand above each other while the ring encloses nothing in plan? Such a ring
+    /// follows walls that are not in one plane.
+    bool IsFolded() const { return mbFolded; }
     /// @return true if the plane runs rather along x than along y
     bool RunsAlongX() const { return mbAlongX; }
 
@@ -25,6 +28,7 @@ class Stance {
     double mdfLength = 0.0; ///< of the line
     double mdfAside = 0.0;  ///< greatest distance of a corner from the line
     bool mbAlongX = true;
+    bool mbFolded = false;
 };
 
 /// @return is there area between the corners in space, in any direction?
