@@ -85,22 +85,23 @@ void CellBlock::WriteCrowd(IdList ids, std::size_t place) {
 
 /// Writes as many records as it takes. Those behind the first are as long as what they hold.
 void CellBlock::WriteList(IdList ids, std::size_t place) {
-    bool isFirst = true;
     moWriter.Clear();
+    bool isFirst = true;
     const auto write = [&] {
-        if (!isFirst) {
-            if (!TakeLines(moWriter.CountLines(), place))
-                return;
-            place = moLines.size() + 1 - moWriter.CountLines();
-        }
+        const std::size_t lines = moWriter.CountLines();
+        if (!isFirst && !TakeLines(lines, place))
+            return false;
+        place = isFirst ? place : moLines.size() + 1 - lines;
         moWriter.Write(GetRecord(place));
         moWriter.Clear();
         isFirst = false;
+        return true;
     };
     for (const unsigned id : ids) {
         if (moWriter.Add(moSource.poTriangles[id]))
             continue;
-        write();
+        if (!write())
+            return;
         moWriter.Add(moSource.poTriangles[id]);
     }
     write();
