@@ -3,10 +3,15 @@
 #include "tests/support/sheets.h"
 
 #include <array>
+#include <cstring>
 #include <functional>
 #include <string>
 
 namespace kelm::tin::test {
+
+inline bool IsSameBits(float a, float b) {
+    return std::memcmp(&a, &b, sizeof a) == 0;
+}
 
 /// A surface that could mislead an index.
 struct OddSurface {
