@@ -5,8 +5,15 @@
 #include "tin/point.h"
 
 #include <memory>
+#include <vector>
 
 namespace kelm::bench {
+
+/// Embree's ways of batching.
+enum class Batching {
+    Stream, ///< an array of rays a call
+    Packet  ///< 16 rays a call where the processor has them at once, else 8
+};
 
 /// A competing index. A new one is one name below and one source file that defines the members for
 /// it: Input, Tree and the functions.
@@ -32,6 +39,11 @@ class Index {
     bool GetHeight(float x, float y, float& h) const;
     /// Height of the highest crossing of the segment from a to b. @return is there one?
     bool GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h) const;
+
+    /// The heights of many positions by the library's own way of batching, NO_HEIGHT where there is
+    /// none. Embree alone has such ways.
+    void GetHeights(Batching eBatching, const std::vector<point2_t<float>>& oPositions,
+                    std::vector<float>& rHeights) const;
 
   private:
     struct Tree;

@@ -37,6 +37,7 @@ struct Plan {
 void AddBuild(const Plan& oPlan);
 void AddDegenerate(const Plan& oPlan);
 void AddHeight(const Plan& oPlan);
+void AddHeightGrid(const Plan& oPlan);
 void AddLine(const Plan& oPlan);
 void AddScan(const Plan& oPlan);
 void AddWeld(const Plan& oPlan);

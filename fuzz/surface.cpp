@@ -1,7 +1,9 @@
-// Index triples over any coordinates: every query with the tree against the scan, subsets and grid.
+// Index triples over any coordinates: every query with an index against the scan,
+// subsets and grid.
 
 #include "fuzz/bytes.h"
 #include "tin/aabbtree.h"
+#include "tin/heightgrid.h"
 #include "tin/ray2.h"
 #include "tin/tin.h"
 
@@ -12,6 +14,7 @@
 using fuzz::Require;
 using kelm::tin::AabbTree;
 using kelm::tin::BBox;
+using kelm::tin::HeightGrid;
 using kelm::tin::Tin;
 using kelm::tin::Triangle;
 
@@ -47,6 +50,16 @@ void TestPoint(const Opened& surface, const AabbTree& tree, float x, float y) {
     float high = 0.5F;
     Require(surface.GetHeight(x, y, low, nullptr) == surface.GetHeight(x, y, high, &tree));
     Require(IsSame(low, high));
+}
+
+/// The index of heights must give the bits of the scan, by both rules.
+void TestGridHeight(const Opened& surface, const HeightGrid& grid, float x, float y) {
+    for (const auto rule : {kelm::tin::ER_Float, kelm::tin::ER_Closed}) {
+        float wanted = 0.5F;
+        float h = 0.5F;
+        Require(surface.GetHeight(x, y, wanted, nullptr, rule) == grid.GetHeight(x, y, h, rule));
+        Require(std::memcmp(&wanted, &h, sizeof h) == 0);
+    }
 }
 
 /// Does the segment stay on the rim of the triangle's box, where rounding decides? Out of range it
@@ -144,10 +157,12 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const auto surface = CreateSurface(bytes, coordinates);
     tree.CreateTree(surface.get());
     const unsigned triangles = surface->GetTriangleCount();
+    const HeightGrid grid(*surface, {1, tree.GetCapacity() * 30, {}});
     do {
         const Point a{coordinates.Take(), coordinates.Take(), coordinates.Take()};
         const Point b{coordinates.Take(), coordinates.Take(), coordinates.Take()};
         TestPoint(*surface, tree, a.x, a.y);
+        TestGridHeight(*surface, grid, a.x, a.y);
         TestLine(*surface, tree, a, b);
         BBox<float, point2_t<float>> region;
         region.min = {a.x, a.y};

@@ -1,11 +1,13 @@
 #pragma once
 
 #include "tin/bbox.h"
+#include "tin/edgerule.h"
 #include "tin/point.h"
 #include "tin/tinexport.h"
 #include "tin/triangle.h"
 #include "tin/triangleid.h"
 
+#include <cstddef>
 #include <cstdint>
 #include <vector>
 
@@ -95,6 +97,20 @@ class KELM_TIN_EXPORT Tin {
     /// @return is there a height?
     bool GetHeight(const float& x, const float& y, float& height, const AabbTree* tree) const;
     bool GetHeight(const double& x, const double& y, float& height, const AabbTree* tree) const;
+    /// The same by another rule for positions on edges.
+    bool GetHeight(const float& x, const float& y, float& height, const AabbTree* tree,
+                   EdgeRule eRule) const;
+    bool GetHeight(const double& x, const double& y, float& height, const AabbTree* tree,
+                   EdgeRule eRule) const;
+
+    /// The heights at many positions in map coordinates, each as GetHeight tells it. A HeightGrid
+    /// is the quicker index for it.
+    /// @param heights count values of the caller's, in the order of the positions; NaN where there
+    /// is no height @param threads most threads; 0 for the runtime's default. A small batch stays
+    /// on the calling thread
+    /// @return the number of heights found
+    std::size_t GetHeights(const point2_t<double>* positions, std::size_t count, float* heights,
+                           const AabbTree* tree, int threads = 0, EdgeRule eRule = ER_Float) const;
 
     /// The highest crossing of the segment from a to b with the surface, as the segment's own
     /// height there.
@@ -156,6 +172,8 @@ class KELM_TIN_EXPORT Tin {
   private:
     void Release() noexcept;
     void TestTree(const AabbTree* tree) const;
+    bool FindHeight(const point2_t<float>& position, float& height, const AabbTree* tree, int most,
+                    EdgeRule eRule) const;
 
     Triangle* mpoTriangles = nullptr;
     std::uint32_t mnTriangles = 0;

@@ -1,6 +1,8 @@
 #include "services/exception.h"
 #include "tests/scripted/readerfixture.h"
 #include "tests/support/allocationcounter.h"
+#include "tin/heightgrid.h"
+#include "tin/raster.h"
 
 #include <omp.h>
 
@@ -84,6 +86,26 @@ TEST_F(AllocationFailureTest, SurfaceTreeCopiesSearchesAndSubsets) {
     surface.GetHeight(30.0F, 20.0F, h, &tree);
     surface.GetLineIntersectHeight(point3_t<float>{0, 0, 0}, {900, 30, 900}, h, &tree);
     EXPECT_EQ(kelm::tin::test::AllocationCounter::mnRequests, 0) << "a query needs no memory";
+}
+
+TEST_F(AllocationFailureTest, HeightGridBatchesAndRaster) {
+    script.shapes = CreateStrip(240, 50);
+    for (unsigned i = 0; i < 400; ++i) // copies, which no grid divides
+        script.shapes.push_back(script.shapes[0]);
+    const Surface surface = Load(*Open());
+    const point2_t<double> positions[] = {{STRIP_X + 2, STRIP_Y + 9}, {STRIP_X + 300, STRIP_Y + 5}};
+    for (const double turn : {0.0, 0.1})
+        FailEach([&] {
+            const kelm::tin::HeightGrid grid(*surface);
+            float heights[2], same[2];
+            EXPECT_EQ(grid.GetHeights(positions, 2, heights), 2U);
+            EXPECT_EQ(surface->GetHeights(positions, 2, same, nullptr), 2U);
+            EXPECT_TRUE(heights[0] == same[0] && heights[1] == same[1]);
+            const kelm::tin::RasterFrame frame{9, 5, {STRIP_X, 99, turn, STRIP_Y, 0, 9}};
+            std::vector<float> cells(45);
+            return kelm::tin::RasterizeHeights(*surface, frame, cells.data(), 0,
+                                               kelm::tin::ER_Closed);
+        });
 }
 
 } // namespace

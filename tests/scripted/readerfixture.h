@@ -78,7 +78,9 @@ struct Opened : kelm::tin::Tin {
         std::vector<int> cells;
         std::vector<float> heights;
         Tin(*this).GetTriangle(place)->GetGridPoints(900, 90, cells, heights);
-        double sum = double(height) + 10.0 * double(crossing) + double(met.size() + cells.size());
+        float batch[3];
+        GetHeights(path, 3, batch, tree);
+        double sum = double(batch[place % 2] > 0.0F ? batch[place % 2] : 1.0F) + double(height) + 10.0 * double(crossing) + double(met.size() + cells.size());
         for (const Surface& part : parts)
             sum = 3.0 * sum + Summarise(part);
         return sum;

@@ -20,7 +20,7 @@ namespace {
 
 constexpr std::size_t HUGE_PAGE = std::size_t{2} << 20;
 
-/// @param bytes a multiple of a huge page
+/// @param bytes a multiple of a page
 void* MapBlock(std::size_t bytes) {
     void* mapped = mmap(nullptr, bytes + HUGE_PAGE, PROT_READ | PROT_WRITE,
                         MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
