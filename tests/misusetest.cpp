@@ -185,7 +185,7 @@ TEST(MisuseTest, BothConstructorsRefuseNullOnlyWhereItIsNeeded) {
     Triangle triangles[1];
     Triangle* const noTriangles = nullptr;
     Triangle_Id* const noIds = nullptr;
-    EXPECT_THROW(Tin(nullptr, 3, triangles, 1, 0, 0), DataException);
+    EXPECT_THROW(Tin(nullptr, 1, triangles, 1, 0, 0), DataException);
     EXPECT_THROW(Tin(vertices, 3, noTriangles, 1, 0, 0), DataException);
     EXPECT_THROW(Tin(vertices, 3, noIds, 1, 0, 0), DataException);
     for (const unsigned n : {0U, 1U}) {
