@@ -21,7 +21,7 @@ enum DatumType : int {
 
 /// Unit of the heights of a compound CRS.
 enum LinearUnitType : int {
-    LU_Default = 0 ///< the unit that the layer's own CRS names for such heights, else metres
+    LU_Default = 0 ///< the unit of the height axis of the layer's own CRS, else metres
 };
 
 /// A coordinate reference system.

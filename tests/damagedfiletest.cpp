@@ -185,7 +185,7 @@ TEST_F(DamagedFileTest, LayerZeroIsTheFirstWithPolygonsAndARefusalNamesThem) {
         {"paths", {{"LINESTRING Z (0 0 1,1 1 1)"}}},
         {"roofs", {{MakeTriangle(7, 0, 0)}}},
         {"walls", {{MakeTriangle(8, 0, 0)}, wkbPolygon25D}}};
-    for (const std::size_t nLayers : {5, 3}) {
+    for (const std::size_t nLayers : {5U, 3U}) {
         const std::string path = moFolder.GetPath("a.gpkg");
         fs::remove(path);
         GDALAllRegister();
@@ -215,7 +215,9 @@ TEST_F(DamagedFileTest, TheReasonWhyAFileCannotBeOpenedIsNested) {
     poOwner.reset();
     CPLSetThreadLocalConfigOption("SQLITE_BUSY_TIMEOUT", nullptr);
     const std::string gml = Write("GML", "a.gml");
+    CPLPopErrorHandler();       // GDAL would lose it
     GDALDestroyDriverManager(); // and the settings with it
+    CPLPushErrorHandler(CPLQuietErrorHandler);
     CPLSetThreadLocalConfigOption("GDAL_SKIP", "GML");
     EXPECT_EQ(Load(gml), "");
     EXPECT_EQ(GetGDALDriverManager()->GetDriverCount(), 7) << "those of the formats, no others";

@@ -188,6 +188,8 @@ TEST(MisuseTest, BothConstructorsRefuseNullOnlyWhereItIsNeeded) {
     EXPECT_THROW(Tin(nullptr, 1, triangles, 1, 0, 0), DataException);
     EXPECT_THROW(Tin(vertices, 3, noTriangles, 1, 0, 0), DataException);
     EXPECT_THROW(Tin(vertices, 3, noIds, 1, 0, 0), DataException);
+    const Tin smallest(new Point[1]{{1, 2, 3}}, 1, new Triangle_Id[1]{{0, 0, 0}}, 1, 0, 0);
+    EXPECT_EQ(smallest.GetTriangle(0)->GetVertex(2), smallest.GetVertex(0));
     for (const unsigned n : {0U, 1U}) {
         EXPECT_EQ(Tin(nullptr, n, noIds, 1 - n, 0, 0).GetTriangleCount(), 0U);
         EXPECT_EQ(Tin(nullptr, n, noTriangles, 1 - n, 0, 0).GetTriangleCount(), 0U);

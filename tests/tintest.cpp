@@ -194,7 +194,8 @@ TEST(TinTest, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
 TEST(TinTest, CopiesAndMovedSurfacesStandWhereTheirOriginStood) {
     Random random;
     const Mesh mesh = MakeSheet(3, random);
-    OpenTin origin = mesh.MakeTin(BASE_X, BASE_Y), assigned = Mesh(mesh).MakeTin(), last(assigned);
+    const OpenTin owner = Mesh(mesh).MakeTin();
+    OpenTin origin = mesh.MakeTin(BASE_X, BASE_Y), assigned(owner), last(owner);
     const OpenTin copy(origin);
     assigned = copy;
     const OpenTin moved(std::move(origin));

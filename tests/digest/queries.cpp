@@ -45,7 +45,8 @@ void AddSubset(const Tin* poSubset, Point2 p, Digest& digest) {
     const std::unique_ptr<const Tin> subset(poSubset);
     float height = UNTOUCHED;
     const MapPoint at = subset ? ToMap(*subset, p) : MapPoint{};
-    digest.AddAnswer(subset && subset->GetHeight(at.x, at.y, height, nullptr), height);
+    const bool found = subset && subset->GetHeight(at.x, at.y, height, nullptr);
+    digest.AddAnswer(found, height);
     if (subset)
         AddSurface(*subset, digest);
 }

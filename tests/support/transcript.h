@@ -6,7 +6,6 @@
 #include <gtest/gtest.h>
 
 #include <fstream>
-#include <regex>
 #include <sstream>
 #include <string>
 #include <utility>
@@ -58,7 +57,14 @@ struct Transcript {
         std::string lines = std::exchange(moLines, "");
         for (std::size_t at = 0; !moFolder.empty() && (at = lines.find(moFolder, at)) + 1 != 0;)
             lines.replace(at, moFolder.size(), "~");
-        return std::regex_replace(lines, std::regex(R"((\([a-z/]+):\d+\)\n)"), "$1)\n");
+        for (std::size_t end = 0; (end = lines.find(")\n", end + 1)) + 1 != 0;) {
+            const std::size_t colon = lines.find_last_not_of("0123456789", end - 1);
+            if (colon + 1 == end || lines[colon] != ':')
+                continue;
+            lines.erase(colon, end - colon);
+            end = colon;
+        }
+        return lines;
     }
 
     std::string moLines;

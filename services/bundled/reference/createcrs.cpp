@@ -1,5 +1,6 @@
 #include "services/bundled/reference/createcrs.h"
 
+#include "services/bundled/reference/heightunit.h"
 #include "services/bundled/reference/proj/projsession.h"
 #include "services/bundled/undefinedcrs.h"
 #include "services/exception.h"
@@ -107,6 +108,13 @@ CRSText ReadText(ProjSession& session, const PJ* crs) {
                         SOURCE, __PRETTY_FUNCTION__, __LINE__);
 }
 
+/// @return the unit of all heights of a layer: that of the height axis of its CRS, else metres
+HeightUnit GetLayerUnit(ProjSession& session, const CRSText& text) {
+    const std::string& named = text.moVertical.empty() ? text.moEllipsoidal : text.moVertical;
+    return named.empty() ? HeightUnit{}
+                         : GetHeightUnit(session, session.CreateFromText(named).get());
+}
+
 /// @return the CRS with ellipsoidal heights as PROJJSON
 std::string CreateEllipsoidal(const CRSText& text) {
     if (!text.moEllipsoidal.empty())
@@ -114,27 +122,27 @@ std::string CreateEllipsoidal(const CRSText& text) {
     ProjSession session;
     const PjPtr flat = session.CreateFromText(text.moDefinition);
     const PjPtr spatial(proj_crs_promote_to_3D(session.Get(), nullptr, flat.get()));
-    return session.GetText(spatial.get());
+    return SetHeightUnit(session, session.GetText(spatial.get()), GetLayerUnit(session, text));
 }
 
-/// @return the vertical CRS that the layer names, or the default one
-PjPtr CreateVertical(ProjSession& session, const CRSText& text) {
+/// @return the vertical CRS that the layer names, or the default one, as PROJJSON
+std::string CreateVertical(ProjSession& session, const CRSText& text) {
     if (!text.moVertical.empty())
-        return session.CreateFromText(text.moVertical);
-    PjPtr vertical(proj_create_from_database(session.Get(), "EPSG", DEFAULT_VERTICAL_CODE,
-                                             PJ_CATEGORY_CRS, 0, nullptr));
+        return text.moVertical;
+    const PjPtr vertical(proj_create_from_database(session.Get(), "EPSG", DEFAULT_VERTICAL_CODE,
+                                                   PJ_CATEGORY_CRS, 0, nullptr));
     if (!vertical)
         throw DataException(FormatString("PROJ's database does not give the vertical CRS EPSG:%s%s",
                                          DEFAULT_VERTICAL_CODE, session.TakeMessages().c_str()),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
-    return vertical;
+    return SetHeightUnit(session, session.GetText(vertical.get()), GetLayerUnit(session, text));
 }
 
 /// @return the CRS with heights above the geoid as PROJJSON
 std::string CreateOrthometric(const CRSText& text) {
     ProjSession session;
     const PjPtr flat = session.CreateFromText(text.moDefinition);
-    const PjPtr vertical = CreateVertical(session, text);
+    const PjPtr vertical = session.CreateFromText(CreateVertical(session, text));
     const std::string name =
         std::string(proj_get_name(flat.get())) + " + " + proj_get_name(vertical.get());
     const PjPtr compound(

@@ -16,37 +16,8 @@ constexpr double MODERN_FLATTENING = 298.257; ///< inverse
 constexpr double MOST_AXIS_DIFFERENCE = 1.0;  ///< metres
 constexpr double MOST_FLATTENING_DIFFERENCE = 0.01;
 
-/// A unit of length.
-struct Unit {
-    std::string moName = "unknown";
-    double mdfMetres = 0.0;
-};
-
 PjPtr GetEllipsoid(ProjSession& session, const PJ* crs) {
     return PjPtr(proj_get_ellipsoid(session.Get(), crs));
-}
-
-/// @return the unit of the last axis of a CRS; of the vertical part if the CRS is a compound
-Unit GetHeightUnit(ProjSession& session, const PJ* crs) {
-    const PJ_TYPE type = proj_get_type(crs);
-    if (type == PJ_TYPE_BOUND_CRS || type == PJ_TYPE_COMPOUND_CRS) {
-        const PjPtr part(type == PJ_TYPE_BOUND_CRS ? proj_get_source_crs(session.Get(), crs)
-                                                   : proj_crs_get_sub_crs(session.Get(), crs, 1));
-        return part ? GetHeightUnit(session, part.get()) : Unit{};
-    }
-    const PjPtr system(proj_crs_get_coordinate_system(session.Get(), crs));
-    const int axes = system ? proj_cs_get_axis_count(session.Get(), system.get()) : 0;
-    Unit unit;
-    const char* name = nullptr;
-    if (axes > 0 && proj_cs_get_axis_info(session.Get(), system.get(), axes - 1, nullptr, nullptr,
-                                          nullptr, &unit.mdfMetres, &name, nullptr, nullptr))
-        unit.moName = name;
-    return unit;
-}
-
-Unit GetHeightUnit(ProjSession& session, const ProjCRS& crs) {
-    const PjPtr object = session.CreateFromText(crs.GetText().moDefinition);
-    return GetHeightUnit(session, object.get());
 }
 
 } // namespace
@@ -81,18 +52,6 @@ void WarnOfEllipsoid(const std::string& map, const std::string& ellipsoid,
                                        "%s",
                                        map.c_str(), operation.moName.c_str(), meaning.c_str()),
                           SOURCE, __LINE__);
-}
-
-void ReportUnits(ProjSession& session, const ProjCRS& source, const ProjCRS& target) {
-    const Unit from = GetHeightUnit(session, source);
-    const Unit to = GetHeightUnit(session, target);
-    if (from.mdfMetres == to.mdfMetres)
-        tellus::Report::AddInfo(FormatString("Unit of the heights: %s", to.moName.c_str()));
-    else
-        tellus::Warning::Warn(FormatString("The change of datum also changes the unit of the "
-                                           "heights, from %s to %s",
-                                           from.moName.c_str(), to.moName.c_str()),
-                              SOURCE, __LINE__);
 }
 
 } // namespace kelm::ogc

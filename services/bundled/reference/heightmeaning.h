@@ -21,7 +21,4 @@ std::string FindOldEllipsoid(ProjSession& session, const PJ* crs);
 void WarnOfEllipsoid(const std::string& map, const std::string& ellipsoid,
                      const ProjOperation& operation);
 
-/// Reports the unit of the target's heights, with a warning if the source has another one.
-void ReportUnits(ProjSession& session, const ProjCRS& source, const ProjCRS& target);
-
 } // namespace kelm::ogc

@@ -3,6 +3,7 @@
 #include "services/bundled/reference/areacensus.h"
 #include "services/bundled/reference/failurecount.h"
 #include "services/bundled/reference/heightmeaning.h"
+#include "services/bundled/reference/heightunit.h"
 #include "services/bundled/reference/operationsearch.h"
 #include "services/reporting.h"
 
@@ -80,7 +81,7 @@ ProjTransform::ProjTransform(const ProjCRS& source, const ProjCRS& target)
     : moOperations(ListOperations(moSession, source, target)) {
     ReportOperations();
     const PjPtr map = moSession.CreateFromText(source.GetMap().GetText().moDefinition);
-    ReportUnits(moSession, source, target);
+    ReportUnit(target);
     if (source.GetDatum() == cs::VD_Ellipsoidal || target.GetDatum() == cs::VD_Ellipsoidal)
         moEllipsoid = FindOldEllipsoid(moSession, map.get());
     moMapName = source.GetMap().GetText().moName;
@@ -101,6 +102,12 @@ void ProjTransform::ReportOperations() const {
             operation.IsFine() ? "" : ", which is too coarse",
             operation.moGrids.empty() ? "none" : operation.moGrids.c_str(),
             operation.IsUsable() ? "" : "; not usable without ", operation.moMissingGrids.c_str()));
+}
+
+void ProjTransform::ReportUnit(const ProjCRS& crs) {
+    const PjPtr object = moSession.CreateFromText(crs.GetText().moDefinition);
+    tellus::Report::AddInfo(FormatString("Unit of the heights: %s",
+                                         GetHeightUnit(moSession, object.get()).moName.c_str()));
 }
 
 bool ProjTransform::TransformPoints(const double* source, double* target, unsigned int nCount) {

@@ -46,10 +46,11 @@ bool IsSame(double metres, double otherMetres) {
     return std::abs(metres / otherMetres - 1.0) < 1e-9;
 }
 
-std::string ExportWkt(const OGRSpatialReference& crs) {
-    const char* const options[] = {"FORMAT=WKT2_2019", "MULTILINE=NO", nullptr};
+/// PROJJSON, since WKT loses the operations of some CRSs.
+std::string Export(const OGRSpatialReference& crs) {
+    const char* const options[] = {"MULTILINE=NO", nullptr};
     char* raw = nullptr;
-    const OGRErr error = crs.exportToWkt(&raw, options);
+    const OGRErr error = crs.exportToPROJJSON(&raw, options);
     const std::unique_ptr<char, decltype(&CPLFree)> text(raw, CPLFree);
     return error == OGRERR_NONE && raw ? raw : "";
 }
@@ -119,7 +120,7 @@ std::string CrsBuilder::Build(Warnings& warnings) {
     }
     TakeApart();
     if (!moHorizontal.IsProjected() && !moHorizontal.IsGeographic())
-        return ExportWkt(moHorizontal);
+        return Export(moHorizontal);
     if (moVertical.IsEmpty() && !FindVertical() && !IsSame(mpoUnit->mdfMetres, 1.0))
         static_cast<void>(moVertical.importFromEPSG(DEFAULT_VERTICAL_CODE));
     SetHorizontalUnit();
@@ -192,11 +193,11 @@ void CrsBuilder::SetVerticalUnit() {
 
 std::string CrsBuilder::Join() const {
     if (moVertical.IsEmpty())
-        return ExportWkt(moHorizontal);
+        return Export(moHorizontal);
     OGRSpatialReference compound;
     const std::string name = std::string(moHorizontal.GetName()) + " + " + moVertical.GetName();
     static_cast<void>(compound.SetCompoundCS(name.c_str(), &moHorizontal, &moVertical));
-    return ExportWkt(compound);
+    return Export(compound);
 }
 
 } // namespace

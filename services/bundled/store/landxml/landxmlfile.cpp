@@ -3,6 +3,7 @@
 #include "services/bundled/store/landxml/documentcrs.h"
 #include "services/bundled/store/landxml/xml/xmlreader.h"
 
+#include <algorithm>
 #include <filesystem>
 #include <fstream>
 #include <utility>
@@ -14,6 +15,12 @@ LandXmlFile::LandXmlFile(std::istream& stream, const std::string& name) {
     moCrs = CreateCrsText(document, name);
     for (Surface& surface : document.moSurfaces)
         moLayers.push_back(std::make_unique<LandXmlLayer>(*this, std::move(surface), moCrs));
+}
+
+int LandXmlFile::FindFirst() {
+    const auto found = std::find_if(moLayers.begin(), moLayers.end(),
+                                    [](const auto& layer) { return layer->GetType() == 2; });
+    return found == moLayers.end() ? 1 : static_cast<int>(found - moLayers.begin()) + 1;
 }
 
 std::unique_ptr<_iobuf> OpenLandXml(const char* name) {

@@ -21,6 +21,7 @@ class LandXmlFile final : public _iobuf {
     OpenLayer& GetLayer(int segment) override {
         return *moLayers[static_cast<std::size_t>(segment) - 1];
     }
+    int FindFirst() override;
 
   private:
     std::string moCrs;
