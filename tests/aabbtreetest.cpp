@@ -67,6 +67,12 @@ TEST(AabbTreeTest, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
                 tree.FindLeaves(EVERYWHERE, walked); // behind what stands in the list
                 leaves.insert(leaves.end(), leaves.begin(), leaves.end());
                 EXPECT_EQ(walked, leaves);
+                BBox<float, point2_t<float>> corner;
+                corner.min = corner.max = {mesh.vertices[0].x, mesh.vertices[0].y};
+                Indices atPoint, inBox;
+                tree.FindLeaves(corner.min.x, corner.min.y, atPoint);
+                tree.FindLeaves(corner, inBox);
+                EXPECT_EQ(atPoint, inBox);
                 EXPECT_EQ(static_cast<int>(tree.GetCapacity()), nCapacity);
                 EXPECT_EQ(tree.GetObjBytes(), 64 * nodes + 4 * tin.GetTriangleCount() + 32);
             }

@@ -158,6 +158,7 @@ const struct {
          Definition(kPoints) + "<Surface name='no'/></Surfaces>" + kTin,
      "type 2 1=1231; type 1; type 2 1=1231 2=2432"},
     // Without a TIN surface.
+    {"<Surfaces>" + Definition(kPoints) + "</Surfaces>" + kTin, "; type 2 1=1231 2=2432"},
     {"<Surfaces>" + Definition("", "grid") + "<Surface name='FG'/></Surfaces>", ""},
     {"<Alignments/><CgPoints/><Alignments/>", ""},
     {"", ""},
