@@ -4,7 +4,6 @@
 #include "tests/support/gdaltranscript.h"
 #include "tests/support/temporaryfolder.h"
 
-#include <gtest/gtest.h>
 #include <ogr_srs_api.h>
 #include <proj.h>
 
@@ -69,16 +68,22 @@ CRSPtr MakeCompound(const CRSPtr& poMap, cs::DatumType eDatum) {
     return CRSPtr(utils::CreateCompoundCS(poMap->GetHorizontalCRS(), eDatum, cs::LU_Default));
 }
 
-/// @return the height of the first point
-double Convert(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
-               cs::DatumType eTo = kOrtho, bool bWkt = true) {
+/// @return the points with their heights converted, and one more
+Points Transform(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
+                 cs::DatumType eTo = kOrtho, bool bWkt = true) {
     const CRSPtr poMap = ReadCRS(crs, bWkt);
     const CRSPtr poFrom = MakeCompound(poMap, eFrom), poTo = MakeCompound(poMap, eTo);
     EXPECT_EQ(poMap->GetDimension() + 1, poFrom->GetDimension()) << crs;
     Points target(points.size() + 3);
     std::unique_ptr<ct::IMathTransform>(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0))
         ->TransformPoints(points.data(), target.data(), static_cast<unsigned>(points.size() / 3));
-    return target[2];
+    return target;
+}
+
+/// @return the height of the first point
+template <typename... Arguments>
+double Convert(const std::string& crs, const Points& points, Arguments... arguments) {
+    return Transform(crs, points, arguments...)[2];
 }
 
 const std::string kFromUtm = "+proj=pipeline +step +inv +proj=utm +zone=16 +ellps=WGS84 ";
@@ -181,23 +186,13 @@ const struct {
 
 TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
     for (const auto& [pszCRS, x, y, dfWidth, dfHeight, dfMost] : kWindows) {
-        const CRSPtr poMap = ReadCRS(pszCRS), poFrom = MakeCompound(poMap, kEllips),
-                     poTo = MakeCompound(poMap, kOrtho);
-        const std::unique_ptr<ct::IMathTransform> poTransform(
-            utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
-        const auto Transform = [&](const Points& points) {
-            Points target(points.size());
-            const auto nPoints = static_cast<unsigned>(points.size() / 3);
-            poTransform->TransformPoints(points.data(), target.data(), nPoints);
-            return target;
-        };
         InterpGrid3D oGrid;
         oGrid.LayoutGrid(x, y, 10, x + dfWidth, y + dfHeight, 1500, 100, 100, 1490);
         const unsigned nNodes = oGrid.GetNumGridPoints();
         ASSERT_LE(nNodes, 150000U); // as long as a walk over a few thousand triangles
         Points nodes(std::size_t{3} * nNodes), centres;
         oGrid.GetGridPositions(nodes.data());
-        const Points heights = Transform(nodes);
+        const Points heights = Transform(pszCRS, nodes);
         for (std::size_t i = 0; i < nNodes; ++i)
             oGrid.GetArray()[i] = static_cast<double>(static_cast<float>(heights[3 * i + 2]));
         EXPECT_EQ(Points(nodes.end() - 3, nodes.end()), (Points{x + dfWidth, y + dfHeight, 1500}));
@@ -209,7 +204,7 @@ TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
                 for (std::size_t k = 0; k < 3; ++k)
                     centres.push_back(
                         k == 2 ? 755 : (nodes[3 * i + k] + nodes[3 * (i + nRow + 1) + k]) / 2);
-        const Points expected = Transform(centres);
+        const Points expected = Transform(pszCRS, centres);
         for (std::size_t i = 0; i < centres.size(); i += 3) {
             double dfFound = 0;
             oGrid.GetVal(centres[i], centres[i + 1], centres[i + 2], &dfFound);
@@ -228,12 +223,12 @@ TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {
     } oForeign;
     const CRSPtr poUtm = ReadCRS("EPSG:32616"), po3D = MakeCompound(poUtm, kOrtho),
                  poLocal = MakeCompound(ReadCRS(""), kOrtho);
-    const auto Transform = [](const CRSPtr& poSource, const CRSPtr& poTarget) {
+    const auto Create = [](const CRSPtr& poSource, const CRSPtr& poTarget) {
         utils::CreateCRSTransform(poSource.get(), poTarget.get(), 0.0);
     };
     for (const auto& work : std::vector<std::function<void()>>{
-             [&] { Transform(po3D, poLocal); }, [&] { Transform(poUtm, po3D); },
-             [&] { Transform(po3D, nullptr); }, [&] { utils::IsCRSLocal(&oForeign); },
+             [&] { Create(po3D, poLocal); }, [&] { Create(poUtm, po3D); },
+             [&] { Create(po3D, nullptr); }, [&] { utils::IsCRSLocal(&oForeign); },
              [&] { utils::CreateCompoundCS(poUtm.get(), kOrtho, cs::LinearUnitType(7)); },
              [] { ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(nullptr); }})
         EXPECT_TRUE(moTranscript.Refuses(work));

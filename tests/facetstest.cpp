@@ -1,15 +1,7 @@
-#include "tests/support/gdaltranscript.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/tinreader.h"
-#include "tin/tinreaderfactory.h"
+#include "tests/support/filetest.h"
 #include "tin/triangulate.h"
 
-#include <gtest/gtest.h>
-
-#include <array>
 #include <cmath>
-#include <memory>
 #include <random>
 #include <set>
 
@@ -19,15 +11,6 @@ using kelm::tin::Polygon;
 namespace {
 
 using Corner = std::array<double, 3>;
-using Ring = std::vector<Corner>;
-
-Ring ReadShape(ZARLayer_t* layer, int id) {
-    const ZARShape& shape = *ZARGetShapeRef(layer, id);
-    Ring ring;
-    for (int i = 0; i < shape.vertexCount; ++i)
-        ring.push_back({shape.vertices[i].x, shape.vertices[i].y, shape.vertices[i].z});
-    return ring;
-}
 
 /// The triangles that the library makes of a ring: it takes four vertices as they stand.
 std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
@@ -70,10 +53,8 @@ OGRGeometryUniquePtr Parse(const std::string& text) {
 }
 
 bool IsValid(const std::string& text) {
-    CPLPushErrorHandler(CPLQuietErrorHandler);
-    const bool valid = Parse(text)->IsValid();
-    CPLPopErrorHandler();
-    return valid;
+    const CPLErrorHandlerPusher quiet(CPLQuietErrorHandler);
+    return Parse(text)->IsValid();
 }
 
 std::set<Corner> FindCorners(const std::string& text) {
@@ -85,16 +66,10 @@ std::set<Corner> FindCorners(const std::string& text) {
     return corners;
 }
 
-struct FacetsTest : testing::Test {
-    FacetsTest() { moTranscript.moFolder = moFolder.GetPath(""); }
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> Open(const std::vector<std::string>& polygons) {
-        WriteLayer(moPath, "GPKG", {polygons, wkbPolygon25D});
-        moTranscript.Take(); // what GDAL says of the writing
-        return {ZAROpen(moPath.c_str(), "r"), ZARClose};
+struct FacetsTest : FileTest {
+    File Open(const std::vector<std::string>& polygons) {
+        return OpenFile(Write({polygons, wkbPolygon25D}));
     }
-    TemporaryFolder moFolder;
-    const std::string moPath = moFolder.GetPath("a.gpkg");
-    GdalTranscript moTranscript;
 };
 
 std::string MakeStar(unsigned corners) {
@@ -105,7 +80,8 @@ std::string MakeStar(unsigned corners) {
         text += FormatString("%.17g %.17g %u,", 9 + radius * std::cos(angle),
                              50 + radius * std::sin(angle), i);
     }
-    return text + FormatString("%.17g 50 0))", 9 + (std::mt19937(7)() % 2 ? 1e-3 : 1e-2));
+    text.back() = ')';
+    return text + ')';
 }
 
 const struct {
@@ -149,9 +125,7 @@ const struct {
     {"POLYGON Z ((0 0 1,8 0 2,0 8 3,0 0 1,0 0 1))", 1, 32},
     {"POLYGON Z ((0 0 1,8 0 2,0 8 3,0.0000000005 0 1))", 1, 32},
     {"POLYGON Z ((0 5 1,8 5 2,0 5 9,0 5 1,0 5 1))", 1, 32, true},
-    {"POLYGON Z ((0 0 1,8 0 2,8 8 3,8 8 3,0 8 4,0 0.0000000005 1))", 2, 64},
-    {"POLYGON Z ((0 0 1,8 0 2,0 8 3,0 0 1))", 1, 32},
-    {"POLYGON Z ((0 0 1,8 0 2,8 8 3,0 8 4,0 0 1))", 2, 64}};
+    {"POLYGON Z ((0 0 1,8 0 2,8 8 3,8 8 3,0 8 4,0 0.0000000005 1))", 2, 64}};
 
 TEST_F(FacetsTest, WhatIsValidIsCoveredExactlyAndKeepsItsCornersAndHeights) {
     for (const auto& [text, count, area, upright] : CASES) {
@@ -247,16 +221,13 @@ TEST_F(FacetsTest, WhatCannotBeUsedIsToldWithItsReason) {
 }
 
 TEST_F(FacetsTest, AFileOfBadPolygonsSilencesNobody) {
-    using kelm::tin::TinReaderFactory;
     const std::string given = "Triangulate(): Polygon# ";
     std::string told;
     for (const std::size_t bowTies : {1500U, 3U, 3U}) {
-        Open(std::vector<std::string>(bowTies, "POLYGON Z ((0 0 1,9 9 1,9 0 1,0 9 1,0 0 1))"))
-            .reset();
-        std::unique_ptr<kelm::tin::TinReader> reader(TinReaderFactory::CreateTinReader(
-            moPath.c_str(), 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
-        EXPECT_EQ(reader->Load(nullptr), nullptr);
-        reader.reset();
+        const std::string path =
+            Write({std::vector<std::string>(bowTies, "POLYGON Z ((0 0 1,9 9 1,9 0 1,0 9 1,0 0 1))"),
+                   wkbPolygon25D});
+        EXPECT_EQ(OpenReader(path)->Load(nullptr), nullptr);
         std::istringstream lines(moTranscript.Take());
         int count = 0;
         for (std::string line; getline(lines, line);)

@@ -1,18 +1,7 @@
-#include "services/reporting.h"
-#include "services/vectorlayer.h"
-#include "tests/support/gdaltranscript.h"
-#include "tests/support/temporaryfolder.h"
+#include "tests/support/filetest.h"
 #include "tin/tin.h"
-#include "tin/tinreader.h"
-#include "tin/tinreaderfactory.h"
-
-#include <gtest/gtest.h>
-#include <ogr_spatialref.h>
-
-#include <memory>
 
 using namespace kelm::test;
-using File = std::unique_ptr<_iobuf, decltype(&ZARClose)>;
 
 namespace {
 
@@ -48,11 +37,9 @@ std::string Describe(ZARLayer_t* poLayer) {
     return text;
 }
 
-class LandXmlTest : public testing::Test {
-  protected:
-    LandXmlTest() { moTranscript.moFolder = moFolder.GetPath(""); }
+struct LandXmlTest : FileTest {
     File Open(const std::string& text, const std::string& name = "a.xml") const {
-        return {ZAROpen(moFolder.WriteFile(name, text).c_str(), "r"), ZARClose};
+        return OpenFile(moFolder.WriteFile(name, text));
     }
     /// @return the layers of a document, or empty if it is refused
     std::string Read(const std::string& text) {
@@ -64,20 +51,16 @@ class LandXmlTest : public testing::Test {
         });
         return layers;
     }
-
-    TemporaryFolder moFolder;
-    GdalTranscript moTranscript;
 };
 
 TEST_F(LandXmlTest, EachVersionAndEncodingGivesTheSameSurface) {
     const std::string expected = "type 2 1=1231 2=2432";
-    for (const char* pszAttributes :
-         {"", " version='1.0' xmlns='http://www.landxml.org/schema/LandXML-1.0'",
-          " version='1.1' xmlns='http://www.landxml.org/schema/LandXML-1.1'",
-          " version='1.2' xmlns='http://www.landxml.org/schema/LandXML-1.2'",
-          " version='2.0' xmlns='http://www.landxml.org/schema/LandXML-2.0'"})
-        EXPECT_EQ(Read(Document("<Project/>" + kTin, pszAttributes)), expected) << pszAttributes;
-    std::string prefixed = Document(kTin, " xmlns:l='http://www.landxml.org/schema/LandXML-1.2'");
+    const std::string schema = "http://www.landxml.org/schema/LandXML-";
+    for (const std::string version : {"1.0", "1.1", "1.2", "2.0"}) {
+        const std::string attributes = " version='" + version + "' xmlns='" + schema + version;
+        EXPECT_EQ(Read(Document("<Project/>" + kTin, attributes + "'")), expected) << version;
+    }
+    std::string prefixed = Document(kTin, " xmlns:l='" + schema + "1.2'");
     for (std::size_t n = 30; (n = prefixed.find('<', n)) != std::string::npos; ++n)
         prefixed.insert(prefixed[n + 1] == '/' ? n + 2 : n + 1, "l:");
     prefixed.replace(prefixed.find("<LandXML"), 2, "<l:L");
@@ -101,14 +84,9 @@ TEST_F(LandXmlTest, PointsAreNorthingEastingElevation) {
     const std::string text = Document(Tin("<F>7 8 9</F>", points));
     const File poFile = Open("<!DOCTYPE LandXML [<!ENTITY n '4000002 500000'>]>" + text.substr(22));
     ZARLayer_t* poLayer = ZARGetLayer(poFile.get(), 1);
-    const ZARShape& oShape = *ZARGetShapeRef(poLayer, 1);
-    const double aadfCorners[][3] = {
-        {500000.25, 4e6, -1.5}, {500001, 4000001, 2}, {500000, 4000002, 3}};
-    for (int n = 0; n < 4; ++n) {
-        const ZARVertex& oVertex = oShape.vertices[n];
-        EXPECT_TRUE(oVertex.x == aadfCorners[n % 3][0] && oVertex.y == aadfCorners[n % 3][1] &&
-                    oVertex.z == aadfCorners[n % 3][2]);
-    }
+    const std::array<double, 3> first{500000.25, 4e6, -1.5};
+    EXPECT_EQ(ReadShape(poLayer, 1),
+              (Ring{first, {500001, 4000001, 2}, {500000, 4000002, 3}, first}));
     ZARVertex oLow, oHigh;
     ZARGetExtents(poLayer, &oLow, &oHigh);
     EXPECT_TRUE(oLow.x == 500000 && oLow.y == 4e6 && oLow.z == -1.5 && oHigh.x == 500001 &&
@@ -189,10 +167,8 @@ TEST_F(LandXmlTest, AnIncompleteOrHarmfulDocumentIsRefusedWhole) {
     }
     std::string bomb = "<!ENTITY e0 '0 10 1'>";
     for (int n = 0; n < 9; ++n)
-        bomb += "<!ENTITY e" + std::to_string(n + 1) + " '" +
-                FormatString("&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;", n, n, n, n, n, n,
-                             n, n, n, n) +
-                "'>";
+        bomb += FormatString("<!ENTITY e%d '&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;&e%d;'>", n + 1, n,
+                             n, n, n, n, n, n, n);
     const std::string secret = moFolder.WriteFile("secret", "<P id='1'>0 10 1</P>");
     for (const std::string& doctype :
          {bomb, "<!ENTITY e9 SYSTEM '" + secret + "'>",
@@ -205,11 +181,10 @@ TEST_F(LandXmlTest, AnIncompleteOrHarmfulDocumentIsRefusedWhole) {
 
 /// @return the CRS of a layer, its unit, and those of its heights; or empty
 std::string DescribeCrs(ZARLayer_t* poLayer) {
-    ProjInfo_t oInfo;
-    ZARGetProjectionInfo(poLayer, &oInfo);
+    const std::string definition = GetCrs(poLayer);
     OGRSpatialReference oCrs;
-    if (oInfo.definition.empty() || oCrs.SetFromUserInput(oInfo.definition.c_str()) != OGRERR_NONE)
-        return oInfo.definition;
+    if (definition.empty() || oCrs.SetFromUserInput(definition.c_str()) != OGRERR_NONE)
+        return definition;
     const char *pszName = oCrs.GetAttrValue("PROJCS"),
                *pszVertical = oCrs.GetAttrValue("COMPD_CS|VERT_CS");
     const double dfUnit = oCrs.GetTargetLinearUnits("PROJCS");
@@ -257,7 +232,6 @@ TEST_F(LandXmlTest, UnitsAndCoordinateSystemBecomeTheCrs) {
 }
 
 TEST_F(LandXmlTest, HeightsInFeetAreConvertedAsFeet) {
-    using namespace kelm;
     using namespace kelm::ogc::cs;
     for (const auto& [dfUnit, eFrom, eTo, dfExpected] :
          {std::tuple(1.0, VD_Orthometric, VD_Ellipsoidal, 347.0),
@@ -271,14 +245,11 @@ TEST_F(LandXmlTest, HeightsInFeetAreConvertedAsFeet) {
         const std::string text = FormatString("<Units><Imperial linearUnit='%s'/></Units>"
                                               "<CoordinateSystem epsgCode='32632'/>",
                                               dfUnit == 1 ? "meter" : "foot");
-        const std::unique_ptr<tin::TinReader> poReader(tin::TinReaderFactory::CreateTinReader(
-            moFolder
-                .WriteFile("a.xml",
-                           Document(text + Tin("<F>0 1 2</F>", "<Pnts>" + points + "</Pnts>")))
-                .c_str(),
-            0, 0, 1, eFrom));
+        const std::string surface = Tin("<F>0 1 2</F>", "<Pnts>" + points + "</Pnts>");
+        const auto poReader =
+            OpenReader(moFolder.WriteFile("a.xml", Document(text + surface)), 0, eFrom);
         poReader->SetOutputVerticalDatum(eTo);
-        const std::unique_ptr<tin::Tin> poTin(poReader->Load(nullptr));
+        const std::unique_ptr<kelm::tin::Tin> poTin(poReader->Load(nullptr));
         EXPECT_NEAR(double(poTin->GetVertex(0)->z) * dfUnit, dfExpected, 2)
             << "the geoid lies 47 m above the ellipsoid";
     }
@@ -294,9 +265,7 @@ TEST_F(LandXmlTest, AReaderLoadsAndLoadsAgainByWindow) {
     }
     const std::string path =
         moFolder.WriteFile("a.txt", Document(Tin(faces, "<Pnts>" + points + "</Pnts>")));
-    const std::unique_ptr<kelm::tin::TinReader> poReader(
-        kelm::tin::TinReaderFactory::CreateTinReader(path.c_str(), 0, 0, 1,
-                                                     kelm::ogc::cs::VD_Other));
+    const auto poReader = OpenReader(path);
     kelm::tin::BBox<double, point2_t<double>> oWindow;
     oWindow.min = {100.25, 0.5};
     oWindow.max = {100.5, 0.6};
@@ -315,15 +284,13 @@ TEST_F(LandXmlTest, AReaderLoadsAndLoadsAgainByWindow) {
 }
 
 TEST_F(LandXmlTest, FormatsThatAreNotReadAreRefusedWithAWayToConvertThem) {
-    const std::string city =
-        "{\n \"type\": \"CityJSON\", \"version\": \"1.1\", \"CityObjects\": {}, "
-        "\"vertices\": []}";
+    const char* pszCity = "{\n \"type\": \"CityJSON\", \"version\": \"1.1\", \"vertices\": []}";
     for (const char* pszName : {"a.city.json", "a.json"})
-        EXPECT_TRUE(moTranscript.Refuses([&] { Open(city, pszName); }));
+        EXPECT_TRUE(moTranscript.Refuses([&] { Open(pszCity, pszName); }));
     for (const char* pszName : {"tnxy.adf", "tnz.adf"})
         moFolder.WriteFile(pszName, "");
     for (const char* pszName : {"", "tnz.adf"})
-        EXPECT_TRUE(moTranscript.Refuses([&] { ZAROpen(moFolder.GetPath(pszName).c_str(), "r"); }));
+        EXPECT_TRUE(moTranscript.Refuses([&] { OpenFile(moFolder.GetPath(pszName)); }));
     EXPECT_TRUE(moTranscript.Refuses([&] { Open("<html/>"); })) << "other XML";
     const std::string square = R"({"type":"Polygon","coordinates":[[[0,0],[1,0],[0,1],[0,0]]]})";
     const File poFile =

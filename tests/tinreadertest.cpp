@@ -1,21 +1,15 @@
-#include "tin/tinreader.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/tinreaderfactory.h"
+#include "tests/support/filetest.h"
 
-#include <gtest/gtest.h>
-
-#include <memory>
 #include <thread>
 
 using namespace kelm::ogc::cs;
+using namespace kelm::test;
 using namespace kelm::tin;
 
 namespace {
 
 std::unique_ptr<Tin> LoadTerrain(DatumType eOutput) {
-    const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-        KELM_TIN_DATA_DIR "/jacksboro.gpkg", 0, 0.0, 1.0, VD_Orthometric));
+    const auto reader = OpenReader(KELM_TIN_DATA_DIR "/jacksboro.gpkg", 0, VD_Orthometric);
     reader->SetOutputVerticalDatum(eOutput);
     return std::unique_ptr<Tin>(reader->Load(nullptr));
 }
@@ -36,18 +30,17 @@ TEST(TinReaderTest, TheTerrainIsTheSameOnEveryThreadAndChangesItsDatum) {
 }
 
 TEST(TinReaderTest, ALargeSurfaceInDegreesHasTheHeightsOfItsPartsNorthAndSouth) {
-    const kelm::test::TemporaryFolder folder;
+    const TemporaryFolder folder;
     for (const point2_t<double> at : {point2_t<double>{24.1, 60.2}, {-70.6, -45.7}}) {
-        kelm::test::LayerText layer{{}, wkbPolygon25D, "EPSG:4326"};
+        LayerText layer{{}, wkbPolygon25D, "EPSG:4326"};
         for (int i = 0; i < 400; ++i) {
             const double x = at.x + i * 0.002, y = at.y + i * 0.002;
             layer.moGeometries.push_back(
                 FormatString("POLYGON Z ((%f %f 90,%f %f 80,%f %f %d,%f %f 90))", x, y, x + 0.001,
                              y, x, y + 0.001, i, x, y));
         }
-        const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-            kelm::test::WriteLayer(folder.GetPath("a.gpkg"), "GPKG", layer).c_str(), 0, 0.0, 1.0,
-            VD_Ellipsoidal));
+        const auto reader =
+            OpenReader(WriteLayer(folder.GetPath("a.gpkg"), "GPKG", layer), 0, VD_Ellipsoidal);
         reader->SetOutputVerticalDatum(VD_Orthometric);
         const std::unique_ptr<Tin> whole(reader->Load(nullptr)); // by a grid
         kelm::tin::BBox<double, point2_t<double>> window{};

@@ -39,14 +39,24 @@ inline void AddFeatures(OGRLayer& oLayer, const LayerText& oText) {
         throw std::runtime_error(CPLGetLastErrorMsg());
 }
 
+inline GDALDatasetUniquePtr Create(const std::string& path, const char* pszFormat,
+                                   CSLConstList papszOptions = nullptr) {
+    GDALAllRegister();
+    std::filesystem::remove_all(path);
+    GDALDriver& oDriver = *GetGDALDriverManager()->GetDriverByName(pszFormat);
+    return GDALDatasetUniquePtr(
+        oDriver.Create(path.c_str(), 0, 0, 0, GDT_Unknown, const_cast<char**>(papszOptions)));
+}
+
+inline GDALDatasetUniquePtr OpenForUpdate(const std::string& path) {
+    return GDALDatasetUniquePtr(GDALDataset::Open(path.c_str(), GDAL_OF_VECTOR | GDAL_OF_UPDATE));
+}
+
 /// Writes a new file of a layer "facets", and another if wanted. @param format short name of a GDAL
 /// driver @return path @throw std::runtime_error with GDAL's reason
 inline std::string WriteLayer(const std::string& path, const std::string& format,
                               const LayerText& oText, bool bTwice = false) {
-    GDALAllRegister();
-    std::filesystem::remove_all(path);
-    GDALDriver* poDriver = GetGDALDriverManager()->GetDriverByName(format.c_str());
-    GDALDatasetUniquePtr poDataset(poDriver->Create(path.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
+    const GDALDatasetUniquePtr poDataset = Create(path, format.c_str());
     OGRSpatialReference oCrs;
     oCrs.SetFromUserInput(oText.moCrs.c_str());
     CPLStringList oOptions;
