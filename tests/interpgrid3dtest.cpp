@@ -1,8 +1,6 @@
 #include "services/interpgrid3d.h"
 #include "tests/support/transcript.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <array>
 #include <cmath>

@@ -53,6 +53,15 @@ struct OpenTin : Tin {
     }
 };
 
+using Corners = std::vector<Point>;
+
+struct OwnTriangle : Triangle {
+    explicit OwnTriangle(const Corners& v) : corners(v) {
+        SetVertices(&corners[0], &corners[1], &corners[2]);
+    }
+    Corners corners;
+};
+
 struct Mesh {
     std::vector<Point> vertices;
     std::vector<Triangle_Id> ids;
