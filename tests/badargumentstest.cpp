@@ -5,8 +5,6 @@
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
-#include <functional>
-
 namespace kelm::tin::test {
 
 constexpr double NaN = std::numeric_limits<double>::quiet_NaN();

@@ -7,7 +7,6 @@
 #include <set>
 
 using namespace kelm::test;
-using kelm::tin::Polygon;
 
 namespace {
 
@@ -21,7 +20,7 @@ std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
     for (const auto& [x, y, z] : ring)
         vertices.push_back({x, y, z});
     const ZARShape shape{vertices.data(), static_cast<int>(vertices.size())};
-    const Polygon<double> polygon(&shape, PO_Undefined);
+    const kelm::tin::Polygon<double> polygon(&shape, PO_Undefined);
     std::vector<Triangle_Id> ids;
     static_cast<void>(Triangulate(polygon, ids));
     const auto getCorner = [&](unsigned id) {
@@ -42,11 +41,6 @@ double ComputeArea(const Ring& t, bool plan) {
     const Vector3 a(t[1][0] - t[0][0], t[1][1] - t[0][1], t[1][2] - t[0][2]);
     const Vector3 b(t[2][0] - t[0][0], t[2][1] - t[0][1], t[2][2] - t[0][2]);
     return (plan ? (a ^ b).z : (a ^ b).Length()) / 2;
-}
-
-bool IsValid(const std::string& text) {
-    const CPLErrorHandlerPusher quiet(CPLQuietErrorHandler);
-    return Parse(text)->IsValid();
 }
 
 std::set<Corner> FindCorners(const std::string& text) {
@@ -138,7 +132,6 @@ TEST_F(FacetsTest, WhatIsValidIsCoveredExactlyAndKeepsItsCornersAndHeights) {
             }
         }
         EXPECT_EQ(triangles, count) << text.substr(0, 200);
-        EXPECT_EQ(layer->shapeCount, static_cast<int>(shapes.size()));
         EXPECT_TRUE(area == 0 || std::fabs(sum - area) <= (upright ? 1e-2 : 0)) << text << sum;
         for (const std::size_t i : {shapes.size() - 1, shapes.size() / 2, std::size_t{0}})
             EXPECT_EQ(ReadShape(layer, shapes[i].first), shapes[i].second);
@@ -174,13 +167,14 @@ TEST_F(FacetsTest, ARingIsDeliveredAsItIsStoredIfTheLibraryCutsItAndElseCutIfItI
     const auto file = Open(texts);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     std::size_t taken = 0, cut = 0;
-    const int factor = ZARGetNext(layer, -1); // the shape id of feature 1
+    const CPLErrorHandlerPusher quiet(CPLQuietErrorHandler); // it says why one is not valid
+    const int factor = ZARGetNext(layer, -1);                // the shape id of feature 1
     for (std::size_t n = 0; n < rings.size(); ++n) {
         const Ring shape = ReadShape(layer, static_cast<int>(n + 1) * factor);
         if (!CutAsTheLibrary(rings[n]).empty()) {
             ASSERT_EQ(shape, rings[n]) << texts[n];
             ++taken;
-        } else if (IsValid(texts[n])) {
+        } else if (Parse(texts[n])->IsValid()) {
             ASSERT_EQ(shape.size(), 4U) << texts[n];
             ++cut;
         }

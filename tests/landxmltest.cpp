@@ -101,8 +101,7 @@ const struct {
     // Invisible faces and neighbours; several blocks; elements of others.
     {Tin("<F i='1'>1 2 3</F><F i='0' n='0 1 0'>2 4 3</F>"), "type 2 2=2432"},
     {Tin("<F>1 2 3</F></Faces>" + kPoints +
-             "<Faces>x<Feature><F>1 2 3</F></Feature>"
-             "<F>2 <x>9</x>4 3</F>",
+             "<Faces>x<Feature><F>1 2 3</F></Feature><F>2 <x>9</x>4 3</F>",
          "<Faces><F>4 2 1</F></Faces>"),
      "type 2 1=4214 2=1231 3=2432"},
     {Tin("<F>2147483648 7 4294967295</F><F>7 11 2147483648</F>",
@@ -110,17 +109,16 @@ const struct {
          "<P id='7'>0 1 2</P></Pnts>"),
      "type 2 1=1231 2=2412"},
     // Four corners: both diagonals, upright, crossing itself, one corner on a side, a triangle.
-    {Tin("<F>1 2 4 3</F><F>2 5 3 1</F><F>5 3 1 2</F>"), "type 2 10=1241 11=1431 20=2512 21=5315 "
-                                                        "30=5315 31=5125"},
+    {Tin("<F>1 2 4 3</F><F>2 5 3 1</F><F>5 3 1 2</F>"),
+     "type 2 10=1241 11=1431 20=2512 21=5315 30=5315 31=5125"},
     {Tin("<F>6 7 8 9</F>", "<Pnts><P id='6'>0 0 1</P><P id='7'>0 1 2</P><P id='8'>0 1 3</P>"
                            "<P id='9'>0 0 4</P></Pnts>"),
      "type 2 10=1231 11=1341"},
     {Tin("<F>1 2 3 4</F><F>1 2 3 3</F><F>1 1 2 3</F><F>3 1 2 3</F>"),
      "type 2 2=1231 3=1231 4=3123"},
     // Damaged records cost themselves.
-    {Tin("<F>1 2 3</F>\n<F>1 2 9</F><F>1 2</F>\n\n<F>1 2 3 4 5</F><F>1 2 x</F><F>1 2 -3</F><F>1 2 "
-         "2</F>"
-         "<F/><F>1 2 4294967296</F><F>1 2 1 3</F><F>2 4 3</F>"),
+    {Tin("<F>1 2 3</F>\n<F>1 2 9</F><F>1 2</F>\n\n<F>1 2 3 4 5</F><F>1 2 x</F><F>1 2 -3</F>"
+         "<F>1 2 2</F><F/><F>1 2 4294967296</F><F>1 2 1 3</F><F>2 4 3</F>"),
      "type 2 1=1231 11=2432"},
     {Tin("<F>1 2 3</F><F>1 2 6</F><F>1 2 7</F><F>1 3 8</F><F>1 3 9</F><F>2 4 3</F>",
          kPoints +

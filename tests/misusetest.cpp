@@ -2,8 +2,6 @@
 #include "tests/support/sheets.h"
 #include "tests/support/transcript.h"
 
-#include <functional>
-
 // What headers let a caller write must not crash. Bad releases show under the address sanitizer.
 
 namespace kelm::tin::test {
@@ -16,13 +14,6 @@ Mesh MakeSmallSheet(unsigned triangles) {
         mesh.Add({x, 0, 1}, {x + 1, 0, 2}, {x, 1, 3});
     }
     return mesh;
-}
-
-Indices GetAllLeaves(const AabbTree& tree) {
-    Indices all;
-    tree.FindLeaves(EVERYWHERE, all);
-    std::sort(all.begin(), all.end());
-    return all;
 }
 
 TEST(MisuseTest, ATreeOfAnotherNumberOfTrianglesIsRefusedByEveryQuery) {
@@ -88,9 +79,7 @@ TEST(MisuseTest, TreesAndNodesMoveSwapAndStandInAVector) {
         EXPECT_EQ(GetAllLeaves(trees[i]), large.GetAll());
         EXPECT_EQ(trees[i].GetTriangleCount(), 60U);
     }
-    Indices below;
-    nodes[0].FindLeaves(EVERYWHERE, below);
-    EXPECT_EQ(below.size(), 60U);
+    EXPECT_EQ(GetAllLeaves(nodes[0]).size(), 60U);
     AabbTree left = std::move(trees[0]);
     EXPECT_TRUE(trees[0].GetRoot() == nullptr && trees[0].GetObjBytes() == 32);
     EXPECT_EQ(left.GetNodeCount(), trees[5].GetNodeCount());
@@ -182,8 +171,7 @@ TEST(MisuseTest, BothConstructorsRefuseNullOnlyWhereItIsNeeded) {
 }
 
 TEST(MisuseTest, TheNumberOfCellsSaturates) {
-    constexpr float SIDE = 1 << 17;
-    const OwnTriangle triangle({{0, 0, 0}, {3 * SIDE, 0, 0}, {0, 3 * SIDE, 0}});
+    const OwnTriangle triangle({{0, 0, 0}, {0x3p17F, 0, 0}, {0, 0x3p17F, 0}});
     EXPECT_EQ(triangle.GetGridPointsNum(1 << 15, 1 << 15), ((1U << 15) - 1) << 15);
     EXPECT_EQ(triangle.GetGridPointsNum(1 << 16, (1 << 16) + 1), 4294967295U); // one row is open
     EXPECT_EQ(triangle.GetGridPointsNum(1 << 17, 1 << 17), 4294967295U);

@@ -7,8 +7,6 @@
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
-#include <memory>
-
 using kelm::ogc::cs::DatumType;
 using kelm::tin::AabbTree;
 using kelm::tin::TinReader;

@@ -1,7 +1,5 @@
 #include "tests/scripted/readerfixture.h"
 
-#include <functional>
-
 namespace {
 
 TEST_F(ReaderTest, AnUnfitFileOrArgumentIsRefusedInTheWordsOfItsFault) {

@@ -81,6 +81,15 @@ struct Mesh {
     }
 };
 
+/// @return the sorted triangles of a tree or node
+template <typename T>
+Indices GetAllLeaves(const T& tree) {
+    Indices all;
+    tree.FindLeaves(EVERYWHERE, all);
+    std::sort(all.begin(), all.end());
+    return all;
+}
+
 /// 23 by 23 squares of 10 by 10, work for a team of threads; each node moves by up to fJitter.
 inline Mesh MakeSheet(float fJitter, Random& random) {
     Mesh mesh;
