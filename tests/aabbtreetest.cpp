@@ -95,9 +95,7 @@ TEST(AabbNodeTest, OnlyTheTopOfABuildReleasesIt) {
         leaf = leaf->GetLeft();
     *leaf = AabbNode();
     leaf->CreateChild(tin.GetTriangle(0), tin.GetAll(), &tree); // a top among the nodes of another
-    Indices all;
-    leaf->FindLeaves(EVERYWHERE, all);
-    EXPECT_EQ(all.size(), tin.GetTriangleCount());
+    EXPECT_EQ(GetAllLeaves(*leaf), tin.GetAll());
 }
 
 } // namespace

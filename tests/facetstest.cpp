@@ -1,12 +1,12 @@
 #include "tests/support/filetest.h"
 #include "tin/triangulate.h"
+#include "tin/vector3.h"
 
 #include <cmath>
 #include <random>
 #include <set>
 
 using namespace kelm::test;
-using kelm::tin::Polygon;
 
 namespace {
 
@@ -20,7 +20,7 @@ std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
     for (const auto& [x, y, z] : ring)
         vertices.push_back({x, y, z});
     const ZARShape shape{vertices.data(), static_cast<int>(vertices.size())};
-    const Polygon<double> polygon(&shape, PO_Undefined);
+    const kelm::tin::Polygon<double> polygon(&shape, PO_Undefined);
     std::vector<Triangle_Id> ids;
     static_cast<void>(Triangulate(polygon, ids));
     const auto getCorner = [&](unsigned id) {
@@ -37,24 +37,10 @@ std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
 
 /// @return area in space, or in plan: negative if the triangle is clockwise
 double ComputeArea(const Ring& t, bool plan) {
-    Corner a, b;
-    for (const unsigned i : {0U, 1U, 2U}) {
-        a[i] = t[1][i] - t[0][i];
-        b[i] = t[2][i] - t[0][i];
-    }
-    const double z = a[0] * b[1] - a[1] * b[0];
-    return plan ? z / 2 : std::hypot(a[1] * b[2] - a[2] * b[1], a[2] * b[0] - a[0] * b[2], z) / 2;
-}
-
-OGRGeometryUniquePtr Parse(const std::string& text) {
-    OGRGeometry* geometry = nullptr;
-    OGRGeometryFactory::createFromWkt(text.c_str(), nullptr, &geometry);
-    return OGRGeometryUniquePtr(geometry);
-}
-
-bool IsValid(const std::string& text) {
-    const CPLErrorHandlerPusher quiet(CPLQuietErrorHandler);
-    return Parse(text)->IsValid();
+    using kelm::tin::Vector3;
+    const Vector3 a(t[1][0] - t[0][0], t[1][1] - t[0][1], t[1][2] - t[0][2]);
+    const Vector3 b(t[2][0] - t[0][0], t[2][1] - t[0][1], t[2][2] - t[0][2]);
+    return (plan ? (a ^ b).z : (a ^ b).Length()) / 2;
 }
 
 std::set<Corner> FindCorners(const std::string& text) {
@@ -132,22 +118,20 @@ TEST_F(FacetsTest, WhatIsValidIsCoveredExactlyAndKeepsItsCornersAndHeights) {
         const auto file = Open({text});
         ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
         std::vector<std::pair<int, Ring>> shapes;
-        std::vector<Ring> triangles;
+        const std::set<Corner> corners = FindCorners(text);
+        std::size_t triangles = 0;
+        double sum = 0;
         for (int id = ZARGetNext(layer, -1); id != -1; id = ZARGetNext(layer, id)) {
             shapes.emplace_back(id, ReadShape(layer, id));
-            for (const Ring& triangle : CutAsTheLibrary(shapes.back().second))
-                triangles.push_back(triangle);
+            for (const Ring& triangle : CutAsTheLibrary(shapes.back().second)) {
+                ++triangles;
+                sum += ComputeArea(triangle, !upright);
+                EXPECT_NE(ComputeArea(triangle, !upright), 0);
+                for (const Corner& corner : triangle)
+                    EXPECT_EQ(corners.count(corner), 1U) << text;
+            }
         }
-        const std::set<Corner> corners = FindCorners(text);
-        double sum = 0;
-        for (const Ring& triangle : triangles) {
-            sum += ComputeArea(triangle, !upright);
-            for (const Corner& corner : triangle)
-                EXPECT_EQ(corners.count(corner), 1U) << text;
-            EXPECT_NE(ComputeArea(triangle, !upright), 0);
-        }
-        EXPECT_EQ(triangles.size(), count) << text.substr(0, 200);
-        EXPECT_EQ(layer->shapeCount, static_cast<int>(shapes.size()));
+        EXPECT_EQ(triangles, count) << text.substr(0, 200);
         EXPECT_TRUE(area == 0 || std::fabs(sum - area) <= (upright ? 1e-2 : 0)) << text << sum;
         for (const std::size_t i : {shapes.size() - 1, shapes.size() / 2, std::size_t{0}})
             EXPECT_EQ(ReadShape(layer, shapes[i].first), shapes[i].second);
@@ -183,13 +167,14 @@ TEST_F(FacetsTest, ARingIsDeliveredAsItIsStoredIfTheLibraryCutsItAndElseCutIfItI
     const auto file = Open(texts);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     std::size_t taken = 0, cut = 0;
-    const int factor = ZARGetNext(layer, -1); // the shape id of feature 1
+    const CPLErrorHandlerPusher quiet(CPLQuietErrorHandler); // it says why one is not valid
+    const int factor = ZARGetNext(layer, -1);                // the shape id of feature 1
     for (std::size_t n = 0; n < rings.size(); ++n) {
         const Ring shape = ReadShape(layer, static_cast<int>(n + 1) * factor);
         if (!CutAsTheLibrary(rings[n]).empty()) {
             ASSERT_EQ(shape, rings[n]) << texts[n];
             ++taken;
-        } else if (IsValid(texts[n])) {
+        } else if (Parse(texts[n])->IsValid()) {
             ASSERT_EQ(shape.size(), 4U) << texts[n];
             ++cut;
         }

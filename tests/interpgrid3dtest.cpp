@@ -1,14 +1,10 @@
 #include "services/interpgrid3d.h"
 #include "tests/support/transcript.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <random>
-#include <tuple>
-#include <vector>
 
 namespace {
 

@@ -101,8 +101,7 @@ const struct {
     // Invisible faces and neighbours; several blocks; elements of others.
     {Tin("<F i='1'>1 2 3</F><F i='0' n='0 1 0'>2 4 3</F>"), "type 2 2=2432"},
     {Tin("<F>1 2 3</F></Faces>" + kPoints +
-             "<Faces>x<Feature><F>1 2 3</F></Feature>"
-             "<F>2 <x>9</x>4 3</F>",
+             "<Faces>x<Feature><F>1 2 3</F></Feature><F>2 <x>9</x>4 3</F>",
          "<Faces><F>4 2 1</F></Faces>"),
      "type 2 1=4214 2=1231 3=2432"},
     {Tin("<F>2147483648 7 4294967295</F><F>7 11 2147483648</F>",
@@ -110,17 +109,16 @@ const struct {
          "<P id='7'>0 1 2</P></Pnts>"),
      "type 2 1=1231 2=2412"},
     // Four corners: both diagonals, upright, crossing itself, one corner on a side, a triangle.
-    {Tin("<F>1 2 4 3</F><F>2 5 3 1</F><F>5 3 1 2</F>"), "type 2 10=1241 11=1431 20=2512 21=5315 "
-                                                        "30=5315 31=5125"},
+    {Tin("<F>1 2 4 3</F><F>2 5 3 1</F><F>5 3 1 2</F>"),
+     "type 2 10=1241 11=1431 20=2512 21=5315 30=5315 31=5125"},
     {Tin("<F>6 7 8 9</F>", "<Pnts><P id='6'>0 0 1</P><P id='7'>0 1 2</P><P id='8'>0 1 3</P>"
                            "<P id='9'>0 0 4</P></Pnts>"),
      "type 2 10=1231 11=1341"},
     {Tin("<F>1 2 3 4</F><F>1 2 3 3</F><F>1 1 2 3</F><F>3 1 2 3</F>"),
      "type 2 2=1231 3=1231 4=3123"},
     // Damaged records cost themselves.
-    {Tin("<F>1 2 3</F>\n<F>1 2 9</F><F>1 2</F>\n\n<F>1 2 3 4 5</F><F>1 2 x</F><F>1 2 -3</F><F>1 2 "
-         "2</F>"
-         "<F/><F>1 2 4294967296</F><F>1 2 1 3</F><F>2 4 3</F>"),
+    {Tin("<F>1 2 3</F>\n<F>1 2 9</F><F>1 2</F>\n\n<F>1 2 3 4 5</F><F>1 2 x</F><F>1 2 -3</F>"
+         "<F>1 2 2</F><F/><F>1 2 4294967296</F><F>1 2 1 3</F><F>2 4 3</F>"),
      "type 2 1=1231 11=2432"},
     {Tin("<F>1 2 3</F><F>1 2 6</F><F>1 2 7</F><F>1 3 8</F><F>1 3 9</F><F>2 4 3</F>",
          kPoints +
@@ -161,9 +159,6 @@ TEST_F(LandXmlTest, AnIncompleteOrHarmfulDocumentIsRefusedWhole) {
     const std::string whole = Document(kTin);
     for (std::size_t nCut = 25; nCut-- > 0;) {
         EXPECT_EQ(Read(whole.substr(0, (whole.size() - 2) * nCut / 24)), "") << nCut;
-        if (nCut != 12)
-            moTranscript.moLines.erase(
-                moTranscript.moLines.rfind('\n', moTranscript.moLines.size() - 2) + 1);
     }
     std::string bomb = "<!ENTITY e0 '0 10 1'>";
     for (int n = 0; n < 9; ++n)
@@ -233,51 +228,29 @@ TEST_F(LandXmlTest, UnitsAndCoordinateSystemBecomeTheCrs) {
 
 TEST_F(LandXmlTest, HeightsInFeetAreConvertedAsFeet) {
     using namespace kelm::ogc::cs;
-    for (const auto& [dfUnit, eFrom, eTo, dfExpected] :
-         {std::tuple(1.0, VD_Orthometric, VD_Ellipsoidal, 347.0),
-          std::tuple(0.3048, VD_Orthometric, VD_Ellipsoidal, 347.0),
-          std::tuple(0.3048, VD_Ellipsoidal, VD_Orthometric, 253.0)}) {
-        std::string points;
-        for (int n = 0; n < 3; ++n)
-            points +=
-                FormatString("<P id='%d'>%.9f %.9f %.9f</P>", n, (5300000 + n / 2 * 9) / dfUnit,
-                             (500000 + n % 2 * 9) / dfUnit, 300 / dfUnit);
-        const std::string text = FormatString("<Units><Imperial linearUnit='%s'/></Units>"
-                                              "<CoordinateSystem epsgCode='32632'/>",
-                                              dfUnit == 1 ? "meter" : "foot");
-        const std::string surface = Tin("<F>0 1 2</F>", "<Pnts>" + points + "</Pnts>");
-        const auto poReader =
-            OpenReader(moFolder.WriteFile("a.xml", Document(text + surface)), 0, eFrom);
+    const std::string units = "<Units><Imperial linearUnit='foot'/></Units>"
+                              "<CoordinateSystem epsgCode='32632'/>";
+    const std::string points = "<Pnts><P id='0'>17388451 1640420 984</P><P id='1'>17388451 1640450 "
+                               "984</P><P id='2'>17388481 1640420 984</P></Pnts>";
+    const std::string path =
+        moFolder.WriteFile("a.xml", Document(units + Tin("<F>0 1 2</F>", points)));
+    for (const auto& [eFrom, eTo, dfMetres] :
+         {std::tuple(VD_Orthometric, VD_Ellipsoidal, 47), {VD_Ellipsoidal, VD_Orthometric, -47}}) {
+        const auto poReader = OpenReader(path, 0, eFrom);
         poReader->SetOutputVerticalDatum(eTo);
         const std::unique_ptr<kelm::tin::Tin> poTin(poReader->Load(nullptr));
-        EXPECT_NEAR(double(poTin->GetVertex(0)->z) * dfUnit, dfExpected, 2)
+        EXPECT_NEAR(poTin->GetVertex(0)->z, 984 + dfMetres / 0.3048, 6)
             << "the geoid lies 47 m above the ellipsoid";
     }
     moTranscript.Take();
 }
 
-TEST_F(LandXmlTest, AReaderLoadsAndLoadsAgainByWindow) {
-    std::string points, faces;
-    for (int n = 1; n <= 300; ++n) {
-        points += FormatString("<P id='%d'>%d %d %d</P>", n * 3, n % 2, n, n);
-        if (n > 2)
-            faces += FormatString("<F>%d %d %d</F>", n * 3 - 6, n * 3 - 3, n * 3);
-    }
-    const std::string path =
-        moFolder.WriteFile("a.txt", Document(Tin(faces, "<Pnts>" + points + "</Pnts>")));
-    const auto poReader = OpenReader(path);
-    kelm::tin::BBox<double, point2_t<double>> oWindow;
-    oWindow.min = {100.25, 0.5};
-    oWindow.max = {100.5, 0.6};
-    for (int n = 0; n < 2; ++n) {
-        const std::unique_ptr<kelm::tin::Tin> poPart(poReader->Load(&oWindow)),
-            poAll(poReader->Load(nullptr));
-        EXPECT_EQ(poPart->GetTriangleCount(), 2U);
-        EXPECT_EQ(poAll->GetTriangleCount(), 298U);
-    }
+TEST_F(LandXmlTest, ShapesAreFoundInAnyOrderAndWalkedAgain) {
     const File poFile = Open(Document(Tin("<F>1 2 4 3</F><F i='1'>1 2 3</F><F>1 2 3</F>")));
     ZARLayer_t* poLayer = ZARGetLayer(poFile.get(), 1);
     EXPECT_EQ(ZARGetNext(poLayer, 11), 30);
+    EXPECT_EQ(Describe(poLayer), "type 2 10=1241 11=1431 30=1231");
+    EXPECT_EQ(Describe(poLayer), "type 2 10=1241 11=1431 30=1231");
     EXPECT_EQ(ZARGetShapeRef(poLayer, 10)->vertices[1].z, 2) << "in any order";
     for (const int nUnknown : {-2, 1, 12, 20, 31, 2147483647})
         EXPECT_TRUE(moTranscript.Refuses([&] { ZARGetNext(poLayer, nUnknown); }));
@@ -297,7 +270,6 @@ TEST_F(LandXmlTest, FormatsThatAreNotReadAreRefusedWithAWayToConvertThem) {
         Open(R"({"type":"Feature","properties":{"type":"CityJSON"},"geometry":)" + square + "}",
              "b.json");
     EXPECT_EQ(Describe(ZARGetLayer(poFile.get(), 1)), "type 2 0=0000");
-    moTranscript.moLines.erase(moTranscript.moLines.rfind("The layer"));
 }
 
 } // namespace

@@ -66,10 +66,6 @@ TEST_F(VectorLayerTest, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) 
         }
     }
     moTranscript.moLines = half;
-    const char* pszDrawing =
-        "0\nSECTION\n2\nENTITIES\n0\n3DFACE\n10\n0\n20\n0\n30\n0\n11\n0\n21\n1\n"
-        "31\n1\n12\n1\n22\n0\n32\n2\n0\nENDSEC\n0\nEOF\n";
-    EXPECT_EQ(Read(moFolder.WriteFile("a.dxf", pszDrawing)).moRings[0], MakeRing(0, 0, 0));
 }
 
 const struct {
@@ -201,9 +197,8 @@ TEST_F(VectorLayerTest, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
 
     const std::string spy = moFolder.GetPath("spy.sqlite"), other = WriteRow(kShape, 1);
     const std::string table = "VirtualShape('" + other.substr(0, other.size() - 4) + "','UTF-8',0)";
-    CPLStringList oOptions;
-    oOptions.AddString("SPATIALITE=YES");
-    GDALDatasetUniquePtr poSpy = Create(spy, "SQLite", oOptions.List());
+    GDALDatasetUniquePtr poSpy =
+        Create(spy, "SQLite", CPLStringList().AddString("SPATIALITE=YES").List());
     if (!poSpy)
         GTEST_SKIP() << "GDAL is built without the library that reads other files";
     poSpy->ExecuteSQL(("CREATE VIRTUAL TABLE spy USING " + table).c_str(), nullptr, nullptr);

@@ -17,19 +17,17 @@ using kelm::tin::test::Mesh, kelm::tin::test::Point, kelm::tin::test::Point2;
 constexpr double BASE_X = 500000.25;
 constexpr double BASE_Y = 4649776.5;
 
-/// Linear congruential generator (Knuth, The Art of Computer Programming, volume 2, section 3.3.4).
-class Random {
-  public:
+/// After Knuth, The Art of Computer Programming, volume 2, section 3.3.4.
+struct Random {
     /// @return an integer from 0 to n - 1
     std::uint32_t Below(std::uint32_t n) {
-        state = state * 6364136223846793005u + 1442695040888963407u;
-        return static_cast<std::uint32_t>(((state >> 32) * n) >> 32);
+        return static_cast<std::uint32_t>(((engine() >> 32) * n) >> 32);
     }
     /// @return thousandths from 0 to below n units
     double Milli(std::uint32_t n) { return Below(n * 1000) / 1000.0; }
 
-  private:
-    std::uint64_t state = 1;
+    std::linear_congruential_engine<std::uint64_t, 6364136223846793005u, 1442695040888963407u, 0>
+        engine{1};
 };
 
 /// Nodes 10 m apart with 3 m of jitter in millimetres, two triangles a cell with one in fifty left
