@@ -134,6 +134,9 @@ TEST(TinSubsetTest, OfCopiesTooRenumbersWhatIsListedMaskedOrFoundInMapCoordinate
         for (unsigned i = 0; i < 20; ++i) {
             OpenTin made = mesh.MakeTin(BASE_X, BASE_Y), assigned = Mesh(mesh).MakeTin();
             const OpenTin copy(made), moved(std::move(made));
+            // A copy assignment does not release them.
+            const std::unique_ptr<const Point[]> vertices(assigned.GetVertex(0));
+            const std::unique_ptr<const Triangle[]> triangles(assigned.GetTriangle(0));
             assigned = moved;
             const OpenTin& tin = i % 4 == 0 ? copy : i % 4 == 1 ? moved : assigned;
             ExpectOnMap(tin, tin, tin.GetAll(), *tin.GetVertex(i));
