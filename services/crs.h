@@ -5,8 +5,8 @@
 /// Contract of the coordinate reference services: CRS objects and the transform between them.
 ///
 /// An operation that cannot deliver its result throws; the library does not test what the functions
-/// of this header return. An object
-/// is used by one thread at a time; different objects may be used on different threads.
+/// of this header return. An object is used by one thread at a time; different objects may be used
+/// on different threads.
 
 struct ProjInfo_t;
 

@@ -20,11 +20,10 @@
 /// last two nodes before it, one through the next two nodes behind it, each with the cell's own
 /// end. If the two lines meet in the cell, on one side of the straight line between its ends, they
 /// replace that line (subcell resolution: Harten, Journal of Computational Physics 83, 1989). That
-/// restores a
-/// function of one kink in three cells exactly. Elsewhere, in the outermost cells and in z, the
-/// value is linear. x is interpolated first, then y, then z. A position outside the box is first
-/// moved to its nearest face. Coordinates, spacings and values have the units that the caller gives
-/// them.
+/// restores a function of one kink in three cells exactly. Elsewhere, in the outermost cells and in
+/// z, the value is linear. x is interpolated first, then y, then z. A position outside the box is
+/// first moved to its nearest face. Coordinates, spacings and values have the units that the caller
+/// gives them.
 ///
 /// One thread sets a grid up; then any number may read it.
 class KELM_SERVICES_EXPORT InterpGrid3D {

@@ -22,8 +22,7 @@ class AabbTree;
 ///
 /// A surface is empty, with both arrays null, or has vertices and triangles. Only an assignment or
 /// a move changes which arrays it has. A surface made from arrays owns them; they must come from
-/// the array form of new. What its accessors hand out stays
-/// its own.
+/// the array form of new. What its accessors hand out stays its own.
 ///
 /// A copy refers to the same arrays but does not own them. Do not use it after the owner is gone. A
 /// move hands the ownership on; the source still refers to the arrays, as a copy does.

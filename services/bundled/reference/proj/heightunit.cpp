@@ -5,7 +5,7 @@
 
 #include <proj_experimental.h>
 
-#include <vector>
+#include <array>
 
 namespace kelm::ogc {
 
@@ -16,9 +16,11 @@ constexpr const char* SOURCE = "services/bundled/reference/proj/heightunit";
 /// @return the coordinate system of a CRS with three axes, the last one in this unit
 PjPtr CreateAxes(ProjSession& session, const PJ* crs, const HeightUnit& unit) {
     const PjPtr system(proj_crs_get_coordinate_system(session.Get(), crs));
-    const int count = system ? proj_cs_get_axis_count(session.Get(), system.get()) : 0;
-    std::vector<PJ_AXIS_DESCRIPTION> axes(static_cast<std::size_t>(count));
-    for (int i = 0; i < count; ++i) {
+    if (!system || proj_cs_get_axis_count(session.Get(), system.get()) != 3)
+        return nullptr;
+    const PJ_COORDINATE_SYSTEM_TYPE type = proj_cs_get_type(session.Get(), system.get());
+    std::array<PJ_AXIS_DESCRIPTION, 3> axes;
+    for (int i = 0; i < 3; ++i) {
         const char *name, *abbreviation, *direction, *unitName;
         PJ_AXIS_DESCRIPTION& axis = axes[static_cast<std::size_t>(i)];
         if (!proj_cs_get_axis_info(session.Get(), system.get(), i, &name, &abbreviation, &direction,
@@ -29,16 +31,12 @@ PjPtr CreateAxes(ProjSession& session, const PJ* crs, const HeightUnit& unit) {
         axis.abbreviation = const_cast<char*>(abbreviation);
         axis.direction = const_cast<char*>(direction);
         axis.unit_name = const_cast<char*>(unitName);
-        axis.unit_type = PJ_UT_LINEAR;
-        if (i < 2 && proj_cs_get_type(session.Get(), system.get()) == PJ_CS_TYPE_ELLIPSOIDAL)
-            axis.unit_type = PJ_UT_ANGULAR;
+        const bool isAngle = i < 2 && type == PJ_CS_TYPE_ELLIPSOIDAL;
+        axis.unit_type = isAngle ? PJ_UT_ANGULAR : PJ_UT_LINEAR;
     }
-    if (count != 3)
-        return nullptr;
     axes[2].unit_name = const_cast<char*>(unit.moName.c_str());
     axes[2].unit_conv_factor = unit.mdfMetres;
-    return PjPtr(proj_create_cs(session.Get(), proj_cs_get_type(session.Get(), system.get()), count,
-                                axes.data()));
+    return PjPtr(proj_create_cs(session.Get(), type, 3, axes.data()));
 }
 
 /// @return the CRS with other axes, or null
