@@ -4,8 +4,9 @@
 
 /// Contract of the coordinate reference services: CRS objects and the transform between them.
 ///
-/// An operation that cannot deliver its result throws; the library does not test results. An object
-/// is used by one thread at a time; different objects may be used on different threads.
+/// An operation that cannot deliver its result throws; the library does not test what the functions
+/// of this header return. An object is used by one thread at a time; different objects may be used
+/// on different threads.
 
 struct ProjInfo_t;
 
@@ -63,7 +64,8 @@ class KELM_SERVICES_EXPORT IProjInfoFactory {
     /// @param poInfo the record that the vector layer store filled
     /// @return the two-dimensional CRS of the layer, which also knows the layer's vertical CRS; the
     /// caller owns it. A record without a CRS gives a local one. @throw if the record's CRS cannot
-    /// be read or has no map coordinates
+    /// be read or has no map coordinates. The bundled store leaves the record empty if GDAL cannot
+    /// read the CRS of the layer
     virtual cs::ICRS* CreateCRS(ProjInfo_t* poInfo) = 0;
 
   protected:
@@ -94,7 +96,8 @@ KELM_SERVICES_EXPORT cs::ICRS* CreateCompoundCS(cs::ICRS* poHorizontal, cs::Datu
 /// Makes the transform between two CRSs of three dimensions. @param dfReserved always 0.0
 /// @return a new transform, independent of both CRS objects; the caller owns it. Between equal CRSs
 /// it changes no bit. Between different heights of local CRSs its TransformPoints throws
-/// @throw if there is no transform of full accuracy, naming the grid files that are missing
+/// @throw if there is no transform of sufficient accuracy, 11 m or better by PROJ or unknown,
+/// naming the grid files that are missing
 KELM_SERVICES_EXPORT ct::IMathTransform*
 CreateCRSTransform(const cs::ICRS* poSource, const cs::ICRS* poTarget, double dfReserved);
 

@@ -13,7 +13,7 @@ namespace kelm {
 class KELM_SERVICES_EXPORT Exception : public std::exception {
   public:
     /// @param message    the text for a person
-    /// @param sourcePath path of the source that raised the failure, without its ending
+    /// @param sourcePath path of the source that raised the failure, without its file extension
     /// @param function   signature of the enclosing function, as text
     /// @param line       line in that source
     Exception(std::string message, std::string sourcePath, std::string function, unsigned line);

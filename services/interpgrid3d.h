@@ -10,18 +10,20 @@
 /// Positions vary fastest in x, then in y, then in z.
 ///
 /// In z the nodes are no farther apart than the given spacing. In x and y the number of cells is
-/// what the spacing asks for, but at least 128 and at most 256: the unit of the map is not known,
-/// and where it is the degree one spacing would span the whole box; and a node costs its user a
-/// transform. Toward the ends of x and y the outermost cell is halved six times.
+/// what the spacing asks for, but at least 128 and at most 256. At least 128, because in degrees
+/// one spacing can span the whole box. At most 256, because each node costs its user a transform.
+/// Then the outermost cell at each end of x and y is halved six times, which adds twelve nodes to
+/// the axis.
 ///
 /// The values in mind are heights of a geoid model, which is linear between its own nodes on each
-/// axis, with a kink at each. So on x and y a line through the two nodes on either side of a cell
-/// is drawn on into the cell. If the two lines meet there, on one side of the chord, they replace
-/// it (subcell resolution: Harten, Journal of Computational Physics 83, 1989). That restores a
-/// function of one kink in three cells exactly. Elsewhere, in the outermost cells and in z, the
-/// value is linear. x is interpolated first, then y, then z. A position outside the box is first
-/// moved to its nearest face. Coordinates, spacings and values have the units that the caller gives
-/// them.
+/// axis, with a kink at each. So on x and y two lines are drawn into each cell: one through the
+/// last two nodes before it, one through the next two nodes behind it, each with the cell's own
+/// end. If the two lines meet in the cell, on one side of the straight line between its ends, they
+/// replace that line (subcell resolution: Harten, Journal of Computational Physics 83, 1989). That
+/// restores a function of one kink in three cells exactly. Elsewhere, in the outermost cells and in
+/// z, the value is linear. x is interpolated first, then y, then z. A position outside the box is
+/// first moved to its nearest face. Coordinates, spacings and values have the units that the caller
+/// gives them.
 ///
 /// One thread sets a grid up; then any number may read it.
 class KELM_SERVICES_EXPORT InterpGrid3D {

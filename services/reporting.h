@@ -17,7 +17,7 @@ class KELM_SERVICES_EXPORT Warning {
   public:
     /// Records a warning and returns. Safe to call from any thread.
     /// @param text       the text for a person
-    /// @param sourcePath path of the source that warns, without its ending
+    /// @param sourcePath path of the source that warns, without its file extension
     /// @param line       line in that source
     static void Warn(const std::string& text, const char* sourcePath, unsigned line);
 };

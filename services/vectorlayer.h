@@ -13,7 +13,8 @@
 /// An open file of the store. Opaque: only a store knows its contents.
 struct _iobuf;
 
-/// Segment type of vector layers.
+/// Segment type of vector layers. A segment is a numbered part of a file; one of this type is a
+/// layer.
 constexpr int ZAR_SEGMENT_VECTOR = 116;
 
 /// One vertex of a shape: map coordinates and height as stored, in the units of the layer's CRS.
@@ -53,7 +54,7 @@ KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
 /// @return the number of segments of this type; a null file has none
 KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
 
-/// @param after a segment number, or 0 for the start, where a store may pass over segments without
+/// @param after a segment number, or 0 for the start. With 0 a store may skip segments without
 /// polygons. @return the number of the next segment of this type, or 0 if there is none or the file
 /// is null
 KELM_SERVICES_EXPORT int ZARSegNext(_iobuf* file, int type, int after);

@@ -67,6 +67,12 @@ TEST(AabbTreeTest, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
                 tree.FindLeaves(EVERYWHERE, walked); // behind what stands in the list
                 leaves.insert(leaves.end(), leaves.begin(), leaves.end());
                 EXPECT_EQ(walked, leaves);
+                BBox<float, point2_t<float>> corner;
+                corner.min = corner.max = {mesh.vertices[0].x, mesh.vertices[0].y};
+                Indices atPoint, inBox;
+                tree.FindLeaves(corner.min.x, corner.min.y, atPoint);
+                tree.FindLeaves(corner, inBox);
+                EXPECT_EQ(atPoint, inBox);
                 EXPECT_EQ(static_cast<int>(tree.GetCapacity()), nCapacity);
                 EXPECT_EQ(tree.GetObjBytes(), 64 * nodes + 4 * tin.GetTriangleCount() + 32);
             }
@@ -83,17 +89,13 @@ TEST(AabbNodeTest, OnlyTheTopOfABuildReleasesIt) {
     const OpenTin tin = MakeSheet(3, random).MakeTin();
     AabbTree tree(&tin);
     AabbNode* const left = tree.GetRoot()->GetLeft();
-    const AabbNode copy = *left;
-    EXPECT_EQ(copy.GetLeft(), left->GetLeft());
     *tree.GetRoot()->GetRight() = *left->GetLeft(); // now names nodes that lie before it
     AabbNode* leaf = left;
     while (leaf->GetLeft() != nullptr)
         leaf = leaf->GetLeft();
     *leaf = AabbNode();
     leaf->CreateChild(tin.GetTriangle(0), tin.GetAll(), &tree); // a top among the nodes of another
-    Indices all;
-    leaf->FindLeaves(EVERYWHERE, all);
-    EXPECT_EQ(all.size(), tin.GetTriangleCount());
+    EXPECT_EQ(GetAllLeaves(*leaf), tin.GetAll());
 }
 
 } // namespace

@@ -4,15 +4,10 @@
 #include "tests/support/gdaltranscript.h"
 #include "tests/support/temporaryfolder.h"
 
-#include <gtest/gtest.h>
 #include <ogr_srs_api.h>
 #include <proj.h>
 
-#include <algorithm>
 #include <cmath>
-#include <functional>
-#include <memory>
-#include <vector>
 
 using namespace kelm::ogc;
 
@@ -33,9 +28,8 @@ struct DataFolder : kelm::test::TemporaryFolder {
         const std::string database = proj_context_get_database_path(nullptr);
         create_symlink(geoid, GetPath("egm96_15.gtx"));
         create_symlink(geoid, GetPath("g1999u07.gtx")); // in place of the true one
-        const std::filesystem::path plan =
-            std::filesystem::path(geoid).replace_filename("BETA2007.gsb");
-        create_symlink(plan, GetPath("BETA2007.gsb"));
+        create_symlink(std::filesystem::path(geoid).replace_filename("BETA2007.gsb"),
+                       GetPath("BETA2007.gsb"));
         create_symlink(database, GetPath("proj.db"));
         create_symlink(geoid, moHostFolder.GetPath("g1999u03.gtx"));
         create_symlink(database, moHostFolder.GetPath("proj.db"));
@@ -69,21 +63,27 @@ CRSPtr MakeCompound(const CRSPtr& poMap, cs::DatumType eDatum) {
     return CRSPtr(utils::CreateCompoundCS(poMap->GetHorizontalCRS(), eDatum, cs::LU_Default));
 }
 
-/// @return the height of the first point
-double Convert(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
-               cs::DatumType eTo = kOrtho, bool bWkt = true) {
+/// @return the points with their heights converted, and one more
+Points Transform(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
+                 cs::DatumType eTo = kOrtho, bool bWkt = true) {
     const CRSPtr poMap = ReadCRS(crs, bWkt);
     const CRSPtr poFrom = MakeCompound(poMap, eFrom), poTo = MakeCompound(poMap, eTo);
     EXPECT_EQ(poMap->GetDimension() + 1, poFrom->GetDimension()) << crs;
     Points target(points.size() + 3);
     std::unique_ptr<ct::IMathTransform>(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0))
         ->TransformPoints(points.data(), target.data(), static_cast<unsigned>(points.size() / 3));
-    return target[2];
+    return target;
 }
 
-const std::string kFromUtm = "+proj=pipeline +step +inv +proj=utm +zone=16 +ellps=WGS84 ";
-const std::string kFromWebMercator = "+proj=pipeline +step +inv +proj=webmerc +ellps=WGS84 ";
-const std::string kFromDegrees = "+proj=pipeline +step +proj=unitconvert +xy_in=deg +xy_out=rad ";
+/// @return the height of the first point
+template <typename... Arguments>
+double Convert(const std::string& crs, const Points& points, Arguments... arguments) {
+    return Transform(crs, points, arguments...)[2];
+}
+
+const std::string kFromUtm = "+inv +proj=utm +zone=16 +ellps=WGS84 ";
+const std::string kFromWebMercator = "+inv +proj=webmerc +ellps=WGS84 ";
+const std::string kFromDegrees = "+proj=unitconvert +xy_in=deg +xy_out=rad ";
 const struct {
     const char* mpszCRS;
     double x, y;
@@ -93,12 +93,10 @@ const struct {
     {"EPSG:32616", 738669, 4045105, kFromUtm},
     {"EPSG:4326", -84.2, 36.3, kFromDegrees}, // x is the longitude, whatever the authority says
     {"EPSG:2193", 1748735, 5427916,
-     "+proj=pipeline +step +inv +proj=tmerc +lon_0=173 +k=0.9996 +x_0=1600000 +y_0=10000000 "
-     "+ellps=GRS80 "},
+     "+inv +proj=tmerc +lon_0=173 +k=0.9996 +x_0=1600000 +y_0=10000000 +ellps=GRS80 "},
     // In the Canaries: beside the area of the operation, in that of the CRS.
     {"EPSG:3035", 1835000, 1030000,
-     "+proj=pipeline +step +inv +proj=laea +lat_0=52 +lon_0=10 +x_0=4321000 +y_0=3210000 "
-     "+ellps=GRS80 "},
+     "+inv +proj=laea +lat_0=52 +lon_0=10 +x_0=4321000 +y_0=3210000 +ellps=GRS80 "},
     {"+proj=longlat +datum=WGS84 +vunits=ft +type=crs", -84.2, 36.3, kFromDegrees, 0.3048},
     {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +type=crs", 738669, 4045105,
      kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart "},
@@ -109,14 +107,13 @@ const struct {
     {"EPSG:4269", -86.8, 36.5, kFromDegrees}, // on the border of two states
     // Of these two, one operation shifts positions alone and the other points in space.
     {"EPSG:31467", 3513000, 5403000,
-     "+proj=pipeline +step +inv +proj=tmerc +lon_0=9 +x_0=3500000 +ellps=bessel +step "
-     "+proj=hgridshift +grids=BETA2007.gsb "},
+     "+inv +proj=tmerc +lon_0=9 +x_0=3500000 +ellps=bessel +step +proj=hgridshift "
+     "+grids=BETA2007.gsb "},
     {"EPSG:28992", 155000, 463000,
-     "+proj=pipeline +step +inv +proj=sterea +lat_0=52.1561605555556 +lon_0=5.38763888888889 "
-     "+k=0.9999079 +x_0=155000 +y_0=463000 +ellps=bessel +step +proj=cart +ellps=bessel +step "
-     "+proj=helmert +x=565.4171 +y=50.3319 +z=465.5524 +rx=0.398957388243134 "
-     "+ry=-0.343987817378283 +rz=1.87740163998045 +s=4.0725 +convention=coordinate_frame +step "
-     "+inv +proj=cart +ellps=WGS84 "}};
+     "+inv +proj=sterea +lat_0=52.1561605555556 +lon_0=5.38763888888889 +k=0.9999079 +x_0=155000 "
+     "+y_0=463000 +ellps=bessel +step +proj=cart +ellps=bessel +step +proj=helmert +x=565.4171 "
+     "+y=50.3319 +z=465.5524 +rx=0.398957388243134 +ry=-0.343987817378283 +rz=1.87740163998045 "
+     "+s=4.0725 +convention=coordinate_frame +step +inv +proj=cart +ellps=WGS84 "}};
 
 const struct {
     const char* mpszCRS;
@@ -145,7 +142,8 @@ TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
     for (const auto& [pszCRS, x, y, steps, dfUnit] : kConversions) {
         bWkt = !bWkt;
         const std::string geoid = "+step +inv +proj=vgridshift +grids=egm96_15.gtx +multiplier=1";
-        const PjPtr po(proj_create(nullptr, (steps + geoid).c_str()), proj_destroy);
+        const std::string pipeline = "+proj=pipeline +step " + steps + geoid;
+        const PjPtr po(proj_create(nullptr, pipeline.c_str()), proj_destroy);
         const PJ_COORD oSource = proj_coord(x, y, 300 * dfUnit, HUGE_VAL);
         const double dfHeight = Convert(pszCRS, {x, y, 300}, kEllips, kOrtho, bWkt);
         EXPECT_NEAR(dfHeight * dfUnit, proj_trans(po.get(), PJ_FWD, oSource).xyz.z, 1e-6) << pszCRS;
@@ -181,35 +179,23 @@ const struct {
 
 TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
     for (const auto& [pszCRS, x, y, dfWidth, dfHeight, dfMost] : kWindows) {
-        const CRSPtr poMap = ReadCRS(pszCRS), poFrom = MakeCompound(poMap, kEllips),
-                     poTo = MakeCompound(poMap, kOrtho);
-        const std::unique_ptr<ct::IMathTransform> poTransform(
-            utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
-        const auto Transform = [&](const Points& points) {
-            Points target(points.size());
-            const auto nPoints = static_cast<unsigned>(points.size() / 3);
-            poTransform->TransformPoints(points.data(), target.data(), nPoints);
-            return target;
-        };
         InterpGrid3D oGrid;
         oGrid.LayoutGrid(x, y, 10, x + dfWidth, y + dfHeight, 1500, 100, 100, 1490);
         const unsigned nNodes = oGrid.GetNumGridPoints();
         ASSERT_LE(nNodes, 150000U); // as long as a walk over a few thousand triangles
         Points nodes(std::size_t{3} * nNodes), centres;
         oGrid.GetGridPositions(nodes.data());
-        const Points heights = Transform(nodes);
+        const Points heights = Transform(pszCRS, nodes);
         for (std::size_t i = 0; i < nNodes; ++i)
             oGrid.GetArray()[i] = static_cast<double>(static_cast<float>(heights[3 * i + 2]));
-        EXPECT_EQ(Points(nodes.end() - 3, nodes.end()), (Points{x + dfWidth, y + dfHeight, 1500}));
-        std::size_t nRow = 1;
-        while (nodes[3 * nRow + 1] == y)
-            ++nRow;
-        for (std::size_t i = 0; i + nRow + 1 < nNodes / 2; ++i)
-            if (i % nRow + 1 < nRow)
-                for (std::size_t k = 0; k < 3; ++k)
-                    centres.push_back(
-                        k == 2 ? 755 : (nodes[3 * i + k] + nodes[3 * (i + nRow + 1) + k]) / 2);
-        const Points expected = Transform(centres);
+        std::size_t nRow = 3;
+        while (nodes[nRow + 1] == y)
+            nRow += 3;
+        for (std::size_t j = 0, i = nRow + 3; i < nodes.size() / 2; i += 3, j += 3)
+            if (nodes[i] > x)
+                centres.insert(centres.end(),
+                               {(nodes[j] + nodes[i]) / 2, (nodes[j + 1] + nodes[i + 1]) / 2, 755});
+        const Points expected = Transform(pszCRS, centres);
         for (std::size_t i = 0; i < centres.size(); i += 3) {
             double dfFound = 0;
             oGrid.GetVal(centres[i], centres[i + 1], centres[i + 2], &dfFound);
@@ -228,12 +214,12 @@ TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {
     } oForeign;
     const CRSPtr poUtm = ReadCRS("EPSG:32616"), po3D = MakeCompound(poUtm, kOrtho),
                  poLocal = MakeCompound(ReadCRS(""), kOrtho);
-    const auto Transform = [](const CRSPtr& poSource, const CRSPtr& poTarget) {
+    const auto Create = [](const CRSPtr& poSource, const CRSPtr& poTarget) {
         utils::CreateCRSTransform(poSource.get(), poTarget.get(), 0.0);
     };
     for (const auto& work : std::vector<std::function<void()>>{
-             [&] { Transform(po3D, poLocal); }, [&] { Transform(poUtm, po3D); },
-             [&] { Transform(po3D, nullptr); }, [&] { utils::IsCRSLocal(&oForeign); },
+             [&] { Create(po3D, poLocal); }, [&] { Create(poUtm, po3D); },
+             [&] { Create(po3D, nullptr); }, [&] { utils::IsCRSLocal(&oForeign); },
              [&] { utils::CreateCompoundCS(poUtm.get(), kOrtho, cs::LinearUnitType(7)); },
              [] { ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(nullptr); }})
         EXPECT_TRUE(moTranscript.Refuses(work));

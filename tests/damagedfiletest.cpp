@@ -1,12 +1,6 @@
-#include "services/vectorlayer.h"
-#include "tests/support/gdaltranscript.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/tinreader.h"
-#include "tin/tinreaderfactory.h"
+#include "tests/support/filetest.h"
 
 #include <functional>
-#include <utility>
 
 using namespace kelm::test;
 using namespace kelm::tin;
@@ -33,19 +27,13 @@ Damage Cut(std::size_t size) {
     return [=](Bytes& rBytes) { rBytes.resize(size); };
 }
 
-class DamagedFileTest : public testing::Test {
-  protected:
-    DamagedFileTest() { moTranscript.moFolder = moFolder.GetPath(""); }
-
+struct DamagedFileTest : FileTest {
     /// Writes triangles at x = 0 to 3, each with heights from x on.
     std::string Write(const char* pszFormat, const std::string& name) {
         LayerText oText{{}, wkbPolygon25D};
         for (int n = 0; n < 4; ++n)
             oText.moGeometries.push_back(MakeTriangle(n, 0, n));
-        const std::string told = moTranscript.moLines; // without what GDAL says of the writing
-        const std::string path = WriteLayer(moFolder.GetPath(name), pszFormat, oText);
-        moTranscript.moLines = told;
-        return path;
+        return FileTest::Write(oText, pszFormat, name);
     }
 
     void Edit(const std::string& name, const Damage& oDamage) {
@@ -55,22 +43,11 @@ class DamagedFileTest : public testing::Test {
         moFolder.WriteFile(name, bytes);
     }
 
-    void Execute(const std::string& path, const std::string& statement) {
-        const std::string told = moTranscript.moLines;
-        GDALDatasetUniquePtr poDataset(
-            GDALDataset::Open(path.c_str(), GDAL_OF_VECTOR | GDAL_OF_UPDATE));
-        poDataset->ReleaseResultSet(poDataset->ExecuteSQL(statement.c_str(), nullptr, nullptr));
-        poDataset.reset();
-        moTranscript.moLines = told;
-    }
-
     /// Loads a layer. A refusal is told with all its reasons. @return the x of its triangles
     std::string Load(const std::string& path, int nLayer = 0) {
         std::string columns;
         try {
-            const std::unique_ptr<TinReader> poReader(TinReaderFactory::CreateTinReader(
-                path.c_str(), nLayer, 0, 1, kelm::ogc::cs::VD_Other));
-            const std::unique_ptr<Tin> poTin(poReader->Load(nullptr));
+            const std::unique_ptr<Tin> poTin(OpenReader(path, nLayer)->Load(nullptr));
             for (unsigned n = 0; poTin && n < poTin->GetTriangleCount(); ++n) {
                 double dfX, dfY;
                 poTin->GetXYBase(dfX, dfY);
@@ -89,9 +66,6 @@ class DamagedFileTest : public testing::Test {
     } catch (const std::exception& e) {
         Tell(e);
     }
-
-    TemporaryFolder moFolder;
-    GdalTranscript moTranscript;
 };
 
 // In such a Shapefile the third record stands behind 100 + 2 * 168 bytes. 44 bytes on is the number
@@ -103,7 +77,8 @@ const struct {
     const char* mpszFile;
     const char* mpszDamaged; ///< the part that is changed
     Damage moDamage;
-} kDamagedRecords[] = {
+    const char* mpszLoaded = "0 1 3 "; ///< a damaged record costs that record
+} kDamages[] = {
     {"ESRI Shapefile", "a.shp", "a.shp", Put(kThird + 44, {"\xff\xff\xff\x7f", 4})},
     {"ESRI Shapefile", "b.shp", "b.shp", Put(kThird + 48, {"\x05\0\0\x01", 4})},
     {"ESRI Shapefile", "c.shp", "c.shp", Put(kThird + 8, {"\x63\0\0\0", 4})},
@@ -112,48 +87,36 @@ const struct {
     {"GML", "a.gml", "a.gml", Change("facets.2", "</gml:posList>", " 7</gml:posList>")},
     {"OpenFileGDB", "a.gdb", "a.gdb/a00000009.gdbtable",
      [](Bytes& rBytes) { rBytes.replace(rBytes.size() - 80, 3, "\xff\xff\xff"); }},
+    // A Shapefile is read whole or not at all: cut with its header, by its header only, without it.
+    {"ESRI Shapefile", "a.shp", "a.shx",
+     [](Bytes& rBytes) { rBytes = rBytes.substr(0, 27) + '\x3e' + rBytes.substr(28, 96); }, ""},
+    {"ESRI Shapefile", "a.shp", "a.shx", Put(24, {"\0\0\0\x3e", 4}), ""},
+    {"ESRI Shapefile", "a.shp", "a.shx", Cut(124), ""},
+    {"ESRI Shapefile", "a.shp", "a.shp", Cut(kThird + 168), ""},
+    {"ESRI Shapefile", "a.shp", "a.dbf", Put(4, {"\3\0\0\0", 4}), ""},
+    {"ESRI Shapefile", "a.shp", "a.dbf", Cut(80), ""},
+    // What is left of a record that became shorter, and what the header does not count.
+    {"ESRI Shapefile", "a.shp", "a.shp", [](Bytes& rBytes) { rBytes.append(200, '\x07'); },
+     "0 1 2 3 "},
+    {"ESRI Shapefile", "a.shp", "a.shp", Put(24, {"\0\0\0\x40", 4}), "0 1 2 3 "},
 };
 
-TEST_F(DamagedFileTest, ADamagedRecordCostsThatRecord) {
-    for (const auto& [pszFormat, pszFile, pszDamaged, oDamage] : kDamagedRecords) {
+TEST_F(DamagedFileTest, ADamagedRecordCostsThatRecordAndMoreTheFileButNoErrorOfTheHost) {
+    for (const auto& [pszFormat, pszFile, pszDamaged, oDamage, pszLoaded] : kDamages) {
         const std::string path = Write(pszFormat, pszFile);
         Edit(pszDamaged, oDamage);
-        EXPECT_EQ(Load(path), "0 1 3 ") << path;
+        CPLErrorSetState(CE_Failure, CPLE_AppDefined, "the host's own");
+        EXPECT_EQ(Load(path), pszLoaded) << path;
+        EXPECT_STREQ(CPLGetLastErrorMsg(), "the host's own");
+        EXPECT_EQ(CPLGetLastErrorType(), CE_Failure);
     }
-    for (const char* pszBlob : {"substr(geom,1,60)", "x'00'"}) {
-        const std::string path = Write("GPKG", "a.gpkg");
-        Execute(path, FormatString("UPDATE facets SET geom = %s WHERE fid = 3", pszBlob));
+    for (const auto& [pszFormat, pszFile, pszStatement] :
+         {std::tuple("GPKG", "a.gpkg", "geom = substr(geom,1,60) WHERE fid = 3"),
+          {"GPKG", "a.gpkg", "geom = x'00' WHERE fid = 3"},
+          {"SQLite", "a.sqlite", "geometry = substr(geometry, 1, 60) WHERE ogc_fid = 3"}}) {
+        const std::string path = Write(pszFormat, pszFile);
+        Execute(path, std::string("UPDATE facets SET ") + pszStatement);
         EXPECT_EQ(Load(path), "0 1 3 ") << path;
-    }
-    const std::string path = Write("SQLite", "a.sqlite");
-    Execute(path, "UPDATE facets SET geometry = substr(geometry, 1, 60) WHERE ogc_fid = 3");
-    EXPECT_EQ(Load(path), "0 1 3 ") << path;
-}
-
-TEST_F(DamagedFileTest, AShapefileIsReadWholeOrNotAtAll) {
-    const struct {
-        const char* mpszDamaged;
-        Damage moDamage;
-        const char* mpszLoaded;
-    } cases[] = {
-        {"a.shx",
-         [](Bytes& rBytes) {
-             Put(24, {"\0\0\0\x3e", 4})(rBytes), Cut(124)(rBytes);
-         },
-         ""},
-        {"a.shx", Put(24, {"\0\0\0\x3e", 4}), ""}, // by its header only
-        {"a.shx", Cut(124), ""},
-        {"a.shp", Cut(kThird + 168), ""},
-        {"a.dbf", Put(4, {"\3\0\0\0", 4}), ""},
-        {"a.dbf", Cut(80), ""},
-        // What is left of a record that became shorter, and what the header does not count.
-        {"a.shp", [](Bytes& rBytes) { rBytes.append(200, '\x07'); }, "0 1 2 3 "},
-        {"a.shp", Put(24, {"\0\0\0\x40", 4}), "0 1 2 3 "},
-    };
-    for (const auto& [pszDamaged, oDamage, pszLoaded] : cases) {
-        const std::string path = Write("ESRI Shapefile", "a.shp");
-        Edit(pszDamaged, oDamage);
-        EXPECT_EQ(Load(path), pszLoaded) << pszDamaged;
     }
 }
 
@@ -161,13 +124,12 @@ TEST_F(DamagedFileTest, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {
     const std::string path = Write("GPKG", "a.gpkg"), copy = moFolder.GetPath("b.gpkg"),
                       blocked = moFolder.GetPath("c.gpkg");
     CPLSetThreadLocalConfigOption("OGR_SQLITE_JOURNAL", "WAL");
-    GDALDatasetUniquePtr poWriter(GDALDataset::Open(path.c_str(), GDAL_OF_VECTOR | GDAL_OF_UPDATE));
+    GDALDatasetUniquePtr poWriter = OpenForUpdate(path);
     CPLSetThreadLocalConfigOption("OGR_SQLITE_JOURNAL", nullptr);
     AddFeatures(*poWriter->GetLayer(0), {{MakeTriangle(4, 0, 4)}});
-    fs::copy(path, copy);
-    fs::copy(path + "-wal", copy + "-wal");
-    fs::copy(path, blocked);
-    fs::copy(path + "-wal", blocked + "-wal");
+    for (const char* pszEnd : {"", "-wal"})
+        for (const std::string& to : {copy, blocked})
+            fs::copy(path + pszEnd, to + pszEnd);
     fs::create_symlink("none", blocked + "-shm"); // as in a folder that cannot be written to
     EXPECT_EQ(Load(path), "0 1 2 3 4 ");
     EXPECT_EQ(Load(copy), "0 1 2 3 4 ");
@@ -187,10 +149,7 @@ TEST_F(DamagedFileTest, LayerZeroIsTheFirstWithPolygonsAndARefusalNamesThem) {
         {"walls", {{MakeTriangle(8, 0, 0)}, wkbPolygon25D}}};
     for (const std::size_t nLayers : {5U, 3U}) {
         const std::string path = moFolder.GetPath("a.gpkg");
-        fs::remove(path);
-        GDALAllRegister();
-        GDALDatasetUniquePtr poDataset(GetGDALDriverManager()->GetDriverByName("GPKG")->Create(
-            path.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
+        GDALDatasetUniquePtr poDataset = Create(path, "GPKG");
         for (std::size_t n = 0; n < nLayers; ++n)
             AddFeatures(*poDataset->CreateLayer(layers[n].first, nullptr, layers[n].second.meType),
                         layers[n].second);
@@ -205,8 +164,7 @@ TEST_F(DamagedFileTest, TheReasonWhyAFileCannotBeOpenedIsNested) {
     const std::string loop = moFolder.GetPath("loop.gpkg"), locked = Write("GPKG", "locked.gpkg");
     fs::create_symlink(loop, loop);
     CPLSetThreadLocalConfigOption("SQLITE_BUSY_TIMEOUT", "0");
-    GDALDatasetUniquePtr poOwner(
-        GDALDataset::Open(locked.c_str(), GDAL_OF_VECTOR | GDAL_OF_UPDATE));
+    GDALDatasetUniquePtr poOwner = OpenForUpdate(locked);
     poOwner->ExecuteSQL("BEGIN EXCLUSIVE", nullptr, nullptr);
     for (const std::string& path :
          {moFolder.GetPath("none"), moFolder.GetPath(""), loop, locked,
@@ -225,8 +183,8 @@ TEST_F(DamagedFileTest, TheReasonWhyAFileCannotBeOpenedIsNested) {
     EXPECT_EQ(Load(gml), "0 1 2 3 ");
 }
 
-const std::string kFace = "0\n3DFACE\n10\n0\n20\n0\n30\n0\n11\n0\n21\n1\n31\n0\n12\n1\n22\n0\n"
-                          "32\n0\n";
+const std::string kFace = "0\n3DFACE\n10\n0\n20\n0\n30\n0\n11\n0\n21\n1\n31\n1\n12\n1\n22\n0\n"
+                          "32\n2\n";
 const std::string kBegin = "0\nSECTION\n2\nENTITIES\n", kEnd = "0\nENDSEC\n0\nEOF\n";
 
 std::string Replace(std::string text, const std::string& old, const std::string& by) {
@@ -252,16 +210,18 @@ TEST_F(DamagedFileTest, ADrawingThatWouldNeverEndIsRefusedAndNoOther) {
           Replace(whole, "EOF\n", "EOF"), kBegin + kFace + "0\nENDSEC\n", whole + "x" + zero,
           kBegin + "999\n" + std::string(70000, 'x') + "\n" + kFace + kEnd})
         EXPECT_EQ(Load(moFolder.WriteFile("a.dxf", text)), "0 ") << text.substr(0, 200);
+    const File poFile = OpenFile(moFolder.GetPath("a.dxf"));
+    ZARLayer_t* poLayer = ZARGetLayer(poFile.get(), 1);
+    EXPECT_EQ(ReadShape(poLayer, ZARGetNext(poLayer, -1)),
+              (Ring{{0, 0, 0}, {0, 1, 1}, {1, 0, 2}, {0, 0, 0}}));
 }
 
 TEST_F(DamagedFileTest, ManyPartsOfAGeodatabaseAreNotComparedWithEachOther) {
     std::string parts = "MULTIPOLYGON Z (((0 0 0,0 9 0,9 0 0,0 0 0),(1 1 0,2 1 0,1 2 0,1 1 0))";
     for (int n = 1; n < 200; ++n)
         parts += ',' + MakeTriangle(20 * n, 0, n).substr(10);
-    const std::string path = moFolder.GetPath("a.gdb");
-    WriteLayer(path, "OpenFileGDB", {{parts + ")"}, wkbMultiPolygon25D});
-    moTranscript.Take();
-    const std::unique_ptr<_iobuf, decltype(&ZARClose)> poFile(ZAROpen(path.c_str(), "r"), ZARClose);
+    const File poFile =
+        OpenFile(FileTest::Write({{parts + ")"}, wkbMultiPolygon25D}, "OpenFileGDB", "a.gdb"));
     EXPECT_EQ(ZARGetLayer(poFile.get(), 1)->shapeCount, 205)
         << "the hole is no facet; its polygon is cut in six";
 }
@@ -281,22 +241,16 @@ TEST_F(DamagedFileTest, AGmlKeepsItsVerticalCrsAndItsAxesWhateverTheHostHasSet) 
     for (const char* pszKey : {"GML_INVERT_AXIS_ORDER_IF_LAT_LONG", "GML_REPORT_COMPD_CS"})
         CPLSetConfigOption(pszKey, "NO");
     for (const auto& [pszCrs, pszName, pszPosition, dfX] : cases) {
-        const std::string path = Write("GML", "a.gml");
-        std::string gml = FormatString(
-            "<f:C xmlns:f=\"f\" "
-            "xmlns:gml=\"http://www.opengis.net/gml\"><gml:featureMember><f:facet>"
-            "<f:g><gml:Polygon srsName=\"%s\"><gml:exterior><gml:LinearRing><gml:posList "
-            "srsDimension=\"3\">%s 1 %s.5 1 0 0 1 %s "
-            "1</gml:posList></gml:LinearRing></gml:exterior>"
-            "</gml:Polygon></f:g></f:facet></gml:featureMember></f:C>",
+        const std::string gml = FormatString(
+            "<f:C xmlns:f='f' xmlns:gml='http://www.opengis.net/gml'><gml:featureMember><f:facet>"
+            "<f:g><gml:Polygon srsName='%s'><gml:exterior><gml:LinearRing>"
+            "<gml:posList srsDimension='3'>%s 1 %s.5 1 0 0 1 %s 1</gml:posList></gml:LinearRing>"
+            "</gml:exterior></gml:Polygon></f:g></f:facet></gml:featureMember></f:C>",
             pszCrs, pszPosition, pszPosition, pszPosition);
-        const std::unique_ptr<_iobuf, decltype(&ZARClose)> poFile(
-            ZAROpen(moFolder.WriteFile("b.gml", gml).c_str(), "r"), ZARClose);
+        const File poFile = OpenFile(moFolder.WriteFile("b.gml", gml));
         ZARLayer_t* poLayer = ZARGetLayer(poFile.get(), 1);
-        ProjInfo_t oInfo;
-        ZARGetProjectionInfo(poLayer, &oInfo);
-        EXPECT_NE(oInfo.definition.find(pszName), std::string::npos) << oInfo.definition;
-        EXPECT_EQ(ZARGetShapeRef(poLayer, ZARGetNext(poLayer, -1))->vertices[0].x, dfX);
+        EXPECT_NE(GetCrs(poLayer).find(pszName), std::string::npos) << GetCrs(poLayer);
+        EXPECT_EQ(ReadShape(poLayer, ZARGetNext(poLayer, -1))[0][0], dfX);
     }
     for (const char* pszKey : {"GML_INVERT_AXIS_ORDER_IF_LAT_LONG", "GML_REPORT_COMPD_CS"})
         CPLSetConfigOption(pszKey, nullptr);
@@ -311,15 +265,6 @@ TEST_F(DamagedFileTest, ALayerWhoseCrsCannotBeReadCountsAsOneWithout) {
     EXPECT_EQ(Load(shape), "0 1 2 3 ");
     Execute(path, "UPDATE gpkg_geometry_columns SET column_name = 'none'");
     EXPECT_EQ(Load(path), "");
-}
-
-TEST_F(DamagedFileTest, GdalsLastErrorOfTheHostOutlivesAWarningOfOurs) {
-    const std::string path = Write("ESRI Shapefile", "a.shp");
-    Edit("a.shp", kDamagedRecords[0].moDamage);
-    CPLErrorSetState(CE_Failure, CPLE_AppDefined, "the host's own");
-    EXPECT_EQ(Load(path), "0 1 3 ");
-    EXPECT_STREQ(CPLGetLastErrorMsg(), "the host's own");
-    EXPECT_EQ(CPLGetLastErrorType(), CE_Failure);
 }
 
 } // namespace

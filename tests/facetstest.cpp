@@ -1,33 +1,16 @@
-#include "tests/support/gdaltranscript.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/tinreader.h"
-#include "tin/tinreaderfactory.h"
+#include "tests/support/filetest.h"
 #include "tin/triangulate.h"
+#include "tin/vector3.h"
 
-#include <gtest/gtest.h>
-
-#include <array>
 #include <cmath>
-#include <memory>
 #include <random>
 #include <set>
 
 using namespace kelm::test;
-using kelm::tin::Polygon;
 
 namespace {
 
 using Corner = std::array<double, 3>;
-using Ring = std::vector<Corner>;
-
-Ring ReadShape(ZARLayer_t* layer, int id) {
-    const ZARShape& shape = *ZARGetShapeRef(layer, id);
-    Ring ring;
-    for (int i = 0; i < shape.vertexCount; ++i)
-        ring.push_back({shape.vertices[i].x, shape.vertices[i].y, shape.vertices[i].z});
-    return ring;
-}
 
 /// The triangles that the library makes of a ring: it takes four vertices as they stand.
 std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
@@ -37,7 +20,7 @@ std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
     for (const auto& [x, y, z] : ring)
         vertices.push_back({x, y, z});
     const ZARShape shape{vertices.data(), static_cast<int>(vertices.size())};
-    const Polygon<double> polygon(&shape, PO_Undefined);
+    const kelm::tin::Polygon<double> polygon(&shape, PO_Undefined);
     std::vector<Triangle_Id> ids;
     static_cast<void>(Triangulate(polygon, ids));
     const auto getCorner = [&](unsigned id) {
@@ -54,26 +37,10 @@ std::vector<Ring> CutAsTheLibrary(const Ring& ring) {
 
 /// @return area in space, or in plan: negative if the triangle is clockwise
 double ComputeArea(const Ring& t, bool plan) {
-    Corner a, b;
-    for (const unsigned i : {0U, 1U, 2U}) {
-        a[i] = t[1][i] - t[0][i];
-        b[i] = t[2][i] - t[0][i];
-    }
-    const double z = a[0] * b[1] - a[1] * b[0];
-    return plan ? z / 2 : std::hypot(a[1] * b[2] - a[2] * b[1], a[2] * b[0] - a[0] * b[2], z) / 2;
-}
-
-OGRGeometryUniquePtr Parse(const std::string& text) {
-    OGRGeometry* geometry = nullptr;
-    OGRGeometryFactory::createFromWkt(text.c_str(), nullptr, &geometry);
-    return OGRGeometryUniquePtr(geometry);
-}
-
-bool IsValid(const std::string& text) {
-    CPLPushErrorHandler(CPLQuietErrorHandler);
-    const bool valid = Parse(text)->IsValid();
-    CPLPopErrorHandler();
-    return valid;
+    using kelm::tin::Vector3;
+    const Vector3 a(t[1][0] - t[0][0], t[1][1] - t[0][1], t[1][2] - t[0][2]);
+    const Vector3 b(t[2][0] - t[0][0], t[2][1] - t[0][1], t[2][2] - t[0][2]);
+    return (plan ? (a ^ b).z : (a ^ b).Length()) / 2;
 }
 
 std::set<Corner> FindCorners(const std::string& text) {
@@ -85,16 +52,10 @@ std::set<Corner> FindCorners(const std::string& text) {
     return corners;
 }
 
-struct FacetsTest : testing::Test {
-    FacetsTest() { moTranscript.moFolder = moFolder.GetPath(""); }
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> Open(const std::vector<std::string>& polygons) {
-        WriteLayer(moPath, "GPKG", {polygons, wkbPolygon25D});
-        moTranscript.Take(); // what GDAL says of the writing
-        return {ZAROpen(moPath.c_str(), "r"), ZARClose};
+struct FacetsTest : FileTest {
+    File Open(const std::vector<std::string>& polygons) {
+        return OpenFile(Write({polygons, wkbPolygon25D}));
     }
-    TemporaryFolder moFolder;
-    const std::string moPath = moFolder.GetPath("a.gpkg");
-    GdalTranscript moTranscript;
 };
 
 std::string MakeStar(unsigned corners) {
@@ -105,7 +66,8 @@ std::string MakeStar(unsigned corners) {
         text += FormatString("%.17g %.17g %u,", 9 + radius * std::cos(angle),
                              50 + radius * std::sin(angle), i);
     }
-    return text + FormatString("%.17g 50 0))", 9 + (std::mt19937(7)() % 2 ? 1e-3 : 1e-2));
+    text.back() = ')';
+    return text + ')';
 }
 
 const struct {
@@ -149,31 +111,27 @@ const struct {
     {"POLYGON Z ((0 0 1,8 0 2,0 8 3,0 0 1,0 0 1))", 1, 32},
     {"POLYGON Z ((0 0 1,8 0 2,0 8 3,0.0000000005 0 1))", 1, 32},
     {"POLYGON Z ((0 5 1,8 5 2,0 5 9,0 5 1,0 5 1))", 1, 32, true},
-    {"POLYGON Z ((0 0 1,8 0 2,8 8 3,8 8 3,0 8 4,0 0.0000000005 1))", 2, 64},
-    {"POLYGON Z ((0 0 1,8 0 2,0 8 3,0 0 1))", 1, 32},
-    {"POLYGON Z ((0 0 1,8 0 2,8 8 3,0 8 4,0 0 1))", 2, 64}};
+    {"POLYGON Z ((0 0 1,8 0 2,8 8 3,8 8 3,0 8 4,0 0.0000000005 1))", 2, 64}};
 
 TEST_F(FacetsTest, WhatIsValidIsCoveredExactlyAndKeepsItsCornersAndHeights) {
     for (const auto& [text, count, area, upright] : CASES) {
         const auto file = Open({text});
         ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
         std::vector<std::pair<int, Ring>> shapes;
-        std::vector<Ring> triangles;
+        const std::set<Corner> corners = FindCorners(text);
+        std::size_t triangles = 0;
+        double sum = 0;
         for (int id = ZARGetNext(layer, -1); id != -1; id = ZARGetNext(layer, id)) {
             shapes.emplace_back(id, ReadShape(layer, id));
-            for (const Ring& triangle : CutAsTheLibrary(shapes.back().second))
-                triangles.push_back(triangle);
+            for (const Ring& triangle : CutAsTheLibrary(shapes.back().second)) {
+                ++triangles;
+                sum += ComputeArea(triangle, !upright);
+                EXPECT_NE(ComputeArea(triangle, !upright), 0);
+                for (const Corner& corner : triangle)
+                    EXPECT_EQ(corners.count(corner), 1U) << text;
+            }
         }
-        const std::set<Corner> corners = FindCorners(text);
-        double sum = 0;
-        for (const Ring& triangle : triangles) {
-            sum += ComputeArea(triangle, !upright);
-            for (const Corner& corner : triangle)
-                EXPECT_EQ(corners.count(corner), 1U) << text;
-            EXPECT_NE(ComputeArea(triangle, !upright), 0);
-        }
-        EXPECT_EQ(triangles.size(), count) << text.substr(0, 200);
-        EXPECT_EQ(layer->shapeCount, static_cast<int>(shapes.size()));
+        EXPECT_EQ(triangles, count) << text.substr(0, 200);
         EXPECT_TRUE(area == 0 || std::fabs(sum - area) <= (upright ? 1e-2 : 0)) << text << sum;
         for (const std::size_t i : {shapes.size() - 1, shapes.size() / 2, std::size_t{0}})
             EXPECT_EQ(ReadShape(layer, shapes[i].first), shapes[i].second);
@@ -209,13 +167,14 @@ TEST_F(FacetsTest, ARingIsDeliveredAsItIsStoredIfTheLibraryCutsItAndElseCutIfItI
     const auto file = Open(texts);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     std::size_t taken = 0, cut = 0;
-    const int factor = ZARGetNext(layer, -1); // the shape id of feature 1
+    const CPLErrorHandlerPusher quiet(CPLQuietErrorHandler); // it says why one is not valid
+    const int factor = ZARGetNext(layer, -1);                // the shape id of feature 1
     for (std::size_t n = 0; n < rings.size(); ++n) {
         const Ring shape = ReadShape(layer, static_cast<int>(n + 1) * factor);
         if (!CutAsTheLibrary(rings[n]).empty()) {
             ASSERT_EQ(shape, rings[n]) << texts[n];
             ++taken;
-        } else if (IsValid(texts[n])) {
+        } else if (Parse(texts[n])->IsValid()) {
             ASSERT_EQ(shape.size(), 4U) << texts[n];
             ++cut;
         }
@@ -247,16 +206,13 @@ TEST_F(FacetsTest, WhatCannotBeUsedIsToldWithItsReason) {
 }
 
 TEST_F(FacetsTest, AFileOfBadPolygonsSilencesNobody) {
-    using kelm::tin::TinReaderFactory;
     const std::string given = "Triangulate(): Polygon# ";
     std::string told;
     for (const std::size_t bowTies : {1500U, 3U, 3U}) {
-        Open(std::vector<std::string>(bowTies, "POLYGON Z ((0 0 1,9 9 1,9 0 1,0 9 1,0 0 1))"))
-            .reset();
-        std::unique_ptr<kelm::tin::TinReader> reader(TinReaderFactory::CreateTinReader(
-            moPath.c_str(), 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
-        EXPECT_EQ(reader->Load(nullptr), nullptr);
-        reader.reset();
+        const std::string path =
+            Write({std::vector<std::string>(bowTies, "POLYGON Z ((0 0 1,9 9 1,9 0 1,0 9 1,0 0 1))"),
+                   wkbPolygon25D});
+        EXPECT_EQ(OpenReader(path)->Load(nullptr), nullptr);
         std::istringstream lines(moTranscript.Take());
         int count = 0;
         for (std::string line; getline(lines, line);)

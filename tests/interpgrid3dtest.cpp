@@ -1,14 +1,10 @@
 #include "services/interpgrid3d.h"
 #include "tests/support/transcript.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <array>
 #include <cmath>
 #include <random>
-#include <tuple>
-#include <vector>
 
 namespace {
 
@@ -26,22 +22,28 @@ double GetField(const Triple& p) {
     return 0.1 + 0.7 * u - 0.3 * v + 1.1 * w + 0.001 * u * v * w;
 }
 
+/// Linear but for two kinks, between the nodes, of which a grid must know.
+double GetKinked(const Triple& p) {
+    return std::abs(p[0] - 7.1) - 2 * std::abs(p[1] - 3.3) + 0.1 * p[2];
+}
+
 TEST(InterpGrid3DTest, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConstantOutside) {
     InterpGrid3D oGrid;
     EXPECT_TRUE(std::isnan(GetValue(oGrid, {}))) << "no nodes yet";
     const double x = 738669.5, y = 4045105.25, z = 300.0;
-    const std::pair<Box, unsigned> cases[] = {
-        {{x, y, z, x + 250, y + 100, z + 250, 100, 100, 250}, 141 * 141 * 2},
-        {{x, y, z, x + 20, y + 333, z + 0.25, 0.1, 0.1, 0.1}, 213 * 269 * 4},
-        {{x, y, z, x, y + 1, z, 100, 100, 1}, 141}};
+    const std::tuple<Box, unsigned, double (*)(const Triple&)> cases[] = {
+        {{x, y, z, x + 250, y + 100, z + 250, 100, 100, 250}, 141 * 141 * 2, GetField},
+        {{x, y, z, x + 20, y + 333, z + 0.25, 0.1, 0.1, 0.1}, 213 * 269 * 4, GetField},
+        {{x, y, z, x, y + 1, z, 100, 100, 1}, 141, GetField},
+        {{0, 0, 0, 10, 10, 9, 100, 100, 9}, 141 * 141 * 2, GetKinked}};
     std::mt19937 oRandom(4711);
     std::uniform_real_distribution<double> oPart(-0.5, 1.5);
-    for (const auto& [oBox, nNodes] : cases) {
+    for (const auto& [oBox, nNodes, GetHeight] : cases) {
         std::apply([&](auto... v) { oGrid.LayoutGrid(v...); }, oBox);
         ASSERT_EQ(oGrid.GetNumGridPoints(), nNodes);
         std::vector<Triple> nodes(nNodes);
         oGrid.GetGridPositions(nodes[0].data());
-        std::transform(nodes.begin(), nodes.end(), oGrid.GetArray(), GetField);
+        std::transform(nodes.begin(), nodes.end(), oGrid.GetArray(), GetHeight);
         for (unsigned i = 0; i < nNodes; ++i)
             ASSERT_EQ(GetValue(oGrid, nodes[i]), oGrid.GetArray()[i]);
         const Triple end{oBox[3], oBox[4], oBox[5]};
@@ -53,7 +55,7 @@ TEST(InterpGrid3DTest, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConsta
                 p[k] = oBox[k] + dfFar * oPart(oRandom) * (dfEnd - oBox[k] + 1e-9);
                 inside[k] = std::clamp(p[k], oBox[k], dfEnd);
             }
-            ASSERT_NEAR(GetValue(oGrid, p), GetField(inside), 1e-8);
+            ASSERT_NEAR(GetValue(oGrid, p), GetHeight(inside), 1e-8);
             p[i % 3] = std::nan("");
             ASSERT_TRUE(std::isnan(GetValue(oGrid, p)));
         }
@@ -75,19 +77,6 @@ TEST(InterpGrid3DTest, RefusesWhatItCannotLayOutAndKeepsTheOldGrid) {
         EXPECT_TRUE(oTranscript.Refuses([&] { std::apply(Layout, oBox); }));
     }
     EXPECT_EQ(oGrid.GetNumGridPoints(), 141U * 141U * 2U);
-}
-
-TEST(InterpGrid3DTest, RestoresTheKinksOfAModelThatIsLinearBetweenItsOwnNodes) {
-    const auto GetHeight = [](const Triple& p) {
-        return std::abs(p[0] - 7.1) - 2 * std::abs(p[1] - 3.3) + 0.1 * p[2];
-    };
-    InterpGrid3D oGrid;
-    oGrid.LayoutGrid(0, 0, 0, 10, 10, 9, 100, 100, 9);
-    std::vector<Triple> nodes(oGrid.GetNumGridPoints());
-    oGrid.GetGridPositions(nodes[0].data());
-    std::transform(nodes.begin(), nodes.end(), oGrid.GetArray(), GetHeight);
-    for (Triple p{0, 0, 5}; p[0] < 10; p[0] += 0.0037, p[1] += 0.0011)
-        ASSERT_NEAR(GetValue(oGrid, p), GetHeight(p), 1e-12) << p[0];
 }
 
 } // namespace

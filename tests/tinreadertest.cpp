@@ -1,11 +1,5 @@
-#include "tin/tinreader.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/tinreaderfactory.h"
+#include "tests/support/filetest.h"
 
-#include <gtest/gtest.h>
-
-#include <memory>
 #include <thread>
 
 using namespace kelm::ogc::cs;
@@ -14,8 +8,8 @@ using namespace kelm::tin;
 namespace {
 
 std::unique_ptr<Tin> LoadTerrain(DatumType eOutput) {
-    const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-        KELM_TIN_DATA_DIR "/jacksboro.gpkg", 0, 0.0, 1.0, VD_Orthometric));
+    const auto reader =
+        kelm::test::OpenReader(KELM_TIN_DATA_DIR "/jacksboro.gpkg", 0, VD_Orthometric);
     reader->SetOutputVerticalDatum(eOutput);
     return std::unique_ptr<Tin>(reader->Load(nullptr));
 }
@@ -32,31 +26,6 @@ TEST(TinReaderTest, TheTerrainIsTheSameOnEveryThreadAndChangesItsDatum) {
         const point3_t<float>&v = *surface->GetVertex(i), &w = *again->GetVertex(i);
         ASSERT_TRUE(v.x == w.x && v.y == w.y && v.z == w.z) << i;
         ASSERT_NEAR(geoidal->GetVertex(i)->z - v.z, 30.6F, 0.5F) << "EGM96 of the place";
-    }
-}
-
-TEST(TinReaderTest, ALargeSurfaceInDegreesHasTheHeightsOfItsPartsNorthAndSouth) {
-    const kelm::test::TemporaryFolder folder;
-    for (const point2_t<double> at : {point2_t<double>{24.1, 60.2}, {-70.6, -45.7}}) {
-        kelm::test::LayerText layer{{}, wkbPolygon25D, "EPSG:4326"};
-        for (int i = 0; i < 400; ++i) {
-            const double x = at.x + i * 0.002, y = at.y + i * 0.002;
-            layer.moGeometries.push_back(
-                FormatString("POLYGON Z ((%f %f 90,%f %f 80,%f %f %d,%f %f 90))", x, y, x + 0.001,
-                             y, x, y + 0.001, i, x, y));
-        }
-        const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-            kelm::test::WriteLayer(folder.GetPath("a.gpkg"), "GPKG", layer).c_str(), 0, 0.0, 1.0,
-            VD_Ellipsoidal));
-        reader->SetOutputVerticalDatum(VD_Orthometric);
-        const std::unique_ptr<Tin> whole(reader->Load(nullptr)); // by a grid
-        kelm::tin::BBox<double, point2_t<double>> window{};
-        window.min = at;
-        window.max = {at.x + 0.598, 90};
-        const std::unique_ptr<Tin> part(reader->Load(&window)); // vertex by vertex
-        ASSERT_TRUE(whole->GetVertexCount() == 1200 && part->GetVertexCount() == 900);
-        for (unsigned i = 0; i < 900; ++i)
-            ASSERT_NEAR(whole->GetVertex(i)->z, part->GetVertex(i)->z, 1e-3F) << at.y << ' ' << i;
     }
 }
 

@@ -4,15 +4,6 @@
 namespace kelm::tin::test {
 namespace {
 
-using Corners = std::vector<Point>;
-
-struct OwnTriangle : Triangle {
-    explicit OwnTriangle(const Corners& v) : corners(v) {
-        SetVertices(&corners[0], &corners[1], &corners[2]);
-    }
-    Corners corners;
-};
-
 /// Twice the area that three points span in plan. All oracles are exact for quarters.
 float GetArea(const Point& a, const Point& b, const Point& c) {
     return (b.x - a.x) * (c.y - a.y) - (b.y - a.y) * (c.x - a.x);

@@ -1,38 +1,20 @@
-#include "services/vectorlayer.h"
-#include "tests/support/gdaltranscript.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
+#include "tests/support/filetest.h"
 
 #include <cpl_http.h>
-#include <gtest/gtest.h>
 #include <sys/stat.h>
-
-#include <array>
-#include <tuple>
 
 using namespace kelm::test;
 namespace fs = std::filesystem;
 
 namespace {
 
-using Ring = std::vector<std::array<double, 3>>;
-
 Ring MakeRing(double x, double y, double z) {
     return {{x, y, z}, {x, y + 1, z + 1}, {x + 1, y, z + 2}, {x, y, z}};
 }
 
-Ring ReadShape(ZARLayer_t* poLayer, int nId) {
-    const ZARShape& oShape = *ZARGetShapeRef(poLayer, nId);
-    Ring oRing;
-    for (int n = 0; n < oShape.vertexCount; ++n)
-        oRing.push_back({oShape.vertices[n].x, oShape.vertices[n].y, oShape.vertices[n].z});
-    return oRing;
-}
-
 /// The first layer of a file, by one walk. The ring of a shape that is refused is empty.
 struct Layer {
-    Layer(const std::string& path, Transcript& oTranscript)
-        : mpoFile(ZAROpen(path.c_str(), "r"), ZARClose) {
+    Layer(const std::string& path, Transcript& oTranscript) : mpoFile(OpenFile(path)) {
         for (int nId = mpo ? ZARGetNext(mpo, -1) : -1; nId != -1; nId = ZARGetNext(mpo, nId)) {
             moIds.push_back(nId);
             moRings.emplace_back();
@@ -40,40 +22,23 @@ struct Layer {
         }
         EXPECT_EQ(static_cast<int>(moIds.size()), mpo ? mpo->shapeCount : 0);
     }
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> mpoFile;
+    File mpoFile;
     ZARLayer_t* mpo = ZARGetLayer(mpoFile.get(), 1);
     std::vector<int> moIds;
     std::vector<Ring> moRings;
 };
 
-std::string GetCrs(const Layer& oLayer) {
-    ProjInfo_t oInfo;
-    ZARGetProjectionInfo(oLayer.mpo, &oInfo);
-    return oInfo.definition;
-}
-
 using Format = std::pair<const char*, const char*>; // driver and file
 const Format kGpkg{"GPKG", "a.gpkg"}, kShape{"ESRI Shapefile", "a.shp"}, kGml{"GML", "a.gml"};
 
-class VectorLayerTest : public testing::Test {
-  protected:
-    VectorLayerTest() { moTranscript.moFolder = moFolder.GetPath(""); }
+struct VectorLayerTest : FileTest {
     Layer Read(const std::string& path) { return Layer(path, moTranscript); }
-    Layer Read(const LayerText& oText) {
-        WriteLayer(moPath, "GPKG", oText);
-        moTranscript.Take(); // what GDAL says of the writing
-        return Read(moPath);
-    }
-    std::string WriteRow(const Format& oFormat, int nTriangles, bool bTwice = false) const {
+    std::string WriteRow(const Format& oFormat, int nTriangles, bool bTwice = false) {
         LayerText oText{{}, wkbPolygon25D};
         for (int n = 0; n < nTriangles; ++n)
             oText.moGeometries.push_back(MakeTriangle(n, 0, n));
-        return WriteLayer(moFolder.GetPath(oFormat.second), oFormat.first, oText, bTwice);
+        return Write(oText, oFormat.first, oFormat.second, bTwice);
     }
-
-    TemporaryFolder moFolder;
-    const std::string moPath = moFolder.GetPath("a.gpkg");
-    GdalTranscript moTranscript;
 };
 
 TEST_F(VectorLayerTest, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) {
@@ -86,7 +51,8 @@ TEST_F(VectorLayerTest, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) 
         ASSERT_EQ(oRings.size(), 400U) << path;
         for (std::size_t n = 0; n < 400; ++n)
             EXPECT_EQ(oRings[n], MakeRing(double(n), 0, double(n))) << path;
-        EXPECT_NE(GetCrs(Read(path)).find("\"WGS 84 / UTM zone 32N\""), std::string::npos) << path;
+        EXPECT_NE(GetCrs(Read(path).mpo).find("\"WGS 84 / UTM zone 32N\""), std::string::npos)
+            << path;
         EXPECT_EQ(moTranscript.moLines, "");
         const auto nSize = fs::is_directory(path) ? 0 : fs::file_size(path);
         for (unsigned nCut = nSize > 0 ? 25 : 0; nCut-- > 0;) {
@@ -100,10 +66,6 @@ TEST_F(VectorLayerTest, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) 
         }
     }
     moTranscript.moLines = half;
-    const char* pszDrawing =
-        "0\nSECTION\n2\nENTITIES\n0\n3DFACE\n10\n0\n20\n0\n30\n0\n11\n0\n21\n1\n"
-        "31\n1\n12\n1\n22\n0\n32\n2\n0\nENDSEC\n0\nEOF\n";
-    EXPECT_EQ(Read(moFolder.WriteFile("a.dxf", pszDrawing)).moRings[0], MakeRing(0, 0, 0));
 }
 
 const struct {
@@ -127,7 +89,7 @@ TEST_F(VectorLayerTest, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
     LayerText oText;
     for (const auto& oKind : kKinds)
         oText.moGeometries.emplace_back(oKind.mpszText);
-    const Layer oLayer = Read(oText);
+    const Layer oLayer = Read(Write(oText));
     std::size_t nShape = 0;
     for (const auto& [pszText, oCorners] : kKinds)
         for (const std::size_t nCorners : oCorners)
@@ -140,7 +102,7 @@ TEST_F(VectorLayerTest, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
 TEST_F(VectorLayerTest, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader) {
     const std::string point = "POINT Z (0 0 1)", line = "LINESTRING Z (0 0 1,1 1 1)";
     const auto GetType = [&](const LayerText& oText) {
-        return ZARGetLayerType(Read(oText).mpo, 0);
+        return ZARGetLayerType(Read(Write(oText)).mpo, 0);
     };
     EXPECT_EQ(GetType({{}, wkbPoint25D}), 1);
     EXPECT_EQ(GetType({{}, wkbMultiLineString25D}), 3);
@@ -151,10 +113,8 @@ TEST_F(VectorLayerTest, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHe
 }
 
 TEST_F(VectorLayerTest, OnlyTheFirstGeometryColumnIsRead) {
-    GDALAllRegister();
     const std::string path = moFolder.GetPath("a.sqlite");
-    GDALDatasetUniquePtr poDataset(GetGDALDriverManager()->GetDriverByName("SQLite")->Create(
-        path.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
+    GDALDatasetUniquePtr poDataset = Create(path, "SQLite");
     OGRLayer& oLayer = *poDataset->CreateLayer("facets", nullptr, wkbPolygon25D);
     OGRGeomFieldDefn oSecond("second", wkbPoint);
     oLayer.CreateGeomField(&oSecond);
@@ -178,9 +138,9 @@ TEST_F(VectorLayerTest, ShapeIdsLeadToTheFeatureAndAreFoundInAnyOrder) {
             facets += (n ? "," : "(") + MakeTriangle(n, 0, n).substr(10);
         LayerText oText{{MakeTriangle(9, 9, 9)}, wkbUnknown, "", oFeatures};
         oText.moGeometries.push_back("MULTIPOLYGON Z " + facets + ")");
-        const Layer oLayer = Read(oText);
+        const Layer oLayer = Read(Write(oText));
         ASSERT_EQ(oLayer.moIds, oIds);
-        EXPECT_EQ(GetCrs(oLayer), "");
+        EXPECT_EQ(GetCrs(oLayer.mpo), "");
         EXPECT_EQ(oLayer.moRings.back(), MakeRing(nFacets - 1, 0, nFacets - 1));
         for (std::size_t n = oIds.size(); n-- > 0;) {
             EXPECT_EQ(ReadShape(oLayer.mpo, oIds[n]), oLayer.moRings[n]);
@@ -207,11 +167,11 @@ TEST_F(VectorLayerTest, LayersOfOneFileCanBeReadInTurns) {
 TEST_F(VectorLayerTest, WhatIsNoLocalFileOfAKnownFormatIsRefusedByName) {
     const std::string shape = WriteRow(kShape, 1), pipe = moFolder.GetPath("pipe.geojson");
     ASSERT_EQ(mkfifo(pipe.c_str(), 0600), 0);
-    Read(LayerText{{MakeTriangle(0, 0, 0)}});
-    fs::resize_file(moPath, fs::file_size(moPath) + 1);
+    const std::string longer = Write({{MakeTriangle(0, 0, 0)}});
+    fs::resize_file(longer, fs::file_size(longer) + 1);
     for (const std::string& name :
          {std::string(R"({"type":"Point"})"), "GeoJSON:" + shape, "/vsizip/" + shape,
-          moFolder.GetPath(""), pipe, moPath, moFolder.WriteFile("empty.gpkg", ""),
+          moFolder.GetPath(""), pipe, longer, moFolder.WriteFile("empty.gpkg", ""),
           moFolder.WriteFile("a.vrt", "<OGRVRTDataSource/>")})
         EXPECT_TRUE(moTranscript.Refuses([&] { Read(name); })) << name;
 }
@@ -237,10 +197,8 @@ TEST_F(VectorLayerTest, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
 
     const std::string spy = moFolder.GetPath("spy.sqlite"), other = WriteRow(kShape, 1);
     const std::string table = "VirtualShape('" + other.substr(0, other.size() - 4) + "','UTF-8',0)";
-    CPLStringList oOptions;
-    oOptions.AddString("SPATIALITE=YES");
-    GDALDatasetUniquePtr poSpy(GetGDALDriverManager()->GetDriverByName("SQLite")->Create(
-        spy.c_str(), 0, 0, 0, GDT_Unknown, oOptions.List()));
+    GDALDatasetUniquePtr poSpy =
+        Create(spy, "SQLite", CPLStringList().AddString("SPATIALITE=YES").List());
     if (!poSpy)
         GTEST_SKIP() << "GDAL is built without the library that reads other files";
     poSpy->ExecuteSQL(("CREATE VIRTUAL TABLE spy USING " + table).c_str(), nullptr, nullptr);
@@ -254,14 +212,11 @@ TEST_F(VectorLayerTest, AFileThatChangesWhileItIsOpenEndsEachWalkWithAnException
          {std::pair("DELETE FROM facets WHERE fid > 200", 200),
           {"UPDATE facets SET geom = (SELECT geom FROM others) WHERE fid = 100", 100}}) {
         const std::string path = WriteRow(kGpkg, 300);
-        const auto Open = [&] {
-            constexpr unsigned nFlags = GDAL_OF_VECTOR | GDAL_OF_UPDATE;
-            return GDALDatasetUniquePtr(GDALDataset::Open(path.c_str(), nFlags));
-        };
         const std::string both = MakeTriangle(0, 0, 0) + ',' + MakeTriangle(1, 0, 0);
-        AddFeatures(*Open()->CreateLayer("others"), {{"GEOMETRYCOLLECTION Z (" + both + ')'}});
+        AddFeatures(*OpenForUpdate(path)->CreateLayer("others"),
+                    {{"GEOMETRYCOLLECTION Z (" + both + ')'}});
         const Layer oLayer = Read(path);
-        Open()->ExecuteSQL(pszChange, nullptr, nullptr);
+        Execute(path, pszChange);
         for (int nWalk = 0, nId = -1; nWalk < 2; ++nWalk, nId = -1) {
             EXPECT_TRUE(moTranscript.Refuses([&] {
                 while ((nId = ZARGetNext(oLayer.mpo, nId)) != -1)
@@ -292,7 +247,7 @@ TEST_F(VectorLayerTest, TheHostGetsBackItsStateOfGdal) {
     for (const std::string& path :
          {WriteRow(kGml, 3), WriteRow(kGpkg, 3), moFolder.GetPath("no")}) {
         CPLErrorReset();
-        moTranscript.Refuses([&] { GetCrs(Read(path)); });
+        moTranscript.Refuses([&] { GetCrs(Read(path).mpo); });
         EXPECT_EQ(CPLGetLastErrorType(), CE_None);
         EXPECT_STREQ(CPLGetLastErrorMsg(), "");
         EXPECT_EQ(CPLGetErrorHandlerUserData(), &moTranscript);

@@ -1,24 +1,15 @@
-// A program of somebody else: it sees every public header, under that program's warnings, loads the
-// terrain named on its command line and prints a height.
+// A program of somebody else: it sees every public header, some through others, under that
+// program's warnings, loads the terrain named on its command line and prints a height.
 
-#include <containers/keypoint.h>
-#include <containers/octotree.h>
-#include <containers/octotreenode.h>
-#include <services/crs.h>
 #include <services/exception.h>
 #include <services/interpgrid3d.h>
-#include <services/mutex.h>
 #include <services/reporting.h>
 #include <services/vectorlayer.h>
 #include <tin/aabbtree.h>
-#include <tin/bbox.h>
 #include <tin/octree2.h>
-#include <tin/point.h>
 #include <tin/ray2.h>
-#include <tin/tin.h>
 #include <tin/tinreader.h>
 #include <tin/tinreaderfactory.h>
-#include <tin/triangle.h>
 #include <tin/triangulate.h>
 #include <tin/vector3.h>
 

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <cstring>
+#include <string>
 #include <vector>
 
 /// Fowler-Noll-Vo hash, variant 1a, 64 bits, over little-endian numbers.
@@ -29,6 +30,11 @@ struct Digest {
     std::uint64_t value = 14695981039346656037u;
     unsigned count = 0;
     unsigned hits = 0;
+};
+
+/// Where the services write what they are told, a line each; null: nowhere.
+struct Recording {
+    static inline std::string* poTranscript = nullptr;
 };
 
 /// The answers to all queries but plain heights, over sheets of their own.

@@ -1,5 +1,4 @@
 #include "digest.h"
-#include "recordingservices.h"
 
 #include "tests/support/sheets.h"
 

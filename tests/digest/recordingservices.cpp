@@ -1,4 +1,4 @@
-#include "recordingservices.h"
+#include "digest.h"
 
 #include "services/reporting.h"
 

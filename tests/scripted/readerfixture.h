@@ -1,15 +1,11 @@
 #pragma once
 
-#include "tests/digest/recordingservices.h"
+#include "tests/digest/digest.h"
 #include "tests/support/scriptedservices.h"
 #include "tests/support/transcript.h"
 #include "tin/aabbtree.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
-
-#include <gtest/gtest.h>
-
-#include <memory>
 
 using kelm::ogc::cs::DatumType;
 using kelm::tin::AabbTree;

@@ -1,17 +1,12 @@
 #include "tests/scripted/readerfixture.h"
 
-#include <functional>
-
 namespace {
 
 TEST_F(ReaderTest, AnUnfitFileOrArgumentIsRefusedInTheWordsOfItsFault) {
     // Each fault comes on top of the former ones, and is seen before them.
     for (const auto& spoil : std::vector<std::function<void()>>{
              [] {}, [&] { script.dimension = 3; }, [&] { script.dimension = 0; },
-             [&] { script.record.shapeCount = 0; },
-             [&] {
-                 script.record = ZARLayer_t{7, 0};
-             },
+             [&] { script.record.shapeCount = 0; }, [&] { script.record.shapeCountValid = 0; },
              [&] { script.layerType = 1; }, [&] { script.hasLayer = false; },
              [&] { script.segmentCount = 0; }}) {
         spoil();

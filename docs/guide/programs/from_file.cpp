@@ -10,8 +10,8 @@ using namespace kelm::tin;
 
 int main(int argc, char** argv) {
     try {
-        // Layer 0 is the first layer. Offset 0 and scale 1 keep heights as they are stored. Heights
-        // of VD_Other are never converted.
+        // Layer 0 is the first layer that holds polygons. Offset 0 and scale 1 keep heights as they
+        // are stored. Heights of VD_Other are never converted.
         const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
             argc > 1 ? argv[1] : "", 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
         const auto& extents = reader->GetBBox();

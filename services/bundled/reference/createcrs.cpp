@@ -1,6 +1,6 @@
 #include "services/bundled/reference/createcrs.h"
 
-#include "services/bundled/reference/heightunit.h"
+#include "services/bundled/reference/proj/heightunit.h"
 #include "services/bundled/reference/proj/projsession.h"
 #include "services/bundled/undefinedcrs.h"
 #include "services/exception.h"
@@ -122,27 +122,28 @@ std::string CreateEllipsoidal(const CRSText& text) {
     ProjSession session;
     const PjPtr flat = session.CreateFromText(text.moDefinition);
     const PjPtr spatial(proj_crs_promote_to_3D(session.Get(), nullptr, flat.get()));
-    return SetHeightUnit(session, session.GetText(spatial.get()), GetLayerUnit(session, text));
+    const HeightUnit unit = GetLayerUnit(session, text);
+    return session.GetText(SetHeightUnit(session, spatial.get(), unit).get());
 }
 
-/// @return the vertical CRS that the layer names, or the default one, as PROJJSON
-std::string CreateVertical(ProjSession& session, const CRSText& text) {
+/// @return the vertical CRS that the layer names, or the default one
+PjPtr CreateVertical(ProjSession& session, const CRSText& text) {
     if (!text.moVertical.empty())
-        return text.moVertical;
+        return session.CreateFromText(text.moVertical);
     const PjPtr vertical(proj_create_from_database(session.Get(), "EPSG", DEFAULT_VERTICAL_CODE,
                                                    PJ_CATEGORY_CRS, 0, nullptr));
     if (!vertical)
         throw DataException(FormatString("PROJ's database does not give the vertical CRS EPSG:%s%s",
                                          DEFAULT_VERTICAL_CODE, session.TakeMessages().c_str()),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
-    return SetHeightUnit(session, session.GetText(vertical.get()), GetLayerUnit(session, text));
+    return SetHeightUnit(session, vertical.get(), GetLayerUnit(session, text));
 }
 
 /// @return the CRS with heights above the geoid as PROJJSON
 std::string CreateOrthometric(const CRSText& text) {
     ProjSession session;
     const PjPtr flat = session.CreateFromText(text.moDefinition);
-    const PjPtr vertical = session.CreateFromText(CreateVertical(session, text));
+    const PjPtr vertical = CreateVertical(session, text);
     const std::string name =
         std::string(proj_get_name(flat.get())) + " + " + proj_get_name(vertical.get());
     const PjPtr compound(

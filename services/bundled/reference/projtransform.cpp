@@ -3,8 +3,8 @@
 #include "services/bundled/reference/areacensus.h"
 #include "services/bundled/reference/failurecount.h"
 #include "services/bundled/reference/heightmeaning.h"
-#include "services/bundled/reference/heightunit.h"
 #include "services/bundled/reference/operationsearch.h"
+#include "services/bundled/reference/proj/heightunit.h"
 #include "services/reporting.h"
 
 #include <algorithm>

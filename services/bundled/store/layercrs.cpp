@@ -1,14 +1,12 @@
 #include "services/bundled/store/layercrs.h"
 
+#include "services/bundled/store/gdal/crstext.h"
 #include "services/bundled/store/gdal/gdalcall.h"
 #include "services/bundled/undefinedcrs.h"
 #include "services/exception.h"
 #include "services/reporting.h"
 
-#include <cpl_conv.h>
 #include <ogrsf_frmts.h>
-
-#include <memory>
 
 namespace kelm::store {
 
@@ -33,15 +31,12 @@ std::string WriteText(const OGRSpatialReference& crs, const std::string& subject
     if (crs.IsEmpty() || services::IsUndefinedCRS(crs.GetName()))
         return {};
     TestAxes(crs, subject);
-    const char* const options[] = {"MULTILINE=NO", nullptr};
-    char* raw = nullptr;
-    const OGRErr error = crs.exportToPROJJSON(&raw, options);
-    const std::unique_ptr<char, decltype(&CPLFree)> text(raw, CPLFree);
-    if (error != OGRERR_NONE || !raw || !*raw)
+    std::string text = ExportCrs(crs);
+    if (text.empty())
         throw DataException(FormatString("The CRS of the %s cannot be written as PROJJSON: %s",
                                          subject.c_str(), call.GetFailures().c_str()),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
-    return raw;
+    return text;
 }
 
 } // namespace

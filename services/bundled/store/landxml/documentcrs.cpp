@@ -1,5 +1,6 @@
 #include "services/bundled/store/landxml/documentcrs.h"
 
+#include "services/bundled/store/gdal/crstext.h"
 #include "services/bundled/store/gdal/gdalcall.h"
 #include "services/reporting.h"
 
@@ -44,15 +45,6 @@ const Unit* FindUnit(const std::string& name) {
 bool IsSame(double metres, double otherMetres) {
     // The two kinds of feet differ by 2e-6.
     return std::abs(metres / otherMetres - 1.0) < 1e-9;
-}
-
-/// PROJJSON, since WKT loses the operations of some CRSs.
-std::string Export(const OGRSpatialReference& crs) {
-    const char* const options[] = {"MULTILINE=NO", nullptr};
-    char* raw = nullptr;
-    const OGRErr error = crs.exportToPROJJSON(&raw, options);
-    const std::unique_ptr<char, decltype(&CPLFree)> text(raw, CPLFree);
-    return error == OGRERR_NONE && raw ? raw : "";
 }
 
 /// What a CRS is looked for by its name.
@@ -120,7 +112,7 @@ std::string CrsBuilder::Build(Warnings& warnings) {
     }
     TakeApart();
     if (!moHorizontal.IsProjected() && !moHorizontal.IsGeographic())
-        return Export(moHorizontal);
+        return ExportCrs(moHorizontal);
     if (moVertical.IsEmpty() && !FindVertical() && !IsSame(mpoUnit->mdfMetres, 1.0))
         static_cast<void>(moVertical.importFromEPSG(DEFAULT_VERTICAL_CODE));
     SetHorizontalUnit();
@@ -193,11 +185,11 @@ void CrsBuilder::SetVerticalUnit() {
 
 std::string CrsBuilder::Join() const {
     if (moVertical.IsEmpty())
-        return Export(moHorizontal);
+        return ExportCrs(moHorizontal);
     OGRSpatialReference compound;
     const std::string name = std::string(moHorizontal.GetName()) + " + " + moVertical.GetName();
     static_cast<void>(compound.SetCompoundCS(name.c_str(), &moHorizontal, &moVertical));
-    return Export(compound);
+    return ExportCrs(compound);
 }
 
 } // namespace

@@ -16,9 +16,9 @@ struct HeightUnit {
 /// compound
 HeightUnit GetHeightUnit(ProjSession& session, const PJ* crs);
 
-/// @param definition a vertical CRS, or one with ellipsoidal heights, as PROJJSON
-/// @return the same CRS with heights in this unit. It has no code if the unit is another one
-std::string SetHeightUnit(ProjSession& session, const std::string& definition,
-                          const HeightUnit& unit);
+/// @param crs a vertical CRS, or one with ellipsoidal heights
+/// @return the same CRS with heights in this unit; it has no code if that is another unit
+/// @throw kelm::DataException if PROJ cannot make it
+PjPtr SetHeightUnit(ProjSession& session, const PJ* crs, const HeightUnit& unit);
 
 } // namespace kelm::ogc
