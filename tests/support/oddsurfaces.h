@@ -21,8 +21,8 @@ struct OddSurface {
 };
 
 /// The triangles that corners(i) gives, of their own vertices each.
-template <typename Corners>
-Mesh MakeEach(unsigned count, const Corners& corners) {
+template <typename Trio>
+Mesh MakeEach(unsigned count, const Trio& corners) {
     Mesh mesh;
     for (unsigned n = 0; n < count; ++n) {
         const std::array<Point, 3> c = corners(static_cast<float>(n));
@@ -58,7 +58,7 @@ inline void StretchSheet(Mesh& rMesh, float x, float y) {
 }
 
 inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
-    using Corners = std::array<Point, 3>;
+    using Trio = std::array<Point, 3>;
     const float far = -LOWEST, inf = std::numeric_limits<float>::infinity();
     std::vector<OddSurface> list;
     const auto add = [&](const char* name, Mesh mesh, auto disturb) {
@@ -84,26 +84,26 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
     add("large", large, leave);
     add("zeros", zeros, leave);
     addEach("walls", 500, [](float i) {
-        return Corners{{{i, i, 0}, {i + 1, i + 1, 2}, {i, i, 5}}};
+        return Trio{{{i, i, 0}, {i + 1, i + 1, 2}, {i, i, 5}}};
     });
     addEach("leaning walls", 500, [](float i) {
-        return Corners{{{i, i, 0}, {i + 9, std::nextafter(i + 9, 1e9F), 2}, {i + 3, i + 3, 5}}};
+        return Trio{{{i, i, 0}, {i + 9, std::nextafter(i + 9, 1e9F), 2}, {i + 3, i + 3, 5}}};
     });
-    addEach("copies", 700, [](float i) { return Corners{{{1, 1, i}, {4, 2, 1}, {2, 5, 2}}}; });
-    addEach("tower", 700, [](float i) { return Corners{{{-i, -i, 2}, {i, -i, i}, {0, i, 2}}}; });
+    addEach("copies", 700, [](float i) { return Trio{{{1, 1, i}, {4, 2, 1}, {2, 5, 2}}}; });
+    addEach("tower", 700, [](float i) { return Trio{{{-i, -i, 2}, {i, -i, i}, {0, i, 2}}}; });
     addEach("slivers", 700, [](float i) {
-        return Corners{{{i, 0, 1}, {i + 1, 5e6F, i}, {i, -5e6F, 1}}};
+        return Trio{{{i, 0, 1}, {i + 1, 5e6F, i}, {i, -5e6F, 1}}};
     });
     addEach("diagonal slivers", 700, [](float i) {
-        return Corners{{{i, 0, 1}, {i + 700, 700, i}, {i + 1, 0.5F, 2}}};
+        return Trio{{{i, 0, 1}, {i + 700, 700, i}, {i + 1, 0.5F, 2}}};
     });
     addEach("far", 300, [=](float i) {
         const float e = i * 1e34F;
-        return Corners{{{LOWEST, e, -LOWEST}, {LOWEST * -1, LOWEST, 1}, {e, LOWEST, 2}}};
+        return Trio{{{LOWEST, e, -LOWEST}, {LOWEST * -1, LOWEST, 1}, {e, LOWEST, 2}}};
     });
     addEach("crowded corner", 700, [](float i) {
         const float at = std::exp2(std::floor(i / 2) - 125), x = std::fmod(i, 2.0F) * at;
-        return Corners{{{x, at - x, 1}, {x * 1.25F, at - x, i}, {x, (at - x) * 1.25F, 1}}};
+        return Trio{{{x, at - x, 1}, {x * 1.25F, at - x, i}, {x, (at - x) * 1.25F, 1}}};
     });
     Mesh covered = MakeSheet(3, random);
     for (float i = 0; i < 3; ++i)
