@@ -35,6 +35,8 @@ TEST(InterpGrid3DTest, GivesNodesExactlyAndAFieldThatIsTrilinearBetweenAndConsta
         {{x, y, z, x + 250, y + 100, z + 250, 100, 100, 250}, 141 * 141 * 2, GetField},
         {{x, y, z, x + 20, y + 333, z + 0.25, 0.1, 0.1, 0.1}, 213 * 269 * 4, GetField},
         {{x, y, z, x, y + 1, z, 100, 100, 1}, 141, GetField},
+        {{x, y, z, x + 448001, y, z + 1, 100, 100, 1}, 270 * 2, GetField},
+        {{x, y, z, x + 1120001, y, z + 1, 100, 100, 1}, 653 * 2, GetField},
         {{0, 0, 0, 10, 10, 9, 100, 100, 9}, 141 * 141 * 2, GetKinked}};
     std::mt19937 oRandom(4711);
     std::uniform_real_distribution<double> oPart(-0.5, 1.5);

@@ -19,7 +19,12 @@ constexpr std::uint32_t MOST_NODES = std::numeric_limits<std::uint32_t>::max() /
 
 /// Over ten degrees, three cells are then less than 15 arc minutes wide, the cell of EGM96.
 constexpr double LEAST_MAP_CELLS = 128.0;
-constexpr double MOST_MAP_CELLS = 256.0;
+/// Cells as narrow as the spacing asks for are laid up to this number.
+constexpr double MOST_FINE_CELLS = 256.0;
+/// In metres a cell is no wider than this, up to MOST_MAP_CELLS. At 71 degrees of latitude 15 arc
+/// minutes of longitude are 9 km, and a kink aslant needs more than three cells there.
+constexpr double WIDEST_CELL = 1750.0;
+constexpr double MOST_MAP_CELLS = 640.0;
 
 /// A kink in the outermost cell cannot be restored: there is no node beyond. EGM96's greatest, 6 m
 /// in 15 arc minutes, costs less than 1 mm if the cell is this often halved, and a degree has 128
@@ -121,8 +126,9 @@ Axis DivideAxis(double low, double high, std::size_t cells, int halvings) {
 
 Axis LayoutMapAxis(char name, double low, double high, double spacing) {
     TestBox(name, low, high, spacing);
-    const double cells =
-        std::clamp(std::ceil((high - low) / spacing), LEAST_MAP_CELLS, MOST_MAP_CELLS);
+    const double fine =
+        std::clamp(std::ceil((high - low) / spacing), LEAST_MAP_CELLS, MOST_FINE_CELLS);
+    const double cells = std::clamp(std::ceil((high - low) / WIDEST_CELL), fine, MOST_MAP_CELLS);
     return DivideAxis(low, high, static_cast<std::size_t>(cells), HALVINGS);
 }
 
