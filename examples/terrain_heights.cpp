@@ -9,11 +9,12 @@
 #include "command.h"
 #include "terrain.h"
 
-#include <tin/aabbtree.h>
+#include <tin/heightgrid.h>
 
 #include <sys/resource.h>
 
 #include <chrono>
+#include <cmath>
 #include <future>
 #include <optional>
 
@@ -66,9 +67,9 @@ void PrintLayer(const TinReader& reader, const OGRSpatialReference& crs) {
     std::fprintf(stderr, "x %.3f to %.3f, y %.3f to %.3f, area %.0f, heights %.3f to %.3f\n",
                  box.min.x, box.max.x, box.min.y, box.max.y, reader.GetArea(), box.min.z,
                  box.max.z);
-    std::fprintf(stderr, "expected bytes: load %zu, surface %zu, tree %llu\n",
+    std::fprintf(stderr, "expected bytes: load %zu, surface %zu, index %llu\n",
                  reader.EstimateLoadBytes(), reader.EstimateObjBytes_Tin(),
-                 Bytes{EstimateAabbTreeBytes(shapes)});
+                 Bytes{HeightGrid::EstimateObjBytes(shapes)});
 }
 
 /// Loads on another thread, so that this thread can print how long the load has run.
@@ -90,12 +91,14 @@ std::unique_ptr<Tin> Load(TinReader& reader, const std::vector<double>& sides) {
     return surface;
 }
 
-void PrintHeight(const Tin& surface, const AabbTree& tree, double x, double y) {
-    float height;
-    if (surface.GetHeight(x, y, height, &tree))
-        std::printf("%.3f\n", static_cast<double>(height));
-    else
-        std::puts("off the surface");
+void PrintHeights(const HeightGrid& index, const std::vector<point2_t<double>>& positions) {
+    std::vector<float> heights(positions.size());
+    index.GetHeights(positions.data(), positions.size(), heights.data());
+    for (const float height : heights)
+        if (std::isnan(height))
+            std::puts("off the surface");
+        else
+            std::printf("%.3f\n", static_cast<double>(height));
 }
 
 /// @throw std::runtime_error for a text that is no number
@@ -107,14 +110,16 @@ double GetNumber(const OGRFeature& row, const char* column) {
     return CPLAtof(text);
 }
 
-void PrintHeightsOfStdin(const Tin& surface, const AabbTree& tree) {
+void PrintHeightsOfStdin(const HeightGrid& index) {
     const GDALDatasetUniquePtr csv(GDALDataset::Open("CSV:/vsistdin/", GDAL_OF_VECTOR));
     OGRLayer* layer = csv ? csv->GetLayer(0) : nullptr;
     if (!layer || layer->GetLayerDefn()->GetFieldIndex("x") < 0 ||
         layer->GetLayerDefn()->GetFieldIndex("y") < 0)
         throw std::runtime_error("standard input is no CSV with the columns x and y");
+    std::vector<point2_t<double>> positions;
     for (const OGRFeatureUniquePtr& row : *layer)
-        PrintHeight(surface, tree, GetNumber(*row, "x"), GetNumber(*row, "y"));
+        positions.push_back({GetNumber(*row, "x"), GetNumber(*row, "y")});
+    PrintHeights(index, positions);
 }
 
 void Run(const Layer& layer, const Options& options) {
@@ -128,16 +133,18 @@ void Run(const Layer& layer, const Options& options) {
     const Bytes before = GetPeakBytes();
     const std::unique_ptr<Tin> surface = Load(*reader, options.window);
     const Bytes load = GetPeakBytes() - before;
-    const AabbTree tree(surface.get());
+    const HeightGrid index(*surface);
     std::fprintf(stderr, "%u vertices, %u triangles\n", surface->GetVertexCount(),
                  surface->GetTriangleCount());
-    std::fprintf(stderr, "measured bytes: load %llu, surface %llu, tree %llu\n", load,
-                 Bytes{surface->GetObjBytes()}, Bytes{tree.GetObjBytes()});
+    std::fprintf(stderr, "measured bytes: load %llu, surface %llu, index %llu\n", load,
+                 Bytes{surface->GetObjBytes()}, Bytes{index.GetObjBytes()});
 
+    std::vector<point2_t<double>> positions;
     for (std::size_t i = 0; i < options.positions.size(); i += 2)
-        PrintHeight(*surface, tree, options.positions[i], options.positions[i + 1]);
+        positions.push_back({options.positions[i], options.positions[i + 1]});
+    PrintHeights(index, positions);
     if (options.readStdin)
-        PrintHeightsOfStdin(*surface, tree);
+        PrintHeightsOfStdin(index);
 }
 
 } // namespace

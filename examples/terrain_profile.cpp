@@ -68,6 +68,13 @@ std::vector<Station> PlaceStations(const std::vector<double>& line, double step)
     return stations;
 }
 
+std::vector<Position> GetPositions(const std::vector<Station>& stations) {
+    std::vector<Position> positions;
+    for (const Station& station : stations)
+        positions.push_back(station.position);
+    return positions;
+}
+
 /// The terrain under a line, with an index of its own. The strip is cut along the stretches between
 /// stations, so a query on such a stretch finds the same triangles in the strip as in the terrain.
 struct Strip {
@@ -76,12 +83,17 @@ struct Strip {
 
     static Tin* Cut(const Tin& terrain, const AabbTree& index,
                     const std::vector<Station>& stations) {
-        std::vector<Position> points;
-        for (const Station& station : stations)
-            points.push_back(station.position);
+        const std::vector<Position> points = GetPositions(stations);
         Tin* strip =
             terrain.SubsetByLineString(points.data(), static_cast<unsigned>(points.size()), &index);
         return strip ? strip : throw std::runtime_error("the line does not touch the terrain");
+    }
+
+    /// @return the height at each position; NaN off the strip
+    std::vector<float> GetGrounds(const std::vector<Position>& at) const {
+        std::vector<float> heights(at.size());
+        surface->GetHeights(at.data(), at.size(), heights.data(), &tree);
+        return heights;
     }
 
     bool GetGround(const Position& at, float& height) const {
@@ -105,12 +117,13 @@ void PrintRow(const char* what, double distance, const Place& place) {
 }
 
 void PrintProfile(const Strip& strip, const std::vector<Station>& stations) {
-    for (const auto& [distance, at] : stations) {
-        float height;
-        if (strip.GetGround(at, height))
-            PrintRow("ground", distance, {at.x, at.y, static_cast<double>(height)});
-        else
+    const std::vector<float> heights = strip.GetGrounds(GetPositions(stations));
+    for (std::size_t i = 0; i < stations.size(); ++i) {
+        const auto& [distance, at] = stations[i];
+        if (std::isnan(heights[i]))
             std::printf("ground,%.3f,%.3f,%.3f,\n", distance, at.x, at.y);
+        else
+            PrintRow("ground", distance, {at.x, at.y, static_cast<double>(heights[i])});
     }
 }
 

@@ -83,9 +83,7 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
     add("small", small, leave);
     add("large", large, leave);
     add("zeros", zeros, leave);
-    addEach("walls", 500, [](float i) {
-        return Trio{{{i, i, 0}, {i + 1, i + 1, 2}, {i, i, 5}}};
-    });
+    addEach("walls", 500, [](float i) { return Trio{{{i, i, 0}, {i + 1, i + 1, 2}, {i, i, 5}}}; });
     addEach("leaning walls", 500, [](float i) {
         return Trio{{{i, i, 0}, {i + 9, std::nextafter(i + 9, 1e9F), 2}, {i + 3, i + 3, 5}}};
     });
