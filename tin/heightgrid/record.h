@@ -55,7 +55,8 @@ class Record {
     unsigned GetGroupCount() const { return (nTriangles + 3U) / 4U; }
     /// @return the places of one corner of the four triangles of a group
     const std::uint8_t* GetPlaces(unsigned group, unsigned corner) const {
-        return reinterpret_cast<const std::uint8_t*>(this) + 8 + 12 * group + 4 * corner;
+        return reinterpret_cast<const std::uint8_t*>(this) + 8 + 12 * std::size_t{group} +
+               4 * std::size_t{corner};
     }
     const float* GetValues(std::uint8_t place) const {
         return reinterpret_cast<const float*>(this) + place;

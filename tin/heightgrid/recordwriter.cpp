@@ -44,9 +44,10 @@ void RecordWriter::Write(Record& rRecord) const {
     for (unsigned i = 0; i < mnTriangles; ++i)
         for (unsigned corner = 0; corner < 3; ++corner)
             places[12 * (i / 4) + 4 * corner + i % 4] = GetPlace(maoTriangles[i][corner]);
-    float* values = rRecord.fValues + 3 * CountGroups();
+    float* values = rRecord.fValues + 3 * std::size_t{CountGroups()};
     for (unsigned i = 0; i < mnVertices; ++i)
-        std::memcpy(values + 3 * i, mpoVertices + manVertices[i], sizeof(point3_t<float>));
+        std::memcpy(values + 3 * std::size_t{i}, mpoVertices + manVertices[i],
+                    sizeof(point3_t<float>));
 }
 
 } // namespace kelm::tin::heightgrid
