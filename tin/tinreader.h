@@ -9,6 +9,7 @@
 #include "tin/tinexport.h"
 
 #include <cstddef>
+#include <string>
 #include <vector>
 
 class InterpGrid3D;
@@ -81,6 +82,9 @@ class KELM_TIN_EXPORT TinReader {
     const BBox<double, point3_t<double>>& GetBBox() const { return moBBox; }
     /// @return area of the extents in plan, in squared map units
     double GetArea() const;
+    /// @return the CRS of the layer as text, as the store has it: the bundled one gives PROJJSON.
+    /// Empty if the layer has none. Runs after a load that another thread has begun
+    std::string GetCRSText() const;
     /// @return the two-dimensional CRS; the reader remains its owner
     ogc::cs::ICRS* GetCRS() const { return mpoCRS; }
     /// @return the CRS with the source vertical datum; the reader remains its owner

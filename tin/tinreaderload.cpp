@@ -56,6 +56,15 @@ Tin* TinReader::Load(const Window* poWindow) {
     return CreateTin(corners.GetPoints(), corners.GetIds());
 }
 
+std::string TinReader::GetCRSText() const {
+    if (mpLayer == nullptr)
+        return {};
+    const ScopedLock lock(moMutex);
+    ProjInfo_t info{};
+    ZARGetProjectionInfo(mpLayer, &info);
+    return info.definition;
+}
+
 void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCorners) const {
     const ZARShape* shape = FindShape(mpLayer, id);
     if (shape == nullptr)

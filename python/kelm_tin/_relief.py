@@ -1,0 +1,39 @@
+"""A small picture of a surface for notebooks."""
+
+from __future__ import annotations
+
+import io
+from typing import TYPE_CHECKING, Optional
+
+import numpy as np
+
+if TYPE_CHECKING:
+    from ._surface import Surface
+
+LONG_SIDE = 320
+"""Pixels of the longer side."""
+
+
+def make_png(surface: Surface) -> Optional[bytes]:
+    """Makes a shaded relief. None if matplotlib is not installed or the surface has no extent."""
+    try:
+        from matplotlib import cm, image
+        from matplotlib.colors import LightSource
+    except ImportError:
+        return None
+    xmin, ymin, xmax, ymax = surface.bounds
+    side = max(xmax - xmin, ymax - ymin) / LONG_SIDE
+    if not side > 0:
+        return None
+    heights = surface.raster((xmin, ymin, xmax, ymax), side, closed=True).heights
+    there = np.isfinite(heights)
+    if not there.any():
+        return None
+    filled = np.where(there, heights, heights[there].mean())
+    picture = LightSource().shade(
+        filled, cm.ScalarMappable(cmap="gist_earth").get_cmap(), dx=side, dy=side, blend_mode="soft"
+    )
+    picture[..., 3] = there
+    out = io.BytesIO()
+    image.imsave(out, picture, format="png")
+    return out.getvalue()

@@ -1,0 +1,106 @@
+#include "native/messages.h"
+#include "native/reading.h"
+#include "native/surface.h"
+
+#include <services/exception.h>
+
+#include <pybind11/stl.h>
+
+namespace kelm::python {
+
+namespace {
+
+using ogc::cs::DatumType;
+
+/// Runs without the interpreter's lock. Warnings are appended to the caller's list, also if the
+/// work fails.
+template <typename Work>
+auto Collect(py::list& texts, const Work& work) {
+    Messages messages;
+    struct Appender {
+        Messages& moMessages;
+        py::list& moTexts;
+        ~Appender() {
+            for (const std::string& text : moMessages.Take())
+                moTexts.append(py::str(py::bytes(text).attr("decode")("utf-8", "replace")));
+        }
+    } const appender{messages, texts};
+    const py::gil_scoped_release release;
+    return work();
+}
+
+auto ReadFile(const std::string& file, int layer, DatumType source, DatumType output,
+              const std::optional<std::array<double, 4>>& window, double offset, double scale,
+              py::list warnings) {
+    const ReadOptions options{layer, source, output, window, offset, scale};
+    return Collect(warnings, [&] { return Read(file, options); });
+}
+
+auto ListFile(const std::string& file, py::list warnings) {
+    return Collect(warnings, [&] { return ListLayers(file); });
+}
+
+/// Errors of files become OSError. All others of the libraries become DataError, a ValueError.
+void AddErrors(py::module_& module) {
+    static py::object& dataError =
+        *new py::object(py::exception<kelm::Exception>(module, "DataError", PyExc_ValueError));
+    dataError.attr("__doc__") =
+        "Data, or an argument, that cannot be used: a layer, a shape, a datum.";
+    dataError.attr("__module__") = "kelm_tin";
+    py::register_exception_translator([](std::exception_ptr failure) {
+        try {
+            std::rethrow_exception(failure);
+        } catch (const FileError& error) {
+            PyErr_SetString(PyExc_OSError, error.what());
+        } catch (const kelm::Exception& error) {
+            PyErr_SetString(dataError.ptr(), GetText(error).c_str());
+        }
+    });
+}
+
+void AddSurface(py::module_& module) {
+    py::class_<Surface>(module, "Surface")
+        .def(py::init(&Surface::FromArrays))
+        .def_property_readonly("points",
+                               [](const py::object& self) { return Surface::GetPoints(self); })
+        .def_property_readonly("triangles",
+                               [](const py::object& self) { return Surface::GetTriangles(self); })
+        .def_property_readonly("base", &Surface::GetBase)
+        .def_property_readonly("box", &Surface::GetBox)
+        .def_property_readonly("nbytes", &Surface::GetBytes)
+        .def("height", &Surface::GetHeight)
+        .def("heights", &Surface::GetHeights)
+        .def("crossings", &Surface::GetCrossings)
+        .def("rasterize", &Surface::Rasterize)
+        .def("subset", &Surface::Subset)
+        .def("along", &Surface::SubsetAlong);
+}
+
+void AddFiles(py::module_& module) {
+    py::enum_<DatumType>(module, "Datum")
+        .value("other", ogc::cs::VD_Other)
+        .value("orthometric", ogc::cs::VD_Orthometric)
+        .value("ellipsoidal", ogc::cs::VD_Ellipsoidal);
+    py::class_<LayerFacts>(module, "LayerFacts")
+        .def_readonly("number", &LayerFacts::mnNumber)
+        .def_readonly("refusal", &LayerFacts::moRefusal)
+        .def_readonly("shapes", &LayerFacts::mnShapes)
+        .def_readonly("box", &LayerFacts::moBox)
+        .def_readonly("crs", &LayerFacts::moCrs)
+        .def_readonly("load_nbytes", &LayerFacts::mnLoadBytes)
+        .def_readonly("surface_nbytes", &LayerFacts::mnSurfaceBytes);
+    module.def("read", &ReadFile);
+    module.def("layers", &ListFile);
+}
+
+} // namespace
+
+// NOLINTNEXTLINE: the macro is pybind11's
+PYBIND11_MODULE(_native, module) {
+    module.doc() = "What the package is made of. Not for direct use: it tests no shapes.";
+    AddErrors(module);
+    AddSurface(module);
+    AddFiles(module);
+}
+
+} // namespace kelm::python

@@ -1,0 +1,120 @@
+#include "native/reading.h"
+
+#include <services/exception.h>
+#include <services/vectorlayer.h>
+#include <tin/tinreader.h>
+#include <tin/tinreaderfactory.h>
+
+#include <cpl_conv.h>
+#include <ogr_srs_api.h>
+
+#include <exception>
+
+namespace kelm::python {
+
+namespace {
+
+using tin::TinReader;
+
+struct FileCloser {
+    void operator()(_iobuf* file) const { ZARClose(file); }
+};
+using OpenFile = std::unique_ptr<_iobuf, FileCloser>;
+
+OpenFile Open(const std::string& file) {
+    try {
+        return OpenFile(ZAROpen(file.c_str(), "r"));
+    } catch (const kelm::Exception& failure) {
+        throw FileError(GetText(failure));
+    }
+}
+
+/// A failure that has another one nested in it is that of a file that cannot be opened.
+bool IsNested(const std::exception& failure) {
+    return dynamic_cast<const std::nested_exception*>(&failure) != nullptr;
+}
+
+std::unique_ptr<TinReader> OpenReader(const std::string& file, const ReadOptions& options) {
+    try {
+        return std::unique_ptr<TinReader>(tin::TinReaderFactory::CreateTinReader(
+            file.c_str(), options.mnLayer, options.mdfOffset, options.mdfScale, options.meSource));
+    } catch (const kelm::Exception& failure) {
+        if (IsNested(failure))
+            throw FileError(GetText(failure));
+        throw;
+    }
+}
+
+/// @return the CRS as WKT 2; none if there is none or if it cannot be told as WKT
+std::optional<std::string> GetWkt(const std::string& definition) {
+    if (definition.empty())
+        return std::nullopt;
+    const std::unique_ptr<void, decltype(&OSRDestroySpatialReference)> crs(
+        OSRNewSpatialReference(nullptr), OSRDestroySpatialReference);
+    const char* options[] = {"FORMAT=WKT2_2019", nullptr};
+    char* text = nullptr;
+    std::optional<std::string> wkt;
+    if (OSRSetFromUserInput(crs.get(), definition.c_str()) == OGRERR_NONE &&
+        OSRExportToWktEx(crs.get(), &text, options) == OGRERR_NONE)
+        wkt = text;
+    CPLFree(text);
+    return wkt;
+}
+
+LayerFacts GetFacts(const std::string& file, int number) {
+    ReadOptions options;
+    options.mnLayer = number;
+    LayerFacts facts;
+    facts.mnNumber = number;
+    try {
+        const std::unique_ptr<TinReader> reader = OpenReader(file, options);
+        const auto& box = reader->GetBBox();
+        facts.mnShapes = reader->GetShapeCount();
+        facts.moBox = {box.min.x, box.min.y, box.min.z, box.max.x, box.max.y, box.max.z};
+        facts.moCrs = GetWkt(reader->GetCRSText());
+        facts.mnLoadBytes = reader->EstimateLoadBytes();
+        facts.mnSurfaceBytes = reader->EstimateObjBytes_Tin();
+    } catch (const kelm::Exception& failure) {
+        facts.moRefusal = GetText(failure);
+    }
+    return facts;
+}
+
+} // namespace
+
+std::string GetText(const std::exception& failure) {
+    std::string text = failure.what();
+    try {
+        std::rethrow_if_nested(failure);
+    } catch (const std::exception& reason) {
+        text += ": " + GetText(reason);
+    }
+    return text;
+}
+
+std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::string& file,
+                                                                     const ReadOptions& options) {
+    const std::unique_ptr<TinReader> reader = OpenReader(file, options);
+    if (options.meOutput != options.meSource)
+        reader->SetOutputVerticalDatum(options.meOutput);
+    tin::BBox<double, point2_t<double>> window;
+    if (options.moWindow) {
+        window.min = {(*options.moWindow)[0], (*options.moWindow)[1]};
+        window.max = {(*options.moWindow)[2], (*options.moWindow)[3]};
+    }
+    std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr));
+    if (!surface)
+        return {nullptr, std::nullopt};
+    return {std::make_unique<Surface>(std::move(surface)), GetWkt(reader->GetCRSText())};
+}
+
+std::vector<LayerFacts> ListLayers(const std::string& file) {
+    const OpenFile open = Open(file);
+    std::vector<LayerFacts> layers;
+    const int count = ZARSegCount(open.get(), ZAR_SEGMENT_VECTOR);
+    for (int number = 1; number <= count; ++number)
+        layers.push_back(GetFacts(file, number));
+    return layers;
+}
+
+} // namespace kelm::python

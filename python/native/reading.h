@@ -1,0 +1,51 @@
+#pragma once
+
+#include "native/surface.h"
+
+#include <services/crs.h>
+
+#include <optional>
+#include <string>
+#include <vector>
+
+namespace kelm::python {
+
+/// A file or a layer of it cannot be opened. Becomes an OSError.
+class FileError : public std::runtime_error {
+  public:
+    using std::runtime_error::runtime_error;
+};
+
+/// What one layer of a file is, before a load.
+struct LayerFacts {
+    int mnNumber = 0;      ///< from 1 on, as Read takes it
+    std::string moRefusal; ///< why no surface can be read from it; empty if one can
+    int mnShapes = 0;
+    std::array<double, 6> moBox{}; ///< xmin, ymin, zmin, xmax, ymax, zmax; heights as stored
+    std::optional<std::string> moCrs;
+    std::size_t mnLoadBytes = 0;
+    std::size_t mnSurfaceBytes = 0;
+};
+
+/// How a layer is read.
+struct ReadOptions {
+    int mnLayer = 0; ///< 0 for the first with polygons
+    ogc::cs::DatumType meSource = ogc::cs::VD_Other;
+    ogc::cs::DatumType meOutput = ogc::cs::VD_Other;
+    std::optional<std::array<double, 4>> moWindow;
+    double mdfOffset = 0.0;
+    double mdfScale = 1.0;
+};
+
+/// @return the surface, or null if no polygon gave a triangle; and the CRS of the layer as WKT
+/// @throw FileError; kelm::Exception
+std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::string& file,
+                                                                     const ReadOptions& options);
+
+/// @throw FileError; kelm::Exception
+std::vector<LayerFacts> ListLayers(const std::string& file);
+
+/// @return the text of a failure, and behind it that of the one that it came from
+std::string GetText(const std::exception& failure);
+
+} // namespace kelm::python
