@@ -48,8 +48,8 @@ def to_rows(name: str, value: ArrayLike, width: int) -> FloatArray:
 
 def to_triangles(value: ArrayLike, point_count: int) -> NDArray[np.uint32]:
     """Makes rows of three vertex numbers, each below `point_count`."""
-    array = to_numbers("triangles", value, "iu", "integers")
-    if array.size == 0 and array.ndim < 2:
+    array = np.asarray(value) if np.size(value) == 0 else to_numbers("triangles", value, "iu", "integers")
+    if array.shape == (0,):
         array = array.reshape(0, 3)
     if array.ndim != 2 or array.shape[1] != 3:
         raise ValueError(f"triangles: expected shape (m, 3), got {array.shape}")

@@ -17,8 +17,8 @@ LONG_SIDE = 320
 def make_png(surface: Surface) -> Optional[bytes]:
     """Makes a shaded relief. None if matplotlib is not installed or the surface has no extent."""
     try:
-        from matplotlib import cm, image
-        from matplotlib.colors import LightSource
+        from matplotlib import cm, image  # type: ignore[import]
+        from matplotlib.colors import LightSource  # type: ignore[import]
     except ImportError:
         return None
     xmin, ymin, xmax, ymax = surface.bounds

@@ -101,7 +101,7 @@ class Surface:
         >>> Surface.from_points([[0, 0, 5], [10, 0, 7], [0, 10, 9], [10, 10, 8]]).triangles.shape
         (2, 3)
         """
-        from scipy.spatial import Delaunay, QhullError
+        from scipy.spatial import Delaunay, QhullError  # type: ignore[import]
 
         rows = to_rows("points", points, 3)
         origin = _make_base(rows, base)
