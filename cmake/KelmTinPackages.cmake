@@ -1,4 +1,5 @@
-# Two Debian packages: what a program needs to run, and what it takes to build one. Configure with
+# Debian packages: what a program needs to run, what it takes to build one, and the Python package if
+# it is built. Configure with
 # CMAKE_INSTALL_PREFIX=/usr and CMAKE_SKIP_INSTALL_RPATH=ON, build, then `cpack -G DEB`.
 set(CPACK_PACKAGE_VENDOR "kelm")
 set(CPACK_PACKAGE_CONTACT "The makers of tin <tin@localhost>")
@@ -27,5 +28,18 @@ set(CPACK_DEBIAN_DEVELOPMENT_PACKAGE_SECTION libdevel)
 set(CPACK_COMPONENT_DEVELOPMENT_DEPENDS runtime)
 set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
     "${PROJECT_DESCRIPTION}\n Headers, packages for CMake and pkg-config, and examples.")
+
+if(TARGET kelm_tin_python)
+  math(EXPR next "${Python_VERSION_MINOR} + 1")
+  list(APPEND CPACK_COMPONENTS_ALL python)
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-kelm-tin)
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SHLIBDEPS ON)
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
+      "python3 (>= 3.${Python_VERSION_MINOR}~), python3 (<< 3.${next}), python3-numpy")
+  set(CPACK_COMPONENT_PYTHON_DEPENDS runtime)
+  set(CPACK_COMPONENT_PYTHON_DESCRIPTION "${PROJECT_DESCRIPTION}\n The Python package kelm_tin.")
+  list(APPEND CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${PROJECT_BINARY_DIR}/tin)
+endif()
 
 include(CPack)

@@ -1,6 +1,6 @@
-#include "native/messages.h"
-#include "native/reading.h"
-#include "native/surface.h"
+#include "python/native/messages.h"
+#include "python/native/reading.h"
+#include "python/native/surface.h"
 
 #include <services/exception.h>
 

@@ -1,4 +1,4 @@
-#include "native/reading.h"
+#include "python/native/reading.h"
 
 #include <services/exception.h>
 #include <services/vectorlayer.h>

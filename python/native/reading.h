@@ -1,6 +1,6 @@
 #pragma once
 
-#include "native/surface.h"
+#include "python/native/surface.h"
 
 #include <services/crs.h>
 

@@ -1,4 +1,4 @@
-#include "native/surface.h"
+#include "python/native/surface.h"
 
 #include <algorithm>
 #include <limits>

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "native/numpy.h"
+#include "python/native/numpy.h"
 
 #include <tin/aabbtree.h>
 #include <tin/heightgrid.h>
