@@ -26,7 +26,7 @@ foreach(public IN ITEMS tin tin/detail containers services)
 endforeach()
 
 install(DIRECTORY examples DESTINATION ${CMAKE_INSTALL_DATADIR}/kelm-tin COMPONENT development
-        FILES_MATCHING PATTERN "*.h" PATTERN "*.cpp" PATTERN CMakeLists.txt)
+        FILES_MATCHING PATTERN "*.h" PATTERN "*.cpp" PATTERN "*.py" PATTERN CMakeLists.txt)
 
 install(EXPORT kelm-tin NAMESPACE kelm:: FILE kelm-tin-targets.cmake DESTINATION ${package_dir}
         COMPONENT development)
