@@ -24,8 +24,8 @@ inline int GetTeamForBatch(std::size_t count, std::size_t smallest, int threads)
     return static_cast<int>(std::clamp<std::size_t>(count / smallest, 1, most));
 }
 
-/// Runs body(first, last) over 0 .. count-1 in blocks, which the threads of a team take in turn: one
-/// that is held up leaves its share to the others. A batch too small for a second thread is one
+/// Runs body(first, last) over 0 .. count-1 in blocks, which the threads of a team take in turn:
+/// one that is held up leaves its share to the others. A batch too small for a second thread is one
 /// block on the calling thread, since the threads of a team use a processor even after their work.
 ///
 /// An exception that left the region would end the process. So the first one is kept and thrown
