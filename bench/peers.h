@@ -33,8 +33,10 @@ class Index {
     /// Height of the highest crossing of the segment from a to b. @return is there one?
     bool GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h) const;
 
-  private:
     struct Tree;
+    const Tree& GetTree() const { return *mpoTree; }
+
+  private:
     std::unique_ptr<Tree> mpoTree;
 };
 
@@ -43,6 +45,14 @@ struct Cgal;       ///< AABB_tree of 3-D triangles
 struct Embree;     ///< robust scene; the first hit from above is the highest
 struct EmbreeHits; ///< the same scene; a filter lists every hit and the highest is looked up
 struct Boost;      ///< R-tree of the triangles' boxes in plan, packed; then the triangle itself
+
+/// How Embree takes many rays at a time.
+enum class Batching { Single, Packets, Stream };
+
+/// The highest crossing of each segment, by all hits of the robust scene.
+/// @param pfHeights NaN for a segment without a crossing
+void AnswerSegments(const Index<EmbreeHits>& oIndex, Batching eBatching,
+                    const point3_t<float>* poSegments, std::size_t nCount, float* pfHeights);
 
 /// Hands a peer to a generic function.
 template <typename Peer>
