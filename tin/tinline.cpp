@@ -5,14 +5,20 @@
 #include "tin/index/prefetch.h"
 #include "tin/index/search.h"
 #include "tin/index/segmentprobe.h"
+#include "tin/parallel/parallelbatch.h"
 #include "tin/ray2.h"
 #include "tin/rules/frame.h"
 
 #include <array>
+#include <atomic>
+#include <limits>
 
 namespace kelm::tin {
 
 namespace {
+
+/// Segments that are worth a thread.
+constexpr std::size_t WORTH_A_THREAD = 256;
 
 /// Adds the height at which a segment crosses a triangle, if it does.
 void AddCrossing(const Triangle& triangle, const point3_t<float>& a, const point3_t<float>& b,
@@ -91,6 +97,25 @@ bool Tin::GetLineIntersectHeight(const point3_t<double>& a, const point3_t<doubl
                                  const AabbTree* tree) const {
     const rules::Frame frame(mdfXBase, mdfYBase);
     return GetLineIntersectHeight(frame.ToLocal(a), frame.ToLocal(b), h, tree);
+}
+
+std::size_t Tin::GetLineIntersectHeights(const point3_t<double>* segments, std::size_t count,
+                                         float* heights, const AabbTree* tree, int threads) const {
+    TestTree(tree);
+    std::atomic<std::size_t> found{0};
+    const auto answer = [&](std::size_t first, std::size_t last) {
+        std::size_t hits = 0;
+        for (std::size_t i = first; i < last; ++i) {
+            const bool isFound =
+                GetLineIntersectHeight(segments[2 * i], segments[2 * i + 1], heights[i], tree);
+            heights[i] = isFound ? heights[i] : std::numeric_limits<float>::quiet_NaN();
+            hits += isFound ? 1 : 0;
+        }
+        found += hits;
+    };
+    // A scan runs on a team of its own.
+    parallel::ParallelBatch(count, WORTH_A_THREAD, tree == nullptr ? 1 : threads, answer);
+    return found;
 }
 
 template <typename P>
