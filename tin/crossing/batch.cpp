@@ -17,17 +17,23 @@ std::size_t Batch::Answer(std::size_t first, std::size_t last) {
     mnLast = last;
     for (bool anyIsTaken = true; anyIsTaken;) {
         anyIsTaken = false;
-        for (Turn& turn : maoTurns) {
-            if (turn.isTaken && turn.walk.IsDone())
-                Finish(turn);
-            if (!turn.isTaken && !Take(turn))
-                continue;
-            anyIsTaken = true;
-            if (!turn.walk.IsDone())
-                turn.walk.Step();
-        }
+        for (unsigned i = 0; i < mnTurns; ++i)
+            anyIsTaken |= Go(maoTurns[i]);
     }
     return mnFound;
+}
+
+/// Goes a step on. A walk that is alone goes to its end.
+bool Batch::Go(Turn& rTurn) {
+    if (!rTurn.isTaken && !Take(rTurn))
+        return false;
+    do {
+        if (!rTurn.walk.IsDone())
+            rTurn.walk.Step();
+    } while (mnTurns == 1 && !rTurn.walk.IsDone());
+    if (rTurn.walk.IsDone())
+        Finish(rTurn);
+    return true;
 }
 
 /// Starts on the next segment that meets the surface's box; those before have no crossing.

@@ -2,7 +2,6 @@
 
 #include "tin/crossing/walk.h"
 
-#include <array>
 #include <cstddef>
 
 namespace kelm::tin::crossing {
@@ -13,28 +12,36 @@ class Batch {
   public:
     /// @param segments,heights as in CrossingTree::GetLineIntersectHeights
     Batch(const Index& index, const point3_t<double>* segments, float* heights)
-        : mrIndex(index), mpoSegments(segments), mpfHeights(heights) {}
+        : mrIndex(index), mpoSegments(segments), mpfHeights(heights),
+          mnTurns(index.groups < LARGE ? 1 : MOST_TURNS) {}
 
     /// Answers the segments first .. last-1. @return how many have a crossing
     std::size_t Answer(std::size_t first, std::size_t last);
 
   private:
+    static constexpr unsigned MOST_TURNS = 16;
+    /// Nodes of blocks from which on walks take turns. Where all is in the cache anyway they would
+    /// only get in the way of each other.
+    static constexpr unsigned LARGE = 512;
+
     struct Turn {
         Walk walk;
         std::size_t segment = 0;
         bool isTaken = false;
     };
 
+    bool Go(Turn& rTurn);
     bool Take(Turn& rTurn);
     void Finish(Turn& rTurn);
 
     const Index& mrIndex;
     const point3_t<double>* mpoSegments;
     float* mpfHeights;
+    unsigned mnTurns;
     std::size_t mnNext = 0;
     std::size_t mnLast = 0;
     std::size_t mnFound = 0;
-    std::array<Turn, 8> maoTurns;
+    Turn maoTurns[MOST_TURNS];
 };
 
 } // namespace kelm::tin::crossing

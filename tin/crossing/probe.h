@@ -13,8 +13,7 @@ namespace kelm::tin::crossing {
 /// widened by the reach of the segment.
 class SlabProbe {
   public:
-    SlabProbe() = default;
-    SlabProbe(const Reach& reach, const point3_t<float>& a, const point3_t<float>& b) {
+    void Set(const Reach& reach, const point3_t<float>& a, const point3_t<float>& b) {
         SetAxis(0, a.x, b.x - a.x, reach.x);
         SetAxis(1, a.y, b.y - a.y, reach.y);
         SetAxis(2, a.z, b.z - a.z, reach.z);

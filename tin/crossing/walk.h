@@ -32,7 +32,7 @@ class Highest {
     unsigned mnId = 0;
 };
 
-/// The search for the highest crossing of one segment, in steps of one node or block, so that
+/// The search for the highest crossing of one segment, in steps of a node or its blocks, so that
 /// several can take turns while memory is fetched.
 class Walk {
   public:
@@ -40,7 +40,7 @@ class Walk {
 
     /// @param a,b ends of the segment, surface-local; it meets the box of the surface
     void Start(const Index& index, const point3_t<float>& a, const point3_t<float>& b);
-    bool IsDone() const { return mnPending == 0; }
+    bool IsDone() const { return mnPending == 0 && mnMet == 0; }
     void Step();
     const Highest& GetHighest() const { return moHighest; }
 
@@ -50,10 +50,13 @@ class Walk {
     static constexpr unsigned MOST_LEVELS = 24;
     static constexpr unsigned MOST_PENDING = 2 + (WIDTH - 1) * MOST_LEVELS;
 
-    void Push(unsigned item);
+    void Push(unsigned node);
     unsigned Test(const Node& node) const;
-    void TestBlock(unsigned block);
-    void TestTriangle(const Triangle& triangle, const unsigned* id);
+    void SetGroup(unsigned group);
+    void TestBlock(unsigned number);
+    void TestLane(const Block& block, unsigned lane, const unsigned& id);
+    /// @param id read only where it decides
+    void TestTriangle(const Triangle& triangle, const unsigned& id);
 
     const Index* mpoIndex = nullptr;
     point3_t<float> moA;
@@ -63,6 +66,8 @@ class Walk {
     bool mbBounded = false;
     Filter moFilter;
     Highest moHighest;
+    unsigned mnGroup = 0; ///< the node of blocks at hand
+    unsigned mnMet = 0;   ///< a bit for each of its blocks that is to be tested
     unsigned mnPending = 0;
     unsigned manPending[MOST_PENDING];
 };
