@@ -1,7 +1,7 @@
 #include "tin/crossingtree.h"
 
 #include "tin/crossing/batch.h"
-#include "tin/crossing/builder.h"
+#include "tin/crossing/build/builder.h"
 #include "tin/crossing/layout.h"
 #include "tin/crossing/walk.h"
 #include "tin/parallel/parallelbatch.h"

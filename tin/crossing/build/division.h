@@ -1,6 +1,6 @@
 #pragma once
 
-#include "tin/crossing/reference.h"
+#include "tin/crossing/build/reference.h"
 
 #include <cstddef>
 

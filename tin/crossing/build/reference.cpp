@@ -1,4 +1,4 @@
-#include "tin/crossing/reference.h"
+#include "tin/crossing/build/reference.h"
 
 #include "tin/vector3.h"
 

@@ -1,4 +1,4 @@
-#include "tin/crossing/links.h"
+#include "tin/crossing/build/links.h"
 
 #include <algorithm>
 

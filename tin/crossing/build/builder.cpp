@@ -1,7 +1,7 @@
-#include "tin/crossing/builder.h"
+#include "tin/crossing/build/builder.h"
 
-#include "tin/crossing/division.h"
-#include "tin/crossing/links.h"
+#include "tin/crossing/build/division.h"
+#include "tin/crossing/build/links.h"
 #include "tin/parallel/parallelbatch.h"
 
 #include <algorithm>
@@ -14,34 +14,19 @@ namespace {
 /// References below which a stretch is not worth a thread.
 constexpr std::size_t WORTH_A_THREAD = 4096;
 
-/// What is known of all triangles of an index.
-struct Summary {
-    std::size_t counts[4] = {0, 0, 0, 0}; ///< a kind
-    Bounds bounds;
-    Float4 sides = Fill4(0.0F);
-
-    void Add(const Reference& reference) {
-        ++counts[reference.kind];
-        if (reference.kind > K_Loose)
-            return;
-        Bounds own;
-        own.Add(reference);
-        bounds.Add(own);
-        sides = Greatest(own.high - own.low, sides);
-    }
-    void Add(const Summary& other) {
-        for (unsigned kind = 0; kind < 4; ++kind)
-            counts[kind] += other.counts[kind];
-        bounds.Add(other.bounds);
-        sides = Greatest(other.sides, sides);
-    }
-};
-
 /// The longest of three sides, and a little above what rounding may have taken from it.
 float GetLongest(const Float4& sides) {
     float s[4];
     Store4(s, sides);
     return std::max({s[0], s[1], s[2]}) * (1.0F + 0x1p-20F);
+}
+
+/// Brings the references of a kind to the front. @return their end
+Reference* SortOut(Reference* first, Reference* last, Kind kind, const Summary& summary) {
+    // Most surfaces have one kind only.
+    if (summary.counts[kind] < static_cast<std::size_t>(last - first))
+        std::partition(first, last, [=](const Reference& r) { return r.kind == kind; });
+    return first + summary.counts[kind];
 }
 
 float GetZ(const Float4& corner) {
@@ -82,40 +67,38 @@ Index Builder::Build() {
     return std::move(moIndex);
 }
 
-/// Makes the references and sorts them by kind.
+/// Makes the references, and adds the triangles kind by kind.
 void Builder::Gather() {
     const std::size_t count = mrSurface.GetTriangleCount();
     moReferences = Array<Reference>(count);
-    Reference* const first = moReferences.GetData();
     Summary all;
     std::mutex mutex;
-    const auto gather = [&](std::size_t from, std::size_t to) {
-        Summary part;
-        for (std::size_t i = from; i < to; ++i) {
-            const auto id = static_cast<unsigned>(i);
-            first[i] = CreateReference(*mrSurface.GetTriangle(id), id);
-            part.Add(first[i]);
-        }
-        const std::lock_guard<std::mutex> lock(mutex);
-        all.Add(part);
-    };
-    parallel::ParallelBatch(count, WORTH_A_THREAD, mnThreads, gather);
+    parallel::ParallelBatch(count, WORTH_A_THREAD, mnThreads,
+                            [&](std::size_t first, std::size_t last) {
+                                const Summary part = GatherPart(first, last);
+                                const std::lock_guard<std::mutex> lock(mutex);
+                                all.Add(part);
+                            });
     moIndex.extent = GetLongest(all.sides);
     moIndex.low = GetZ(all.bounds.low);
     moIndex.high = GetZ(all.bounds.high);
-    Reference* from = first;
-    for (const Kind kind : {K_Tight, K_Loose, K_Stale}) {
-        Reference* const to = from + all.counts[kind];
-        if (all.counts[kind] > 0 && to != first + count)
-            std::partition(from, first + count, [=](const Reference& r) { return r.kind == kind; });
-        if (kind == K_Stale)
-            AddStale(from, to);
-        else
-            AddTree(from, to);
-        if (kind == K_Tight)
-            mnTightGroups = moIndex.groups;
-        from = to;
+    Reference* const end = moReferences.GetData() + count;
+    Reference* const loose = SortOut(moReferences.GetData(), end, K_Tight, all);
+    AddTree(moReferences.GetData(), loose);
+    mnTightGroups = moIndex.groups;
+    Reference* const stale = SortOut(loose, end, K_Loose, all);
+    AddTree(loose, stale);
+    AddStale(stale, SortOut(stale, end, K_Stale, all));
+}
+
+Summary Builder::GatherPart(std::size_t first, std::size_t last) const {
+    Summary part;
+    for (std::size_t i = first; i < last; ++i) {
+        const auto id = static_cast<unsigned>(i);
+        moReferences[i] = CreateReference(*mrSurface.GetTriangle(id), id);
+        part.Add(moReferences[i]);
     }
+    return part;
 }
 
 void Builder::AddTree(Reference* first, Reference* last) {

@@ -1,4 +1,4 @@
-#include "tin/crossing/division.h"
+#include "tin/crossing/build/division.h"
 
 #include "tin/crossing/layout.h"
 

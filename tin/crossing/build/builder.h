@@ -1,14 +1,37 @@
 #pragma once
 
 #include "tin/buildoptions.h"
+#include "tin/crossing/build/reference.h"
 #include "tin/crossing/layout.h"
-#include "tin/crossing/reference.h"
 #include "tin/tin.h"
 
 #include <cstddef>
 #include <vector>
 
 namespace kelm::tin::crossing {
+
+/// What is known of all triangles of an index.
+struct Summary {
+    std::size_t counts[4] = {0, 0, 0, 0}; ///< a kind
+    Bounds bounds;
+    Float4 sides = Fill4(0.0F);
+
+    void Add(const Reference& reference) {
+        ++counts[reference.kind];
+        if (reference.kind > K_Loose)
+            return;
+        Bounds own;
+        own.Add(reference);
+        bounds.Add(own);
+        sides = Greatest(own.high - own.low, sides);
+    }
+    void Add(const Summary& other) {
+        for (unsigned kind = 0; kind < 4; ++kind)
+            counts[kind] += other.counts[kind];
+        bounds.Add(other.bounds);
+        sides = Greatest(other.sides, sides);
+    }
+};
 
 /// One build of an index. The number of threads changes nothing in it.
 class Builder {
@@ -31,6 +54,7 @@ class Builder {
     };
 
     void Gather();
+    Summary GatherPart(std::size_t first, std::size_t last) const;
     void AddTree(Reference* first, Reference* last);
     void AddStale(const Reference* first, const Reference* last);
     void FillAll();
