@@ -15,7 +15,6 @@ struct Questions {
     std::vector<point3_t<double>> oMap;
 };
 
-/// As many copies of the segments, one round behind the other, as make a long batch.
 std::shared_ptr<const Questions> GetQuestions(const std::string& sTerrain, unsigned nPercent) {
     return Recall<Questions>(sTerrain + std::to_string(nPercent), [&] {
         const auto segments = GetSegments(sTerrain, nPercent);
@@ -97,9 +96,9 @@ void AskEmbree(const std::string& sTerrain, const Questions& oQuestions, Answers
 #endif
 
 constexpr std::pair<const char*, Way> WAYS[] = {
+    {"ours", AskCrossingTree},
+    {"ours, batch", AskCrossingTreeBatch},
     {"Tin with its tree", AskTin},
-    {"crossing tree", AskCrossingTree},
-    {"crossing tree, batch", AskCrossingTreeBatch},
 #ifdef KELM_BENCH_EMBREE
     {"Embree, all hits", AskEmbree<Batching::Single>},
     {"Embree, all hits, packets", AskEmbree<Batching::Packets>},
@@ -145,16 +144,18 @@ void AddCrossing(const Plan& oPlan) {
                         Cross(state, terrain, percent, way);
                     });
     for (const std::string& terrain : oPlan.GetTerrains())
-        Add({"crossing build", terrain, "crossing tree"}, [terrain](benchmark::State& state) {
+        Add({"build", terrain, "crossing tree"}, [terrain](benchmark::State& state) {
             const auto surface = GetSurface(terrain);
+            std::optional<tin::CrossingTree> tree;
             for (auto _ : state) {
-                std::optional<tin::CrossingTree> tree(*surface);
+                tree.emplace(*surface);
+                state.PauseTiming();
                 state.counters["bytes"] =
                     static_cast<double>(tree->GetObjBytes()) / surface->GetTriangleCount();
-                state.PauseTiming();
                 tree.reset();
                 state.ResumeTiming();
             }
+            state.SetItemsProcessed(std::int64_t{surface->GetTriangleCount()} * state.iterations());
         });
 }
 

@@ -194,6 +194,7 @@ TEST(CrossingTreeTest, AnswersAsAScanOfAllTriangles) {
     Random random;
     const char* effort = std::getenv("TIN_TEST_EFFORT");
     const unsigned count = effort == nullptr ? 400 : unsigned(std::atoi(effort));
+    const int threads = omp_get_max_threads();
     omp_set_num_threads(1); // a team for each small scan only costs time
     for (const auto& [name, mesh] : MakeSurfaces(random)) {
         SCOPED_TRACE(name);
@@ -205,6 +206,7 @@ TEST(CrossingTreeTest, AnswersAsAScanOfAllTriangles) {
             tin.GetTriangle(i)->GetVertex(0)->z += 3, tin.GetTriangle(i)->GetVertex(1)->x += 2;
         Compare(tin, CrossingTree(tin), count / 5, random);
     }
+    omp_set_num_threads(threads);
 }
 
 /// Sheets side by side, so many that a build divides its work, with some walls in each.

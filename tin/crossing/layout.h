@@ -17,7 +17,6 @@ namespace kelm::tin::crossing {
 
 constexpr unsigned WIDTH = 8;              ///< children of a node, and triangles of a block
 constexpr unsigned GROUP = WIDTH * WIDTH;  ///< triangles below a node of blocks
-constexpr unsigned IS_BLOCK = 0x80000000U; ///< marks the number of a block among those of nodes
 
 /// Boxes of up to eight children: low x, y, z, then high x, y, z. The box of no child is inside out
 /// and infinite, so that no segment meets it.
@@ -65,14 +64,15 @@ class Array {
 
     T* GetData() const { return mpItems; }
     T& operator[](std::size_t i) const { return mpItems[i]; }
-    std::size_t GetSize() const { return mnItems; }
     std::size_t GetBytes() const { return GetBytes(mnItems); }
 
   private:
-    /// Rounded to whole pages, of which a mapped block must consist, on any usual system.
+    /// A large block is mapped, and so is rounded to whole pages, which have up to 64 KiB.
     static std::size_t GetBytes(std::size_t count) {
+        constexpr std::size_t LARGE = std::size_t{1} << 21;
         constexpr std::size_t PAGE = std::size_t{1} << 16;
-        return (count * sizeof(T) + PAGE - 1) / PAGE * PAGE;
+        const std::size_t bytes = count * sizeof(T);
+        return bytes < LARGE ? bytes : (bytes + PAGE - 1) / PAGE * PAGE;
     }
 
     T* mpItems = nullptr;
