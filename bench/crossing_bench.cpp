@@ -101,7 +101,7 @@ constexpr std::pair<const char*, Way> WAYS[] = {
     {"Tin with its tree", AskTin},
 #ifdef KELM_BENCH_EMBREE
     {"Embree, all hits", AskEmbree<Batching::Single>},
-    {"Embree, all hits, packets", AskEmbree<Batching::Packets>},
+    {"Embree, all hits, packets", AskEmbree<Batching::Packet>},
     {"Embree, all hits, stream", AskEmbree<Batching::Stream>},
 #endif
 };

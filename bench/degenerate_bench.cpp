@@ -74,13 +74,13 @@ void FindCrossingByCrossingTree(benchmark::State& rState, const std::string& sTe
 
 void AddDegenerate(const Plan& oPlan) {
     using Step = void (*)(benchmark::State&, const std::string&);
-    constexpr std::pair<const char*, Step> STEPS[] = {{"build", BuildTree},
-                                                      {"a height", FindHeight},
-                                                      {"a crossing", FindCrossing},
-                                                      {"release", ReleaseTree},
-                                                      {"build, crossing tree", BuildCrossingTree},
-                                                      {"a crossing, crossing tree",
-                                                       FindCrossingByCrossingTree}};
+    constexpr std::pair<const char*, Step> STEPS[] = {
+        {"build", BuildTree},
+        {"a height", FindHeight},
+        {"a crossing", FindCrossing},
+        {"release", ReleaseTree},
+        {"build, crossing tree", BuildCrossingTree},
+        {"a crossing, crossing tree", FindCrossingByCrossingTree}};
     for (const std::string kind : {"same", "crowded", "vertical", "tower", "slivers", "far"})
         for (const auto& [name, step] : STEPS) {
             const std::string terrain = (oPlan.bQuick ? "100k-" : "1M-") + kind;

@@ -1,4 +1,5 @@
 #include "bench/peers.h"
+#include "bench/workload.h"
 
 #include <embree3/rtcore.h>
 
@@ -192,6 +193,74 @@ bool Index<EmbreeHits>::GetHeight(float x, float y, float& h) const {
     return true;
 }
 
+namespace {
+
+constexpr std::size_t STREAM = 1024; ///< rays of a stream: they stay in cache
+
+void AnswerByStream(const Scene& oScene, const point2_t<float>* poFirst, std::size_t nCount,
+                    float* pfHeights) {
+    static std::vector<RTCRayHit> rays(STREAM);
+    for (std::size_t i = 0; i < nCount; ++i)
+        rays[i] = oScene.DropRay(poFirst[i].x, poFirst[i].y);
+    RTCIntersectContext context;
+    rtcInitIntersectContext(&context);
+    context.flags = RTC_INTERSECT_CONTEXT_FLAG_COHERENT;
+    rtcIntersect1M(oScene.Get(), &context, rays.data(), static_cast<unsigned>(nCount),
+                   sizeof(RTCRayHit));
+    for (std::size_t i = 0; i < nCount; ++i)
+        pfHeights[i] = rays[i].hit.geomID == RTC_INVALID_GEOMETRY_ID
+                           ? NO_HEIGHT
+                           : rays[i].ray.org_z - rays[i].ray.tfar;
+}
+
+/// @param intersect rtcIntersect8 or rtcIntersect16
+template <typename RayHit, std::size_t SIZE, typename Intersect>
+void AnswerByPacket(const Scene& oScene, const point2_t<float>* poFirst, std::size_t nCount,
+                    float* pfHeights, Intersect intersect) {
+    RayHit rays{};
+    alignas(64) int valid[SIZE];
+    for (std::size_t i = 0; i < SIZE; ++i) {
+        const RTCRayHit ray =
+            oScene.DropRay(poFirst[std::min(i, nCount - 1)].x, poFirst[std::min(i, nCount - 1)].y);
+        valid[i] = i < nCount ? -1 : 0;
+        rays.ray.org_x[i] = ray.ray.org_x;
+        rays.ray.org_y[i] = ray.ray.org_y;
+        rays.ray.org_z[i] = ray.ray.org_z;
+        rays.ray.dir_z[i] = ray.ray.dir_z;
+        rays.ray.tfar[i] = ray.ray.tfar;
+        rays.ray.mask[i] = ray.ray.mask;
+        rays.hit.geomID[i] = RTC_INVALID_GEOMETRY_ID;
+    }
+    RTCIntersectContext context;
+    rtcInitIntersectContext(&context);
+    context.flags = RTC_INTERSECT_CONTEXT_FLAG_COHERENT;
+    intersect(valid, oScene.Get(), &context, &rays);
+    for (std::size_t i = 0; i < nCount; ++i)
+        pfHeights[i] = rays.hit.geomID[i] == RTC_INVALID_GEOMETRY_ID
+                           ? NO_HEIGHT
+                           : rays.ray.org_z[i] - rays.ray.tfar[i];
+}
+
+} // namespace
+
+template <>
+void Index<Embree>::GetHeights(Batching eBatching, const std::vector<point2_t<float>>& oPositions,
+                               std::vector<float>& rHeights) const {
+    const bool is16 =
+        rtcGetDeviceProperty(GetDevice(), RTC_DEVICE_PROPERTY_NATIVE_RAY16_SUPPORTED) != 0;
+    const std::size_t step = eBatching == Batching::Stream ? STREAM : is16 ? 16 : 8;
+    for (std::size_t i = 0; i < oPositions.size(); i += step) {
+        const std::size_t count = std::min(step, oPositions.size() - i);
+        const point2_t<float>* first = &oPositions[i];
+        if (eBatching == Batching::Stream)
+            AnswerByStream(*mpoTree, first, count, &rHeights[i]);
+        else if (is16)
+            AnswerByPacket<RTCRayHit16, 16>(*mpoTree, first, count, &rHeights[i], rtcIntersect16);
+        else
+            AnswerByPacket<RTCRayHit8, 8>(*mpoTree, first, count, &rHeights[i], rtcIntersect8);
+    }
+}
+
 // Along a segment the height is monotone: seen from the higher end the first hit is the highest.
 template <>
 bool Index<Embree>::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b,
@@ -289,7 +358,7 @@ void AnswerSegments(const Index<EmbreeHits>& oIndex, Batching eBatching,
         for (RTCRayHit& ray : rays)
             rtcIntersect1(scene, &hits.oContext, &ray);
         break;
-    case Batching::Packets:
+    case Batching::Packet:
         AskPackets<8, RTCRayHit8>(scene, hits, rays, rtcIntersect8);
         break;
     case Batching::Stream:

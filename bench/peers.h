@@ -5,8 +5,16 @@
 #include "tin/point.h"
 
 #include <memory>
+#include <vector>
 
 namespace kelm::bench {
+
+/// Embree's ways of batching.
+enum class Batching {
+    Single, ///< one ray a call
+    Stream, ///< an array of rays a call
+    Packet  ///< 16 rays a call where the processor has them at once, else 8
+};
 
 /// A competing index. A new one is one name below and one source file that defines the members for
 /// it: Input, Tree and the functions.
@@ -33,6 +41,11 @@ class Index {
     /// Height of the highest crossing of the segment from a to b. @return is there one?
     bool GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h) const;
 
+    /// The heights of many positions by the library's own way of batching, NO_HEIGHT where there is
+    /// none. Embree alone has such ways.
+    void GetHeights(Batching eBatching, const std::vector<point2_t<float>>& oPositions,
+                    std::vector<float>& rHeights) const;
+
     struct Tree;
     const Tree& GetTree() const { return *mpoTree; }
 
@@ -46,10 +59,7 @@ struct Embree;     ///< robust scene; the first hit from above is the highest
 struct EmbreeHits; ///< the same scene; a filter lists every hit and the highest is looked up
 struct Boost;      ///< R-tree of the triangles' boxes in plan, packed; then the triangle itself
 
-/// How Embree takes many rays at a time.
-enum class Batching { Single, Packets, Stream };
-
-/// The highest crossing of each segment, by all hits of the robust scene.
+/// The highest crossing of each segment, by all hits of the robust scene; packets are of 8 rays.
 /// @param pfHeights NaN for a segment without a crossing
 void AnswerSegments(const Index<EmbreeHits>& oIndex, Batching eBatching,
                     const point3_t<float>* poSegments, std::size_t nCount, float* pfHeights);

@@ -1,5 +1,6 @@
 #include "bench/plane.h"
 #include "bench/suite.h"
+#include "tin/raster.h"
 
 #include <algorithm>
 #include <cmath>
@@ -51,6 +52,25 @@ void WalkOursCells(const std::string& sTerrain, Raster& rRaster) {
                 KeepHighest(rRaster, col, row, h);
         }
     }
+}
+
+/// The whole raster in one call. A cell without a height is NaN there.
+void CallOurs(const std::string& sTerrain, Raster& rRaster, int nThreads, tin::EdgeRule eRule) {
+    const auto terrain = GetTerrain(sTerrain);
+    const tin::RasterFrame frame{
+        SIDE, SIDE, {terrain->dfXBase - 0.5, 1.0, 0.0, terrain->dfYBase - 0.5, 0.0, 1.0}};
+    RasterizeHeights(*GetSurface(sTerrain), frame, rRaster.data(), nThreads, eRule);
+    for (float& cell : rRaster)
+        cell = cell > NO_HEIGHT ? cell : NO_HEIGHT;
+}
+
+template <int THREADS>
+void CallOurs(const std::string& sTerrain, Raster& rRaster) {
+    CallOurs(sTerrain, rRaster, THREADS, tin::ER_Float);
+}
+
+void CallOursClosed(const std::string& sTerrain, Raster& rRaster) {
+    CallOurs(sTerrain, rRaster, 1, tin::ER_Closed);
 }
 
 /// Columns of a triangle on a row, from the crossings of its edges. Empty if first > last.
@@ -193,6 +213,8 @@ void AddRaster(const Plan& oPlan) {
         const std::int64_t repeats = size.find('M') == std::string::npos ? 3 : 1;
         add("ours", WalkOurs)->Iterations(repeats);
         add("ours, cells then heights", WalkOursCells)->Iterations(repeats);
+        add("ours, one call", CallOurs<1>)->Iterations(repeats);
+        add("ours, one call, closed", CallOursClosed)->Iterations(repeats);
         add("plain row walk", WalkPlainly)->Iterations(repeats);
         add("row walk stepping the plane", WalkStepping)->Iterations(repeats);
 #ifdef KELM_BENCH_EMBREE
@@ -200,6 +222,12 @@ void AddRaster(const Plan& oPlan) {
 #endif
         if (size == "100k")
             add("GDAL linear grid", GridByGdal);
+        Add({"threads/raster", size, "ours"}, [=](benchmark::State& state) {
+            MakeRaster(state, terrain, CallOurs<1>);
+        })->UseRealTime();
+        Add({"threads/raster", size, "two threads"}, [=](benchmark::State& state) {
+            MakeRaster(state, terrain, CallOurs<2>);
+        })->UseRealTime();
     }
 }
 

@@ -38,6 +38,7 @@ void AddBuild(const Plan& oPlan);
 void AddCrossing(const Plan& oPlan);
 void AddDegenerate(const Plan& oPlan);
 void AddHeight(const Plan& oPlan);
+void AddHeightGrid(const Plan& oPlan);
 void AddLine(const Plan& oPlan);
 void AddScan(const Plan& oPlan);
 void AddWeld(const Plan& oPlan);

@@ -1,8 +1,10 @@
-// Index triples over any coordinates: every query with the tree against the scan, subsets and grid.
+// Index triples over any coordinates: every query with an index against the scan,
+// subsets and grid.
 
 #include "fuzz/bytes.h"
 #include "tin/aabbtree.h"
 #include "tin/crossingtree.h"
+#include "tin/heightgrid.h"
 #include "tin/ray2.h"
 #include "tin/tin.h"
 
@@ -13,6 +15,8 @@
 using fuzz::Require;
 using kelm::tin::AabbTree;
 using kelm::tin::BBox;
+using kelm::tin::CrossingTree;
+using kelm::tin::HeightGrid;
 using kelm::tin::Tin;
 using kelm::tin::Triangle;
 
@@ -48,6 +52,16 @@ void TestPoint(const Opened& surface, const AabbTree& tree, float x, float y) {
     float high = 0.5F;
     Require(surface.GetHeight(x, y, low, nullptr) == surface.GetHeight(x, y, high, &tree));
     Require(IsSame(low, high));
+}
+
+/// The index of heights must give the bits of the scan, by both rules.
+void TestGridHeight(const Opened& surface, const HeightGrid& grid, float x, float y) {
+    for (const auto rule : {kelm::tin::ER_Float, kelm::tin::ER_Closed}) {
+        float wanted = 0.5F;
+        float h = 0.5F;
+        Require(surface.GetHeight(x, y, wanted, nullptr, rule) == grid.GetHeight(x, y, h, rule));
+        Require(std::memcmp(&wanted, &h, sizeof h) == 0);
+    }
 }
 
 /// Does the segment stay on the rim of the triangle's box, where rounding decides? Out of range it
@@ -94,7 +108,7 @@ void TestLine(const Opened& surface, const AabbTree& tree, const Point& a, const
 }
 
 /// The index of lines must give the bits of the scan, one by one and in a batch.
-void TestCrossing(const Opened& surface, const kelm::tin::CrossingTree& index, const Point& a,
+void TestCrossing(const Opened& surface, const CrossingTree& index, const Point& a,
                   const Point& b) {
     float wanted = 0.5F;
     float h = 0.5F;
@@ -161,11 +175,13 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const auto surface = CreateSurface(bytes, coordinates);
     tree.CreateTree(surface.get());
     const unsigned triangles = surface->GetTriangleCount();
-    const kelm::tin::CrossingTree crossings(*surface);
+    const CrossingTree crossings(*surface);
+    const HeightGrid grid(*surface, {1, tree.GetCapacity() * 30, {}});
     do {
         const Point a{coordinates.Take(), coordinates.Take(), coordinates.Take()};
         const Point b{coordinates.Take(), coordinates.Take(), coordinates.Take()};
         TestPoint(*surface, tree, a.x, a.y);
+        TestGridHeight(*surface, grid, a.x, a.y);
         TestLine(*surface, tree, a, b);
         TestCrossing(*surface, crossings, a, b);
         BBox<float, point2_t<float>> region;

@@ -3,10 +3,8 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 #include "tin/aabbtree.h"
-#include "tin/index/leafwalk.h"
 #include "tin/index/pointprobe.h"
 #include "tin/index/search.h"
-#include "tin/rules/frame.h"
 
 namespace kelm::tin {
 
@@ -27,37 +25,6 @@ void Tin::TestTree(const AabbTree* tree) const {
                      "surface has %u",
                      tree->GetTriangleCount(), mnTriangles),
         "tin/tin", __PRETTY_FUNCTION__, __LINE__);
-}
-
-bool Tin::GetHeight(const float& x, const float& y, float& height, const AabbTree* tree) const {
-    TestTree(tree);
-    if (!TestInside(moBBox, x, y))
-        return false;
-    const index::PointProbe probe(x, y);
-    const auto isNear = [probe, triangles = mpoTriangles](unsigned id) {
-        return probe.IsIn(triangles[id].GetBBox());
-    };
-    const auto ask = [&](rules::Highest& highest, unsigned id) {
-        float h;
-        if (isNear(id) && mpoTriangles[id].GetHeight(x, y, h))
-            highest.Add(h);
-    };
-    const auto walk = [&](const AabbNode* root, rules::Highest& highest) {
-        const auto holds = [=](const BBox<float, point2_t<float>>& box) { return probe.IsIn(box); };
-        index::VisitLeaves(root, holds, [&](const std::vector<unsigned>& leaves) {
-            for (const unsigned id : leaves)
-                ask(highest, id);
-        });
-    };
-    const rules::Highest highest =
-        Search(tree, mnTriangles, mnThreads).FindHighest(walk, ask, isNear);
-    height = highest.Get();
-    return highest.IsFound();
-}
-
-bool Tin::GetHeight(const double& x, const double& y, float& height, const AabbTree* tree) const {
-    const point2_t<float> local = rules::Frame(mdfXBase, mdfYBase).ToLocal(point2_t<double>{x, y});
-    return GetHeight(local.x, local.y, height, tree);
 }
 
 void Tin::FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,

@@ -123,8 +123,7 @@ int Triangle::GetBarycentricCoord(float x, float y, double& l0, double& l1, doub
 }
 
 float Triangle::GetWeightedHeight(double l0, double l1, double l2) const {
-    return static_cast<float>((Widen(vertices[1]->z) * l1 + Widen(vertices[0]->z) * l0) +
-                              Widen(vertices[2]->z) * l2);
+    return rules::GetWeightedHeight(vertices[0]->z, vertices[1]->z, vertices[2]->z, l0, l1, l2);
 }
 
 bool Triangle::GetHeight(float x, float y, float& h) const {

@@ -2,6 +2,8 @@
 #include "tests/scripted/readerfixture.h"
 #include "tests/support/allocationcounter.h"
 #include "tin/crossingtree.h"
+#include "tin/heightgrid.h"
+#include "tin/raster.h"
 
 #include <omp.h>
 
@@ -12,6 +14,7 @@ namespace {
 struct AllocationFailureTest : ReaderTest {
     void SetUp() override {
         omp_set_num_threads(4);
+        Recording::poTranscript = nullptr; // it would keep memory
         if (!kelm::tin::test::AllocationCounter::IS_ACTIVE)
             GTEST_SKIP() << "the operators of the sanitizer are in force";
     }
@@ -42,6 +45,9 @@ TEST_F(AllocationFailureTest, OpeningAndLoadingWithPolygonsAndADatumChange) {
         const double x = STRIP_X, y = STRIP_Y;
         script.shapes.push_back({{x, y, 0}, {x + 4, y + 4, 0}, {x + 4, y, 0}, {x, y + 4, 0}, {}});
         script.shapes.push_back({{x, y, 1}, {x + 9, y, 2}, {x + 5, y + 3, 3}, {x, y + 9, 4}, {}});
+        for (Ring& ring : script.shapes)
+            for (ZARVertex& v : ring) // on a line the grid has one row of nodes
+                v.y = vertices == 1001 ? y : v.y;
         FailEach([&] {
             const Reader reader = Open(0.5, 2.0);
             reader->SetOutputVerticalDatum(DatumType(2001));
@@ -99,6 +105,26 @@ TEST_F(AllocationFailureTest, CrossingTreeAndBatchesOfLines) {
         EXPECT_TRUE(heights[0] == heights[2] && heights[1] != heights[1]);
         return heights[0];
     });
+}
+
+TEST_F(AllocationFailureTest, HeightGridBatchesAndRaster) {
+    script.shapes = CreateStrip(240, 50);
+    for (unsigned i = 0; i < 400; ++i) // copies, which no grid divides
+        script.shapes.push_back(script.shapes[0]);
+    const Surface surface = Load(*Open());
+    const point2_t<double> positions[] = {{STRIP_X + 2, STRIP_Y + 9}, {STRIP_X + 300, STRIP_Y + 5}};
+    for (const double turn : {0.0, 0.1})
+        FailEach([&] {
+            const kelm::tin::HeightGrid grid(*surface);
+            float heights[2], same[2];
+            EXPECT_EQ(grid.GetHeights(positions, 2, heights), 2U);
+            EXPECT_EQ(surface->GetHeights(positions, 2, same, nullptr), 2U);
+            EXPECT_TRUE(heights[0] == same[0] && heights[1] == same[1]);
+            const kelm::tin::RasterFrame frame{9, 5, {STRIP_X, 99, turn, STRIP_Y, 0, 9}};
+            std::vector<float> cells(45);
+            return kelm::tin::RasterizeHeights(*surface, frame, cells.data(), 0,
+                                               kelm::tin::ER_Closed);
+        });
 }
 
 } // namespace

@@ -1,13 +1,11 @@
 #pragma once
 
+#include "tests/digest/digest.h"
 #include "tests/support/scriptedservices.h"
+#include "tests/support/transcript.h"
 #include "tin/aabbtree.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
-
-#include <gtest/gtest.h>
-
-#include <memory>
 
 using kelm::ogc::cs::DatumType;
 using kelm::tin::AabbTree;
@@ -76,7 +74,9 @@ struct Opened : kelm::tin::Tin {
         std::vector<int> cells;
         std::vector<float> heights;
         Tin(*this).GetTriangle(place)->GetGridPoints(900, 90, cells, heights);
-        double sum = double(height) + 10.0 * double(crossing) + double(met.size() + cells.size());
+        float batch[3];
+        GetHeights(path, 3, batch, tree);
+        double sum = double(batch[place % 2] > 0.0F ? batch[place % 2] : 1.0F) + double(height) + 10.0 * double(crossing) + double(met.size() + cells.size());
         for (const Surface& part : parts)
             sum = 3.0 * sum + Summarise(part);
         return sum;
@@ -85,7 +85,11 @@ struct Opened : kelm::tin::Tin {
 
 /// A script with one triangle, whose first height is 5.
 struct ReaderTest : testing::Test {
-    ReaderTest() { script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})}; }
+    ReaderTest() {
+        script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})};
+        Recording::poTranscript = &transcript.moLines;
+    }
+    ~ReaderTest() override { Recording::poTranscript = nullptr; }
 
     static Reader Open(double offset = 0.0, double scale = 1.0, int source = 2002) {
         return Reader(kelm::tin::TinReaderFactory::CreateTinReader("some.file", 0, offset, scale,
@@ -96,4 +100,5 @@ struct ReaderTest : testing::Test {
     }
 
     scripted::Script script;
+    kelm::test::Transcript transcript;
 };

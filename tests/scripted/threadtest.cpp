@@ -1,5 +1,7 @@
 #include "tests/scripted/readerfixture.h"
 #include "tin/crossingtree.h"
+#include "tin/heightgrid.h"
+#include "tin/raster.h"
 
 #include <atomic>
 #include <cstring>
@@ -68,6 +70,33 @@ TEST_F(ThreadTest, BatchesOnOneCrossingTreeAndSurface) {
         mnDifferent += std::memcmp(heights.data(), wanted.data(), 4 * COUNT) != 0;
     });
     EXPECT_TRUE(mnDifferent == 0 && found > 1000 && found < COUNT);
+}
+
+TEST_F(ThreadTest, BatchesOnOneHeightGridAndSurface) {
+    const Surface surface = Load(*Open());
+    const AabbTree tree(surface.get());
+    const kelm::tin::HeightGrid grid(*surface);
+    std::vector<point2_t<double>> positions;
+    for (unsigned i = 0; i < 25000; ++i)
+        positions.push_back({STRIP_X + 0.177 * i, STRIP_Y + i % 41});
+    const kelm::tin::RasterFrame frame{300, 200, {STRIP_X, 14, 0, STRIP_Y, 0, 0.2}};
+    std::vector<float> wanted(positions.size()), cells(300 * 200);
+    const auto found = grid.GetHeights(positions.data(), positions.size(), wanted.data(), 1);
+    const auto filled = RasterizeHeights(*surface, frame, cells.data(), 1);
+    RunOnThreads([&](unsigned thread) {
+        const int team = thread % 2 == 0 ? 1 : 3;
+        std::vector<float> heights(positions.size(), -1.0F), same = heights, raster(cells.size());
+        const kelm::tin::HeightGrid own(*surface, {team, 0, {}});
+        mnDifferent +=
+            own.GetHeights(positions.data(), positions.size(), heights.data(), team) != found;
+        mnDifferent += grid.GetHeights(positions.data(), 5000, same.data(), team) == 0;
+        mnDifferent += std::memcmp(heights.data(), wanted.data(), 4 * wanted.size()) != 0;
+        mnDifferent += std::memcmp(same.data(), wanted.data(), 4 * 5000) != 0;
+        mnDifferent += surface->GetHeights(positions.data(), positions.size(), same.data(), &tree,
+                                           team) != found;
+        mnDifferent += RasterizeHeights(*surface, frame, raster.data(), team) != filled;
+    });
+    EXPECT_TRUE(mnDifferent == 0 && found > 20000 && filled > 20000);
 }
 
 TEST_F(ThreadTest, LoadsOnOneReaderAndOnSeveral) {

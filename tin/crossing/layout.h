@@ -15,8 +15,8 @@
 
 namespace kelm::tin::crossing {
 
-constexpr unsigned WIDTH = 8;              ///< children of a node, and triangles of a block
-constexpr unsigned GROUP = WIDTH * WIDTH;  ///< triangles below a node of blocks
+constexpr unsigned WIDTH = 8;             ///< children of a node, and triangles of a block
+constexpr unsigned GROUP = WIDTH * WIDTH; ///< triangles below a node of blocks
 
 /// Boxes of up to eight children: low x, y, z, then high x, y, z. The box of no child is inside out
 /// and infinite, so that no segment meets it.

@@ -2,71 +2,13 @@
 
 #include "services/exception.h"
 #include "services/reporting.h"
+#include "services/rings/ring.h"
 #include "tin/ray2.h"
 #include "tin/rules/extent.h"
 
 #include <algorithm>
-#include <cmath>
-#include <limits>
 
 namespace kelm::tin {
-
-namespace {
-
-/// Points that differ by less than this on both axes, in map units, are one.
-template <typename T>
-constexpr T REPEAT_TOLERANCE = T(1e-9);
-
-template <typename V>
-bool IsRepeat(const V& point, const V& predecessor) {
-    const auto dx = point.x - predecessor.x;
-    const auto dy = point.y - predecessor.y;
-    constexpr auto tolerance = REPEAT_TOLERANCE<decltype(point.x + dx)>;
-    return dx > -tolerance && tolerance > dx && dy > -tolerance && tolerance > dy;
-}
-
-/// Calls keep(i) for each point that is no repeat. A point is compared with its immediate
-/// predecessor, kept or not, so that a chain of close points collapses to its first one.
-template <typename V, typename Keep>
-void VisitKept(const V* points, unsigned count, const Keep& keep) {
-    keep(0U);
-    V predecessor = points[0];
-    for (unsigned i = 1; i < count; ++i) {
-        const V point = points[i];
-        if (!IsRepeat(point, predecessor))
-            keep(i);
-        predecessor = point;
-    }
-}
-
-/// Does the segment A-B meet one of the segments between consecutive points of a chain? Ends count;
-/// parallel segments never meet. Without a branch in the loop, so that pairs are tested side by
-/// side.
-template <typename T>
-bool TestMeetsChain(const point2_t<T>& a, const point2_t<T>& b, const point2_t<T>* chain,
-                    unsigned segments) {
-    const T rx = b.x - a.x;
-    const T ry = b.y - a.y;
-    T meets = T(0); // counted in T, for want of integer lanes of its width
-#pragma omp simd reduction(+ : meets)
-    for (unsigned j = 0; j < segments; ++j) {
-        const T qx = chain[j + 1].x - chain[j].x;
-        const T qy = chain[j + 1].y - chain[j].y;
-        const T wx = a.x - chain[j].x;
-        const T wy = a.y - chain[j].y;
-        const T d = rx * qy - qx * ry;
-        const T sign = std::copysign(T(1), d);
-        const T size = std::fabs(d);
-        const T s = (wy * qx - wx * qy) * sign;
-        const T t = (wy * rx - wx * ry) * sign;
-        const bool meet = !(std::numeric_limits<T>::epsilon() > size) & (T(0) <= s) & (s <= size) &
-                          (T(0) <= t) & (t <= size);
-        meets += meet ? T(1) : T(0);
-    }
-    return meets != T(0);
-}
-
-} // namespace
 
 template <typename T>
 Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
@@ -113,36 +55,18 @@ void Polygon<T>::SetOrient(PolygonOrient eOrient) {
 template <typename T>
 void Polygon<T>::RemoveRepeatedPoints() {
     unsigned kept = 0;
-    VisitKept(mpoPoints, mnPoints, [&](unsigned i) { mpoPoints[kept++] = mpoPoints[i]; });
+    rings::VisitKept(mpoPoints, mnPoints, [&](unsigned i) { mpoPoints[kept++] = mpoPoints[i]; });
     mnPoints = kept;
 }
 
 template <typename T>
 T Polygon<T>::GetSignedArea() const {
-    T sum = T(0);
-    for (unsigned i = 0; i < mnPoints; ++i) {
-        const point2_t<T>& p = mpoPoints[i];
-        const point2_t<T>& q = mpoPoints[i + 1 == mnPoints ? 0 : i + 1];
-        sum += p.x * q.y - p.y * q.x;
-    }
-    return sum * T(0.5);
+    return rings::ComputeSignedArea<T>(mpoPoints, mnPoints);
 }
 
 template <typename T>
 bool Polygon<T>::IsSimple() const {
-    if (mnPoints < 4)
-        return true;
-    const unsigned last = mnPoints - 1;
-    const point2_t<T> closing[2] = {mpoPoints[last], mpoPoints[0]};
-    for (unsigned i = 0; i + 2 < mnPoints; ++i) {
-        const point2_t<T>& a = mpoPoints[i];
-        const point2_t<T>& b = mpoPoints[i + 1];
-        // The closing edge is a neighbour of the first one.
-        if (TestMeetsChain(a, b, mpoPoints + i + 2, last - i - 2) ||
-            (i > 0 && TestMeetsChain(a, b, closing, 1)))
-            return false;
-    }
-    return true;
+    return rings::IsSimple<T>(mpoPoints, mnPoints);
 }
 
 template <typename T>
@@ -182,8 +106,8 @@ template class Polygon<double>;
 std::vector<unsigned> detail::FindRingVertices(const ZARShape& oShape) {
     std::vector<unsigned> kept;
     kept.reserve(static_cast<std::size_t>(oShape.vertexCount));
-    VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
-              [&](unsigned i) { kept.push_back(i); });
+    rings::VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
+                     [&](unsigned i) { kept.push_back(i); });
     return kept;
 }
 

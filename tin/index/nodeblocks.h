@@ -15,6 +15,7 @@ struct NodeBlock {
 
 /// @return memory of at least 128 byte alignment. Large blocks are mapped on their own, on huge
 /// pages where the system has them, so that their pages go back to it and leave the heap as it was
+/// @param bytes from 2 MiB on a multiple of 4096
 /// @throw std::bad_alloc
 void* AllocateBlock(std::size_t bytes);
 void FreeBlock(void* memory, std::size_t bytes) noexcept;

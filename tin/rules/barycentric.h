@@ -17,6 +17,11 @@ inline bool IsDegenerate(double det) {
     return det > -EPSILON && EPSILON > det;
 }
 
+/// The height rule: what the weights make of the heights of the vertices.
+inline float GetWeightedHeight(float z0, float z1, float z2, double l0, double l1, double l2) {
+    return static_cast<float>((Widen(z1) * l1 + Widen(z0) * l0) + Widen(z2) * l2);
+}
+
 /// The inside rule: barycentric weights of positions in one triangle, in plan, row by row.
 ///
 /// Differences, products and numerators are `float`, so that what a triangle and a row share is
@@ -29,6 +34,8 @@ class Barycentric {
 
     /// Does the triangle have no area in plan? It then holds no position.
     bool IsFlat() const { return IsDegenerate(mdfDet); }
+
+    double GetDeterminant() const { return mdfDet; }
 
     void SetRow(float y) {
         mfRow0 = mfB0 * (y - mfY2);
