@@ -79,10 +79,12 @@ std::uint64_t CrossingTree::EstimateObjBytes(unsigned triangleCount) {
         return sizeof(CrossingTree) + sizeof(Index);
     // Each of two trees may have a group that is not full.
     const std::uint64_t groups = std::uint64_t{triangleCount} / GROUP + 2;
+    // At worst the lowest nodes have two groups each, and those above eight nodes.
+    const std::uint64_t upperNodes = 4 * groups / 7;
     const std::uint64_t rounding = std::uint64_t{4} << 16;
     return sizeof(CrossingTree) + sizeof(Index) + rounding +
            groups * (sizeof(Node) + WIDTH * sizeof(Block) + GROUP * sizeof(unsigned)) +
-           groups / 2 * sizeof(UpperNode);
+           upperNodes * sizeof(UpperNode);
 }
 
 } // namespace kelm::tin

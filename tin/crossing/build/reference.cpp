@@ -57,11 +57,12 @@ Reference CreateReference(const Triangle& triangle, unsigned id) {
     const auto& box = copy.GetBBox();
     const auto [low, high] = std::minmax({corners[0]->z, corners[1]->z, corners[2]->z});
     const double side = static_cast<double>(std::max(box.max.x - box.min.x, box.max.y - box.min.y));
-    const bool isTight = IsTight(e1, e2, side);
-    const float rim = isTight ? 0x1p-6F * (high - low) : 0.0F;
-    reference = {{box.min.x, box.min.y, low - rim},
+    const float rim = 0x1p-6F * (high - low);
+    // A box that is infinite both ways would have no centre to be sorted by.
+    const bool isTight = std::isfinite(rim) && IsTight(e1, e2, side);
+    reference = {{box.min.x, box.min.y, isTight ? low - rim : low},
                  id,
-                 {box.max.x, box.max.y, high + rim},
+                 {box.max.x, box.max.y, isTight ? high + rim : high},
                  isTight ? K_Tight : K_Loose};
     if (!IsSame(box, triangle.GetBBox()))
         reference.kind = K_Stale;
