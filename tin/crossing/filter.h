@@ -37,15 +37,15 @@ class Filter {
 
     static Point4 Fill(const point3_t<float>& p) { return {Fill4(p.x), Fill4(p.y), Fill4(p.z)}; }
     static Point4 Load(const Block& block, unsigned corner, unsigned lane) {
-        const float(*const from)[WIDTH] = block.corners + std::size_t{3} * corner;
+        const auto& from = block.corners[corner];
         return {Load4(from[0] + lane), Load4(from[1] + lane), Load4(from[2] + lane)};
     }
 
     /// At least the sum of the distances on the three axes to any corner in the block.
     float GetDistance(const Block& block) const {
-        return (std::fabs(moOrigin.x - block.corners[0][0]) +
-                std::fabs(moOrigin.y - block.corners[1][0])) +
-               (std::fabs(moOrigin.z - block.corners[2][0]) + 4.0F * block.extent);
+        return (std::fabs(moOrigin.x - block.corners[0][0][0]) +
+                std::fabs(moOrigin.y - block.corners[0][1][0])) +
+               (std::fabs(moOrigin.z - block.corners[0][2][0]) + 4.0F * block.extent);
     }
 
     /// The names are those of Moeller and Trumbore.

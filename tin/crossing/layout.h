@@ -26,8 +26,8 @@ struct alignas(64) Node {
 
 /// Eight triangles. Lanes that have none hold a triangle without an extent, which nothing crosses.
 struct alignas(64) Block {
-    float corners[9][WIDTH]; ///< x, y, z of the first corner, then of the second and third
-    float extent;            ///< the longest side of the box of all eight in space
+    float corners[3][3][WIDTH]; ///< x, y, z of each first corner, then of the others
+    float extent;               ///< the longest side of the box of all eight in space
 };
 
 /// A node whose children are nodes.

@@ -107,8 +107,8 @@ void Walk::TestBlock(unsigned number) {
 void Walk::TestLane(const Block& block, unsigned lane, const unsigned& id) {
     point3_t<float> corners[3];
     for (unsigned i = 0; i < 3; ++i)
-        corners[i] = {block.corners[3 * i][lane], block.corners[3 * i + 1][lane],
-                      block.corners[3 * i + 2][lane]};
+        corners[i] = {block.corners[i][0][lane], block.corners[i][1][lane],
+                      block.corners[i][2][lane]};
     Triangle triangle;
     triangle.SetVertices(corners, corners + 1, corners + 2);
     TestTriangle(triangle, id);

@@ -224,9 +224,9 @@ void Builder::FillBlock(const Reference* first, unsigned count, std::size_t numb
         const Triangle& triangle = *mrSurface.GetTriangle(reference.id);
         for (unsigned i = 0; i < 3; ++i) {
             const point3_t<float>& corner = *triangle.GetVertex(isThere ? static_cast<int>(i) : 0);
-            block.corners[3 * i][k] = corner.x;
-            block.corners[3 * i + 1][k] = corner.y;
-            block.corners[3 * i + 2][k] = corner.z;
+            block.corners[i][0][k] = corner.x;
+            block.corners[i][1][k] = corner.y;
+            block.corners[i][2][k] = corner.z;
         }
         moIndex.ids[number * WIDTH + k] = reference.id;
         bounds.Add(reference);
