@@ -99,6 +99,7 @@ Segment MakeSegment(const OpenTin& tin, Random& random) {
     };
     const float far = std::exp2(random.Between(0, 40)), lift = random.Between(-20, 20);
     const Point at = anywhere(), to = anywhere();
+    const Point before{v0.x + random.Between(-9, 9), v0.y + random.Between(-9, 9), v0.z + lift};
     const Point beside{at.x + random.Between(-9, 9), at.y + random.Between(-9, 9), at.z};
     const float odd[] = {0.0F, -0.0F, INFINITE, -INFINITE, NOT_A_NUMBER, -LOWEST, 1e-40F, v0.x};
     Point strange = beside;
@@ -113,6 +114,7 @@ Segment MakeSegment(const OpenTin& tin, Random& random) {
         {{v0.x, v0.y, v0.z + lift}, {v1.x, v1.y, v1.z + lift}}, // above an edge
         {{at.x, at.y, at.z - 99}, {at.x, at.y, at.z + 99}},     // vertical
         {{v0.x, v0.y, -1}, {v0.x, v0.y, 99}},                   // through a corner
+        {before, Between(before, v0, 3)},                       // past a corner
         {at, at},                                               // without a length
         {v0, v0},                                               // on a corner
         {{at.x, at.y, at.z}, {to.x, at.y, at.z}},               // along x
