@@ -1,4 +1,5 @@
 #include "bench/suite.h"
+#include "tin/crossingtree.h"
 
 #include <optional>
 
@@ -47,14 +48,39 @@ void FindCrossing(benchmark::State& rState, const std::string& sTerrain) {
     }
 }
 
+void BuildCrossingTree(benchmark::State& rState, const std::string& sTerrain) {
+    const auto surface = GetSurface(sTerrain);
+    std::optional<tin::CrossingTree> tree;
+    for (auto _ : rState) {
+        tree.emplace(*surface);
+        rState.PauseTiming();
+        tree.reset();
+        rState.ResumeTiming();
+    }
+}
+
+/// The same diagonal by a crossing tree.
+void FindCrossingByCrossingTree(benchmark::State& rState, const std::string& sTerrain) {
+    const auto surface = GetSurface(sTerrain);
+    const tin::CrossingTree tree(*surface);
+    const auto& box = surface->GetBBox();
+    for (auto _ : rState) {
+        float h;
+        benchmark::DoNotOptimize(tree.GetLineIntersectHeight(box.min, box.max, h));
+    }
+}
+
 } // namespace
 
 void AddDegenerate(const Plan& oPlan) {
     using Step = void (*)(benchmark::State&, const std::string&);
-    constexpr std::pair<const char*, Step> STEPS[] = {{"build", BuildTree},
-                                                      {"a height", FindHeight},
-                                                      {"a crossing", FindCrossing},
-                                                      {"release", ReleaseTree}};
+    constexpr std::pair<const char*, Step> STEPS[] = {
+        {"build", BuildTree},
+        {"a height", FindHeight},
+        {"a crossing", FindCrossing},
+        {"release", ReleaseTree},
+        {"build, crossing tree", BuildCrossingTree},
+        {"a crossing, crossing tree", FindCrossingByCrossingTree}};
     for (const std::string kind : {"same", "crowded", "vertical", "tower", "slivers", "far"})
         for (const auto& [name, step] : STEPS) {
             const std::string terrain = (oPlan.bQuick ? "100k-" : "1M-") + kind;

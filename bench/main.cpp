@@ -56,9 +56,10 @@ int main(int argc, char** argv) {
     if (const char* folder = TakeOption(argc, argv, "--data="))
         plan.sDataFolder = folder;
     for (const auto add :
-         {kelm::bench::AddBuild, kelm::bench::AddDegenerate, kelm::bench::AddHeight,
-          kelm::bench::AddHeightGrid, kelm::bench::AddLine, kelm::bench::AddScan,
-          kelm::bench::AddRaster, kelm::bench::AddWeld, kelm::bench::AddRing, kelm::bench::AddLoad})
+         {kelm::bench::AddBuild, kelm::bench::AddCrossing, kelm::bench::AddDegenerate,
+          kelm::bench::AddHeight, kelm::bench::AddHeightGrid, kelm::bench::AddLine,
+          kelm::bench::AddScan, kelm::bench::AddRaster, kelm::bench::AddWeld, kelm::bench::AddRing,
+          kelm::bench::AddLoad})
         add(plan);
     AddVersions();
     benchmark::AddCustomContext("plan", plan.bQuick ? "quick" : "full");

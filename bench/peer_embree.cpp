@@ -289,4 +289,89 @@ bool Index<EmbreeHits>::GetLineIntersectHeight(const point3_t<float>& a, const p
     return true;
 }
 
+namespace {
+
+/// Keeps, of the hits of each ray, the one that is highest along its segment.
+struct HighestHits {
+    RTCIntersectContext oContext; ///< first, so that the filter finds the rest
+    std::vector<float> oHits;     ///< parameter along the ray; negative for none
+};
+
+void KeepHighest(const RTCFilterFunctionNArguments* poArgs) {
+    auto* kept = reinterpret_cast<HighestHits*>(poArgs->context);
+    for (unsigned i = 0; i < poArgs->N; ++i) {
+        if (poArgs->valid[i] == 0)
+            continue;
+        const unsigned id = RTCRayN_id(poArgs->ray, poArgs->N, i);
+        const float t = RTCRayN_tfar(poArgs->ray, poArgs->N, i);
+        float& best = kept->oHits[id];
+        const bool isRising = RTCRayN_dir_z(poArgs->ray, poArgs->N, i) > 0.0F;
+        if (best < 0.0F || (isRising ? t > best : t < best))
+            best = t;
+        poArgs->valid[i] = 0;
+    }
+}
+
+template <unsigned Width, typename Packet>
+void AskPackets(RTCScene poScene, HighestHits& rHits, std::vector<RTCRayHit>& rRays,
+                void (*ask)(const int*, RTCScene, RTCIntersectContext*, Packet*)) {
+    for (std::size_t first = 0; first < rRays.size(); first += Width) {
+        Packet packet{};
+        alignas(64) int valid[Width];
+        for (unsigned i = 0; i < Width; ++i) {
+            valid[i] = first + i < rRays.size() ? -1 : 0;
+            const RTCRayHit& ray = rRays[std::min(first + i, rRays.size() - 1)];
+            packet.ray.org_x[i] = ray.ray.org_x;
+            packet.ray.org_y[i] = ray.ray.org_y;
+            packet.ray.org_z[i] = ray.ray.org_z;
+            packet.ray.dir_x[i] = ray.ray.dir_x;
+            packet.ray.dir_y[i] = ray.ray.dir_y;
+            packet.ray.dir_z[i] = ray.ray.dir_z;
+            packet.ray.tfar[i] = ray.ray.tfar;
+            packet.ray.mask[i] = ray.ray.mask;
+            packet.ray.id[i] = ray.ray.id;
+            packet.hit.geomID[i] = RTC_INVALID_GEOMETRY_ID;
+        }
+        ask(valid, poScene, &rHits.oContext, &packet);
+    }
+}
+
+} // namespace
+
+void AnswerSegments(const Index<EmbreeHits>& oIndex, Batching eBatching,
+                    const point3_t<float>* poSegments, std::size_t nCount, float* pfHeights) {
+    static std::vector<RTCRayHit> rays;
+    rays.resize(nCount);
+    for (std::size_t i = 0; i < nCount; ++i) {
+        const point3_t<float>& a = poSegments[2 * i];
+        const point3_t<float>& b = poSegments[2 * i + 1];
+        rays[i] = Scene::MakeRay(a, {b.x - a.x, b.y - a.y, b.z - a.z}, 1.0F);
+        rays[i].ray.id = static_cast<unsigned>(i);
+    }
+    static HighestHits hits;
+    rtcInitIntersectContext(&hits.oContext);
+    hits.oContext.filter = KeepHighest;
+    hits.oHits.assign(nCount, -1.0F);
+    const RTCScene scene = oIndex.GetTree().Get();
+    switch (eBatching) {
+    case Batching::Single:
+        for (RTCRayHit& ray : rays)
+            rtcIntersect1(scene, &hits.oContext, &ray);
+        break;
+    case Batching::Packet:
+        AskPackets<8, RTCRayHit8>(scene, hits, rays, rtcIntersect8);
+        break;
+    case Batching::Stream:
+        rtcIntersect1M(scene, &hits.oContext, rays.data(), static_cast<unsigned>(nCount),
+                       sizeof(RTCRayHit));
+        break;
+    }
+    for (std::size_t i = 0; i < nCount; ++i) {
+        const float t = hits.oHits[i];
+        const point3_t<float>& a = poSegments[2 * i];
+        pfHeights[i] = t < 0.0F ? std::numeric_limits<float>::quiet_NaN()
+                                : a.z + t * (poSegments[2 * i + 1].z - a.z);
+    }
+}
+
 } // namespace kelm::bench

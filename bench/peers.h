@@ -11,6 +11,7 @@ namespace kelm::bench {
 
 /// Embree's ways of batching.
 enum class Batching {
+    Single, ///< one ray a call
     Stream, ///< an array of rays a call
     Packet  ///< 16 rays a call where the processor has them at once, else 8
 };
@@ -45,8 +46,10 @@ class Index {
     void GetHeights(Batching eBatching, const std::vector<point2_t<float>>& oPositions,
                     std::vector<float>& rHeights) const;
 
-  private:
     struct Tree;
+    const Tree& GetTree() const { return *mpoTree; }
+
+  private:
     std::unique_ptr<Tree> mpoTree;
 };
 
@@ -55,6 +58,11 @@ struct Cgal;       ///< AABB_tree of 3-D triangles
 struct Embree;     ///< robust scene; the first hit from above is the highest
 struct EmbreeHits; ///< the same scene; a filter lists every hit and the highest is looked up
 struct Boost;      ///< R-tree of the triangles' boxes in plan, packed; then the triangle itself
+
+/// The highest crossing of each segment, by all hits of the robust scene; packets are of 8 rays.
+/// @param pfHeights NaN for a segment without a crossing
+void AnswerSegments(const Index<EmbreeHits>& oIndex, Batching eBatching,
+                    const point3_t<float>* poSegments, std::size_t nCount, float* pfHeights);
 
 /// Hands a peer to a generic function.
 template <typename Peer>

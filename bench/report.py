@@ -72,6 +72,11 @@ SUBJECTS = [
      "takes the first hit from the higher end."),
     ("Highest crossing of long segments", "line/50%", (1e-3, "µs a segment"),
      "The same for 2,000 segments of 50 % of the extent."),
+    ("Lines by a crossing tree, short", "crossing/2%", (1e-3, "µs a segment"),
+     "The segments of the two tables above by a `CrossingTree`, one by one and as a batch on one "
+     "thread, beside the surface with its tree and Embree's robust scene, where a filter keeps the "
+     "highest of all hits; Embree takes them one by one, in packets of eight, and as a stream."),
+    ("Lines by a crossing tree, long", "crossing/50%", (1e-3, "µs a segment"), "The same."),
     ("Heights without an index", "scan", (1e-3, "µs a height"),
      "One height by a scan of all triangles, beside reading one word of each cache line of the "
      "array of triangles."),

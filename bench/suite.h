@@ -35,6 +35,7 @@ struct Plan {
 
 // One function a subject, each of which registers its benchmarks, the competitors in turn.
 void AddBuild(const Plan& oPlan);
+void AddCrossing(const Plan& oPlan);
 void AddDegenerate(const Plan& oPlan);
 void AddHeight(const Plan& oPlan);
 void AddHeightGrid(const Plan& oPlan);

@@ -3,6 +3,7 @@
 
 #include "fuzz/bytes.h"
 #include "tin/aabbtree.h"
+#include "tin/crossingtree.h"
 #include "tin/heightgrid.h"
 #include "tin/ray2.h"
 #include "tin/tin.h"
@@ -14,6 +15,7 @@
 using fuzz::Require;
 using kelm::tin::AabbTree;
 using kelm::tin::BBox;
+using kelm::tin::CrossingTree;
 using kelm::tin::HeightGrid;
 using kelm::tin::Tin;
 using kelm::tin::Triangle;
@@ -105,6 +107,22 @@ void TestLine(const Opened& surface, const AabbTree& tree, const Point& a, const
         Require(crosses == crossesToo && IsSame(all, some));
 }
 
+/// The index of lines must give the bits of the scan, one by one and in a batch.
+void TestCrossing(const Opened& surface, const CrossingTree& index, const Point& a,
+                  const Point& b) {
+    float wanted = 0.5F;
+    float h = 0.5F;
+    const bool isFound = surface.GetLineIntersectHeight(a, b, wanted, nullptr);
+    Require(index.GetLineIntersectHeight(a, b, h) == isFound);
+    Require(std::memcmp(&wanted, &h, sizeof h) == 0);
+    const point3_t<double> ends[] = {{1000.0 + double(a.x), double(a.y) - 2000.0, double(a.z)},
+                                     {1000.0 + double(b.x), double(b.y) - 2000.0, double(b.z)}};
+    float all[2];
+    Require(surface.GetLineIntersectHeights(ends, 1, all, nullptr) ==
+            index.GetLineIntersectHeights(ends, 1, all + 1));
+    Require(std::memcmp(all, all + 1, sizeof h) == 0);
+}
+
 void TestSubset(const std::unique_ptr<Tin>& subset, const Tin& whole) {
     if (!subset)
         return;
@@ -157,6 +175,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     const auto surface = CreateSurface(bytes, coordinates);
     tree.CreateTree(surface.get());
     const unsigned triangles = surface->GetTriangleCount();
+    const CrossingTree crossings(*surface);
     const HeightGrid grid(*surface, {1, tree.GetCapacity() * 30, {}});
     do {
         const Point a{coordinates.Take(), coordinates.Take(), coordinates.Take()};
@@ -164,6 +183,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         TestPoint(*surface, tree, a.x, a.y);
         TestGridHeight(*surface, grid, a.x, a.y);
         TestLine(*surface, tree, a, b);
+        TestCrossing(*surface, crossings, a, b);
         BBox<float, point2_t<float>> region;
         region.min = {a.x, a.y};
         region.max = {b.x, b.y};

@@ -121,6 +121,15 @@ class KELM_TIN_EXPORT Tin {
                                 const AabbTree* tree) const;
     bool GetLineIntersectHeight(const point3_t<double>& a, const point3_t<double>& b, float& h,
                                 const AabbTree* tree) const;
+    /// The same for many segments in map coordinates. A CrossingTree is the quicker index for it.
+    /// @param segments 2 count points: start and end of each segment @param heights count values in
+    /// the order of the segments; NaN for a segment without a crossing
+    /// @param threads most threads; 0 for the runtime's default. A small batch stays on the calling
+    /// thread
+    /// @return how many segments have a crossing
+    std::size_t GetLineIntersectHeights(const point3_t<double>* segments, std::size_t count,
+                                        float* heights, const AabbTree* tree,
+                                        int threads = 0) const;
 
     /// A new surface of the triangles that meet a region, with the vertices that they use; the
     /// caller deletes it. It shares nothing with this one. Without an index it takes the triangles
@@ -176,6 +185,8 @@ class KELM_TIN_EXPORT Tin {
     void TestTree(const AabbTree* tree) const;
     bool FindHeight(const point2_t<float>& position, float& height, const AabbTree* tree, int most,
                     EdgeRule eRule) const;
+    bool FindCrossing(const point3_t<float>& a, const point3_t<float>& b, float& h,
+                      const AabbTree* tree, int most) const;
 
     Triangle* mpoTriangles = nullptr;
     std::uint32_t mnTriangles = 0;

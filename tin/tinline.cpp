@@ -5,14 +5,22 @@
 #include "tin/index/prefetch.h"
 #include "tin/index/search.h"
 #include "tin/index/segmentprobe.h"
+#include "tin/parallel/parallelbatch.h"
 #include "tin/ray2.h"
 #include "tin/rules/frame.h"
 
 #include <array>
+#include <atomic>
+#include <limits>
 
 namespace kelm::tin {
 
 namespace {
+
+/// Segments by a tree that are worth a thread.
+constexpr std::size_t SMALLEST = 256;
+/// Triangles that a scan passes in the time of a segment by a tree.
+constexpr std::size_t TRIANGLES_SCANNED = 200;
 
 /// Adds the height at which a segment crosses a triangle, if it does.
 void AddCrossing(const Triangle& triangle, const point3_t<float>& a, const point3_t<float>& b,
@@ -62,9 +70,9 @@ class CrossingBatch {
 
 } // namespace
 
-bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h,
-                                 const AabbTree* tree) const {
-    TestTree(tree);
+/// @param most threads of a scan
+bool Tin::FindCrossing(const point3_t<float>& a, const point3_t<float>& b, float& h,
+                       const AabbTree* tree, int most) const {
     if (!IsIntersectedBBox(moBBox, a, b))
         return false;
     const auto walk = [&](const AabbNode* root, rules::Highest& highest) {
@@ -81,16 +89,42 @@ bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>
         AddCrossing(mpoTriangles[id], a, b, highest);
     };
     // h may be a coordinate of a or b, so it is written last.
-    const rules::Highest highest =
-        index::Search(tree, mnTriangles, mnThreads).FindHighest(walk, ask);
+    const rules::Highest highest = index::Search(tree, mnTriangles, most).FindHighest(walk, ask);
     h = highest.Get();
     return highest.IsFound();
+}
+
+bool Tin::GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h,
+                                 const AabbTree* tree) const {
+    TestTree(tree);
+    return FindCrossing(a, b, h, tree, mnThreads);
 }
 
 bool Tin::GetLineIntersectHeight(const point3_t<double>& a, const point3_t<double>& b, float& h,
                                  const AabbTree* tree) const {
     const rules::Frame frame(mdfXBase, mdfYBase);
     return GetLineIntersectHeight(frame.ToLocal(a), frame.ToLocal(b), h, tree);
+}
+
+std::size_t Tin::GetLineIntersectHeights(const point3_t<double>* segments, std::size_t count,
+                                         float* heights, const AabbTree* tree, int threads) const {
+    TestTree(tree);
+    const rules::Frame frame(mdfXBase, mdfYBase);
+    std::atomic<std::size_t> found{0};
+    const auto find = [&](std::size_t first, std::size_t last) {
+        std::size_t foundHere = 0;
+        for (; first < last; ++first) {
+            if (FindCrossing(frame.ToLocal(segments[2 * first]),
+                             frame.ToLocal(segments[2 * first + 1]), heights[first], tree, 1))
+                ++foundHere;
+            else
+                heights[first] = std::numeric_limits<float>::quiet_NaN();
+        }
+        found += foundHere;
+    };
+    const std::size_t weight = tree == nullptr ? mnTriangles / TRIANGLES_SCANNED + 1 : 1;
+    parallel::ParallelBatch(count, SMALLEST / weight + 1, threads, find);
+    return found;
 }
 
 template <typename P>

@@ -1,6 +1,7 @@
 #include "services/exception.h"
 #include "tests/scripted/readerfixture.h"
 #include "tests/support/allocationcounter.h"
+#include "tin/crossingtree.h"
 #include "tin/heightgrid.h"
 #include "tin/raster.h"
 
@@ -86,6 +87,24 @@ TEST_F(AllocationFailureTest, SurfaceTreeCopiesSearchesAndSubsets) {
     surface.GetHeight(30.0F, 20.0F, h, &tree);
     surface.GetLineIntersectHeight(point3_t<float>{0, 0, 0}, {900, 30, 900}, h, &tree);
     EXPECT_EQ(kelm::tin::test::AllocationCounter::mnRequests, 0) << "a query needs no memory";
+}
+
+TEST_F(AllocationFailureTest, CrossingTreeAndBatchesOfLines) {
+    script.shapes = CreateStrip(240, 50);
+    const Surface surface = Load(*Open());
+    surface->GetTriangle(3)->GetBBox().max.x += 1.0F; // kept apart
+    const point3_t<double> lines[] = {{STRIP_X, STRIP_Y + 9, 900},
+                                      {STRIP_X + 90, STRIP_Y, 600},
+                                      {STRIP_X, STRIP_Y, 9000},
+                                      {STRIP_X, STRIP_Y, 9000}};
+    FailEach([&] {
+        const kelm::tin::CrossingTree tree(*surface);
+        float heights[4];
+        EXPECT_EQ(tree.GetLineIntersectHeights(lines, 2, heights), 1U);
+        EXPECT_EQ(surface->GetLineIntersectHeights(lines, 2, heights + 2, nullptr), 1U);
+        EXPECT_TRUE(heights[0] == heights[2] && heights[1] != heights[1]);
+        return heights[0];
+    });
 }
 
 TEST_F(AllocationFailureTest, HeightGridBatchesAndRaster) {

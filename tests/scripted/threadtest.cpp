@@ -1,4 +1,5 @@
 #include "tests/scripted/readerfixture.h"
+#include "tin/crossingtree.h"
 #include "tin/heightgrid.h"
 #include "tin/raster.h"
 
@@ -44,6 +45,33 @@ TEST_F(ThreadTest, QueriesOfEveryKindOnOneSurfaceAndTree) {
     EXPECT_EQ(mnDifferent, 0);
 }
 
+TEST_F(ThreadTest, BatchesOnOneCrossingTreeAndSurface) {
+    const Surface surface = Load(*Open());
+    const AabbTree tree(surface.get());
+    const kelm::tin::CrossingTree crossings(*surface);
+    constexpr std::size_t COUNT = 3000;
+    std::vector<point3_t<double>> lines;
+    for (unsigned i = 0; i < COUNT; ++i)
+        for (const double z : {900.0, 500.0})
+            lines.push_back({STRIP_X + 1.5 * i + z / 20, STRIP_Y + i % 41, z});
+    std::vector<float> wanted(COUNT);
+    const auto found = surface->GetLineIntersectHeights(lines.data(), COUNT, wanted.data(), &tree);
+    RunOnThreads([&](unsigned thread) {
+        const int team = thread % 2 == 0 ? 1 : 3;
+        std::vector<float> heights(COUNT);
+        const kelm::tin::CrossingTree own(*surface, {team, 0, {}});
+        for (const auto* index : {&crossings, &own}) {
+            mnDifferent +=
+                index->GetLineIntersectHeights(lines.data(), COUNT, heights.data(), team) != found;
+            mnDifferent += std::memcmp(heights.data(), wanted.data(), 4 * COUNT) != 0;
+        }
+        mnDifferent += surface->GetLineIntersectHeights(lines.data(), COUNT, heights.data(), &tree,
+                                                        team) != found;
+        mnDifferent += std::memcmp(heights.data(), wanted.data(), 4 * COUNT) != 0;
+    });
+    EXPECT_TRUE(mnDifferent == 0 && found > 1000 && found < COUNT);
+}
+
 TEST_F(ThreadTest, BatchesOnOneHeightGridAndSurface) {
     const Surface surface = Load(*Open());
     const AabbTree tree(surface.get());
@@ -59,8 +87,8 @@ TEST_F(ThreadTest, BatchesOnOneHeightGridAndSurface) {
         const int team = thread % 2 == 0 ? 1 : 3;
         std::vector<float> heights(positions.size(), -1.0F), same = heights, raster(cells.size());
         const kelm::tin::HeightGrid own(*surface, {team, 0, {}});
-        mnDifferent += own.GetHeights(positions.data(), positions.size(), heights.data(), team) !=
-                       found;
+        mnDifferent +=
+            own.GetHeights(positions.data(), positions.size(), heights.data(), team) != found;
         mnDifferent += grid.GetHeights(positions.data(), 5000, same.data(), team) == 0;
         mnDifferent += std::memcmp(heights.data(), wanted.data(), 4 * wanted.size()) != 0;
         mnDifferent += std::memcmp(same.data(), wanted.data(), 4 * 5000) != 0;
