@@ -101,10 +101,10 @@ const tin::HeightGrid& Surface::GetGrid() const {
 }
 
 /// As GetGrid.
-const tin::AabbTree& Surface::GetTree() const {
+const tin::CrossingTree& Surface::GetTree() const {
     const std::lock_guard<std::mutex> lock(moMutex);
     if (!mpoTree)
-        mpoTree = std::make_unique<const tin::AabbTree>(mpoTin.get());
+        mpoTree = std::make_unique<const tin::CrossingTree>(*mpoTin);
     return *mpoTree;
 }
 
@@ -130,12 +130,8 @@ Array<float> Surface::GetCrossings(const Array<double>& segments, int threads) c
     Array<float> heights = MakeFloats(segments.shape(0));
     float* out = heights.mutable_data();
     const py::gil_scoped_release release;
-    static_cast<void>(threads);
-    const tin::AabbTree& tree = GetTree();
-    const auto* ends = reinterpret_cast<const point3_t<double>*>(segments.data());
-    for (py::ssize_t i = 0; i < segments.shape(0); ++i)
-        if (!mpoTin->GetLineIntersectHeight(ends[2 * i], ends[2 * i + 1], out[i], &tree))
-            out[i] = std::numeric_limits<float>::quiet_NaN();
+    GetTree().GetLineIntersectHeights(reinterpret_cast<const point3_t<double>*>(segments.data()),
+                                      static_cast<std::size_t>(segments.shape(0)), out, threads);
     return heights;
 }
 

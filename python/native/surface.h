@@ -2,7 +2,7 @@
 
 #include "python/native/numpy.h"
 
-#include <tin/aabbtree.h>
+#include <tin/crossingtree.h>
 #include <tin/heightgrid.h>
 #include <tin/raster.h>
 #include <tin/tin.h>
@@ -49,13 +49,13 @@ class Surface {
 
   private:
     const tin::HeightGrid& GetGrid() const;
-    const tin::AabbTree& GetTree() const;
+    const tin::CrossingTree& GetTree() const;
     const std::vector<Triangle_Id>& GetIds() const;
 
     std::unique_ptr<const tin::Tin> mpoTin;
     mutable std::mutex moMutex; ///< never held while waiting for the interpreter's lock
     mutable std::unique_ptr<const tin::HeightGrid> mpoGrid;
-    mutable std::unique_ptr<const tin::AabbTree> mpoTree;
+    mutable std::unique_ptr<const tin::CrossingTree> mpoTree;
     mutable std::vector<Triangle_Id> moIds;
 };
 

@@ -3,8 +3,8 @@
 //     answers FILE POSITIONS SEGMENTS RASTER > ANSWERS
 //
 // POSITIONS and SEGMENTS hold `double` coordinates, two and six a query; RASTER is the side of the
-// cells, from the north-western corner of the surface's box on, 64 by 64. ANSWERS gets a `float` for
-// each query and each cell: of positions, of segments, of the raster.
+// cells, from the north-western corner of the surface's box on, 64 by 64. ANSWERS gets a `float`
+// for each query and each cell: of positions, of segments, of the raster.
 
 #include <tin/aabbtree.h>
 #include <tin/raster.h>
@@ -40,8 +40,8 @@ void Write(const std::vector<float>& values) {
 } // namespace
 
 int main(int, char** arguments) {
-    const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-        arguments[1], 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
+    const std::unique_ptr<TinReader> reader(
+        TinReaderFactory::CreateTinReader(arguments[1], 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
     const std::unique_ptr<Tin> surface(reader->Load(nullptr));
     const AabbTree tree(surface.get());
     const auto ask = [&](const auto& queries, auto find) {

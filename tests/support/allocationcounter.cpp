@@ -56,6 +56,9 @@ void operator delete(void* block, std::size_t) noexcept {
 void operator delete(void* block, std::align_val_t) noexcept {
     operator delete(block);
 }
+void operator delete(void* block, std::size_t, std::align_val_t) noexcept {
+    operator delete(block);
+}
 void operator delete[](void* block) noexcept {
     operator delete(block);
 }
