@@ -6,6 +6,8 @@
 
 #include <pybind11/stl.h>
 
+#include <utility>
+
 namespace kelm::python {
 
 namespace {
@@ -49,7 +51,7 @@ void AddErrors(py::module_& module) {
     dataError.attr("__module__") = "kelm_tin";
     py::register_exception_translator([](std::exception_ptr failure) {
         try {
-            std::rethrow_exception(failure);
+            std::rethrow_exception(std::move(failure));
         } catch (const FileError& error) {
             PyErr_SetString(PyExc_OSError, error.what());
         } catch (const kelm::Exception& error) {

@@ -76,7 +76,8 @@ struct Opened : kelm::tin::Tin {
         Tin(*this).GetTriangle(place)->GetGridPoints(900, 90, cells, heights);
         float batch[3];
         GetHeights(path, 3, batch, tree);
-        double sum = double(batch[place % 2] > 0.0F ? batch[place % 2] : 1.0F) + double(height) + 10.0 * double(crossing) + double(met.size() + cells.size());
+        double sum = double(batch[place % 2] > 0.0F ? batch[place % 2] : 1.0F) + double(height) +
+                     10.0 * double(crossing) + double(met.size() + cells.size());
         for (const Surface& part : parts)
             sum = 3.0 * sum + Summarise(part);
         return sum;
