@@ -59,7 +59,7 @@ class KELM_TIN_EXPORT CrossingTree {
     /// @return bytes held by this index
     std::uint64_t GetObjBytes() const;
     /// @return bytes that an index of so many triangles will hold at most, if no stored box is out
-    /// of date; some 46 a triangle
+    /// of date; some 49 a triangle
     static std::uint64_t EstimateObjBytes(unsigned triangleCount);
 
   private:
