@@ -30,13 +30,13 @@ set(CPACK_COMPONENT_DEVELOPMENT_DESCRIPTION
     "${PROJECT_DESCRIPTION}\n Headers, packages for CMake and pkg-config, and examples.")
 
 if(TARGET kelm_tin_python)
-  math(EXPR next "${Python_VERSION_MINOR} + 1")
+  math(EXPR next "${KELM_TIN_PYTHON_MINOR} + 1")
   list(APPEND CPACK_COMPONENTS_ALL python)
   set(CPACK_DEBIAN_PYTHON_PACKAGE_NAME python3-kelm-tin)
   set(CPACK_DEBIAN_PYTHON_PACKAGE_SECTION python)
   set(CPACK_DEBIAN_PYTHON_PACKAGE_SHLIBDEPS ON)
   set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
-      "python3 (>= 3.${Python_VERSION_MINOR}~), python3 (<< 3.${next}), python3-numpy")
+      "python3 (>= 3.${KELM_TIN_PYTHON_MINOR}~), python3 (<< 3.${next}), python3-numpy")
   set(CPACK_COMPONENT_PYTHON_DEPENDS runtime)
   set(CPACK_COMPONENT_PYTHON_DESCRIPTION "${PROJECT_DESCRIPTION}\n The Python package kelm_tin.")
   list(APPEND CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${PROJECT_BINARY_DIR}/tin)
