@@ -72,8 +72,10 @@ struct Mesh {
         ids.push_back({first, first + 1, first + 2});
     }
     OpenTin MakeTin(double dfXBase = 0, double dfYBase = 0) const {
-        auto* points = new Point[vertices.size()];
-        std::copy(vertices.begin(), vertices.end(), points);
+        // A surface without triangles or vertices does not take the vertices over.
+        auto* points = vertices.empty() || ids.empty() ? nullptr : new Point[vertices.size()];
+        if (points != nullptr)
+            std::copy(vertices.begin(), vertices.end(), points);
         auto* triples = new Triangle_Id[ids.size()];
         std::copy(ids.begin(), ids.end(), triples);
         return OpenTin(points, static_cast<unsigned>(vertices.size()), triples,
