@@ -12,8 +12,8 @@
 /// In z the nodes are no farther apart than the given spacing. In x and y the number of cells is
 /// what the spacing asks for, but at least 128 and at most 256. At least 128, because in degrees
 /// one spacing can span the whole box. At most 256, because each node costs its user a transform.
-/// If 256 cells would be wider than 1750 units, there are more, up to 640. Then the outermost cell
-/// at each end of x and y is halved six times, which adds twelve nodes to the axis.
+/// Cells that are wider than 1750 units even so become that narrow, up to 640 of them. Then the
+/// outermost cell at each end of x and y is halved six times, which adds twelve nodes to the axis.
 ///
 /// The values in mind are heights of a geoid model, which is linear between its own nodes on each
 /// axis, with a kink at each. So on x and y two lines are drawn into each cell: one through the

@@ -19,10 +19,10 @@ constexpr std::uint32_t MOST_NODES = std::numeric_limits<std::uint32_t>::max() /
 
 /// Over ten degrees, three cells are then less than 15 arc minutes wide, the cell of EGM96.
 constexpr double LEAST_MAP_CELLS = 128.0;
-/// Cells as narrow as the spacing asks for are laid up to this number.
+/// The spacing asks for no more than this.
 constexpr double MOST_FINE_CELLS = 256.0;
-/// In metres a cell is no wider than this, up to MOST_MAP_CELLS. At 71 degrees of latitude 15 arc
-/// minutes of longitude are 9 km, and a kink aslant needs more than three cells there.
+/// In metres. At 71 degrees of latitude 15 arc minutes of longitude are 9 km, and a kink that runs
+/// aslant needs more than three cells there.
 constexpr double WIDEST_CELL = 1750.0;
 constexpr double MOST_MAP_CELLS = 640.0;
 
