@@ -58,7 +58,7 @@ int main(int argc, char** argv) {
     for (const auto add :
          {kelm::bench::AddBuild, kelm::bench::AddDegenerate, kelm::bench::AddHeight,
           kelm::bench::AddLine, kelm::bench::AddScan, kelm::bench::AddRaster, kelm::bench::AddWeld,
-          kelm::bench::AddRing, kelm::bench::AddLoad})
+          kelm::bench::AddRing, kelm::bench::AddLoad, kelm::bench::AddWindow})
         add(plan);
     AddVersions();
     benchmark::AddCustomContext("plan", plan.bQuick ? "quick" : "full");

@@ -30,6 +30,28 @@ class ScopedLock {
     const threading::Mutex& mrMutex;
 };
 
+/// Tells the store the window of a walk, if the store asks for it.
+class ToldWindow {
+  public:
+    ToldWindow(ZARLayer_t* layer, const Window* window) {
+        if (window == nullptr || ZARSetWindow == nullptr)
+            return;
+        const ZARVertex low{window->min.x, window->min.y, 0.0};
+        const ZARVertex high{window->max.x, window->max.y, 0.0};
+        ZARSetWindow(layer, &low, &high);
+        mpLayer = layer;
+    }
+    ToldWindow(const ToldWindow&) = delete;
+    ToldWindow& operator=(const ToldWindow&) = delete;
+    ~ToldWindow() {
+        if (mpLayer != nullptr)
+            ZARSetWindow(mpLayer, nullptr, nullptr);
+    }
+
+  private:
+    ZARLayer_t* mpLayer = nullptr; ///< null if nothing was told
+};
+
 /// The shape, or null if the store cannot deliver it. A store that throws has told why.
 const ZARShape* FindShape(ZARLayer_t* layer, int id) {
     const ZARShape* shape = nullptr;
@@ -50,6 +72,7 @@ Tin* TinReader::Load(const Window* poWindow) {
     if (mnShapeCount < 1 || (poWindow != nullptr && !TestOverlap(*poWindow, moBBox)))
         return nullptr;
     const ScopedLock lock(moMutex);
+    const ToldWindow told(mpLayer, poWindow);
     load::CornerList corners(mnShapeCount);
     for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id))
         ReadShape(id, poWindow, corners);
