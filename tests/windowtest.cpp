@@ -119,7 +119,7 @@ struct WindowTest : FileTest {
         Add(-1e300, -1e300, 2e300);   // all
         Add(1e9, 1e9, 1);             // beside all
         Add(5, 5, -3);                // turned inside out
-        Add(-INFINITY, 10, INFINITY); // not a number at one end
+        Add(-HUGE_VAL, 10, HUGE_VAL); // not a number at one end
         return oWindows;
     }
 };
