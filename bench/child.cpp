@@ -61,6 +61,8 @@ int RunJob(const std::vector<std::string>& oJob) {
             figures = MeasureBuild(oJob[1], oJob[2]);
         else if (oJob.size() == 3 && oJob[0] == "load")
             figures = MeasureLoad(oJob[1], oJob[2]);
+        else if (oJob.size() == 3 && oJob[0] == "window")
+            figures = MeasureWindow(oJob[1], oJob[2]);
         else
             throw std::invalid_argument("no such job");
         for (const auto& [name, value] : figures)

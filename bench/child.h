@@ -24,6 +24,8 @@ Figures MeasureBuild(const std::string& sPeer, const std::string& sTerrain);
 /// Loads a file by the library ("ours") or by a bare OGR loop: "open", "load", "peak" beyond the
 /// start of the process, "triangles", and the sum of the "corners"' ordinates.
 Figures MeasureLoad(const std::string& sWho, const std::string& sFile);
+/// Loads a hundredth of a file ("part") or all of it ("whole"): "load" and "triangles".
+Figures MeasureWindow(const std::string& sWhat, const std::string& sFile);
 
 double GetProcessorTime();
 /// @return resident memory

@@ -1,10 +1,10 @@
 #include "bench/child.h"
 #include "bench/suite.h"
+#include "bench/terrainfile.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
 
 #include <cmath>
-#include <filesystem>
 #include <stdexcept>
 
 #include <ogrsf_frmts.h>
@@ -13,68 +13,11 @@ namespace kelm::bench {
 
 namespace {
 
-struct Format {
-    const char* pszDriver;
-    const char* pszEnding;
-};
-
-constexpr Format FORMATS[] = {
-    {"GPKG", ".gpkg"}, {"FlatGeobuf", ".fgb"}, {"ESRI Shapefile", ".shp"}};
-
 template <typename T>
 T& Need(T* poObject, const std::string& sWhat) {
     if (poObject == nullptr)
         throw std::runtime_error("GDAL: no " + sWhat);
     return *poObject;
-}
-
-/// Three corners and the first again.
-OGRPolygon* MakePolygon(const containers::KeyPoint<double>* poCorners) {
-    auto* ring = new OGRLinearRing;
-    for (const int i : {0, 1, 2, 0})
-        ring->addPoint(poCorners[i].x, poCorners[i].y, poCorners[i].z);
-    auto* polygon = new OGRPolygon;
-    polygon->addRingDirectly(ring);
-    return polygon;
-}
-
-void WriteLayer(OGRLayer& rLayer, const Terrain& oTerrain) {
-    const auto corners = GetCorners(oTerrain);
-    for (std::size_t i = 0; i < corners.size(); i += 3) {
-        OGRFeature feature(rLayer.GetLayerDefn());
-        feature.SetGeometryDirectly(MakePolygon(&corners[i]));
-        if (rLayer.CreateFeature(&feature) != OGRERR_NONE)
-            throw std::runtime_error("GDAL: a triangle was not written");
-    }
-}
-
-/// Writes a terrain as polygons with heights.
-void WriteFile(const std::string& sTerrain, const Format& format, const std::string& sFile) {
-    GDALDriver& driver =
-        Need(GetGDALDriverManager()->GetDriverByName(format.pszDriver), format.pszDriver);
-    const GDALDatasetUniquePtr file(driver.Create(sFile.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
-    OGRSpatialReference reference;
-    reference.importFromEPSG(32616);
-    OGRLayer& layer =
-        Need(Need(file.get(), sFile).CreateLayer("terrain", &reference, wkbPolygon25D, nullptr),
-             "layer");
-    file->StartTransaction();
-    WriteLayer(layer, *GetTerrain(sTerrain));
-    file->CommitTransaction();
-}
-
-/// The file of a terrain, made anew unless a whole one is there.
-std::string GetFile(const std::string& sFolder, const std::string& sTerrain, const Format& format) {
-    const std::filesystem::path folder = std::filesystem::path(sFolder) / sTerrain;
-    const std::filesystem::path mark = folder / (format.pszEnding + std::string(".whole"));
-    std::string file = (folder / ("terrain" + std::string(format.pszEnding))).string();
-    if (!std::filesystem::exists(mark)) {
-        std::filesystem::create_directories(folder);
-        std::filesystem::remove(file);
-        WriteFile(sTerrain, format, file);
-        std::filesystem::create_directory(mark);
-    }
-    return file;
 }
 
 /// Sum of all ordinates of a triangle's corners, to tell whether two loads found the same.
@@ -140,8 +83,8 @@ bool IsTerrain(const Figures& oFigures, const Terrain& oTerrain) {
 
 /// The time is that of the load proper; what opening took stands beside it.
 void Load(benchmark::State& rState, const Plan& oPlan, const std::string& sTerrain,
-          const Format& format, const std::string& sWho) {
-    const std::string file = GetFile(oPlan.sDataFolder, sTerrain, format);
+          const FileFormat& format, const std::string& sWho) {
+    const std::string file = GetTerrainFile(oPlan.sDataFolder, sTerrain, format);
     const auto terrain = GetTerrain(sTerrain);
     for (auto _ : rState) {
         const Figures figures = RunChild({"load", sWho, file});
@@ -169,7 +112,7 @@ void AddLoad(const Plan& oPlan) {
     if (!oPlan.bQuick)
         terrains.push_back("1M");
     for (const std::string& terrain : terrains)
-        for (const Format& format : FORMATS)
+        for (const FileFormat& format : FILE_FORMATS)
             for (const std::string who : {"ours", "bare OGR loop"})
                 Add({"load", format.pszDriver, terrain, who}, [=](benchmark::State& state) {
                     Load(state, oPlan, terrain, format, who);

@@ -59,7 +59,7 @@ int main(int argc, char** argv) {
          {kelm::bench::AddBuild, kelm::bench::AddCrossing, kelm::bench::AddDegenerate,
           kelm::bench::AddHeight, kelm::bench::AddHeightGrid, kelm::bench::AddLine,
           kelm::bench::AddScan, kelm::bench::AddRaster, kelm::bench::AddWeld, kelm::bench::AddRing,
-          kelm::bench::AddLoad})
+          kelm::bench::AddLoad, kelm::bench::AddWindow})
         add(plan);
     AddVersions();
     benchmark::AddCustomContext("plan", plan.bQuick ? "quick" : "full");

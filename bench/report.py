@@ -104,6 +104,11 @@ SUBJECTS = [
      "nothing."),
     ("Loading, FlatGeobuf", "load/FlatGeobuf", (1e-9, "s"), "The same."),
     ("Loading, Shapefile", "load/ESRI Shapefile", (1e-9, "s"), "The same."),
+    ("Windows, GeoPackage", "window/GPKG", (1e-9, "s"),
+     "The processor time of `Load` alone, for a window of a hundredth of the area and for the "
+     "whole layer, each in a process of its own."),
+    ("Windows, FlatGeobuf", "window/FlatGeobuf", (1e-9, "s"), "The same."),
+    ("Windows, Shapefile", "window/ESRI Shapefile", (1e-9, "s"), "The same."),
 ]
 
 
@@ -348,7 +353,13 @@ def get_goals(results):
         for row in results.get_rows("load/" + driver):
             load.at_most(f"{driver} {row}", invert(ratio("load/" + driver, row, "bare OGR loop")),
                          bound)
-    return goals + [load, get_growth_goal(results)]
+    window = Goal("window", "A window of 1 %: at most 3 % of a whole load (GeoPackage, FlatGeobuf), "
+                  "30 % (Shapefile)")
+    for driver, bound in (("FlatGeobuf", 0.03), ("GPKG", 0.03), ("ESRI Shapefile", 0.3)):
+        for row in results.get_rows("window/" + driver):
+            window.at_most(f"{driver} {row}",
+                           invert(ratio("window/" + driver, row, "whole layer")), bound)
+    return goals + [load, window, get_growth_goal(results)]
 
 
 def get_growth(results, subject, start, end, per_log):

@@ -45,6 +45,7 @@ void AddWeld(const Plan& oPlan);
 void AddRing(const Plan& oPlan);
 void AddRaster(const Plan& oPlan);
 void AddLoad(const Plan& oPlan);
+void AddWindow(const Plan& oPlan);
 
 /// Registers a benchmark under the parts of its name: subject, workload and size, competitor. The
 /// time is processor time of the whole process.

@@ -73,6 +73,14 @@ KELM_SERVICES_EXPORT int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* inf
 /// @return 0; not relied on
 KELM_SERVICES_EXPORT int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high);
 
+/// Optional. Tells which shapes the caller is going to ask for: those that share a point in plan
+/// with a window. ZARGetNext may leave out any others until the next call, and need not. Shapes
+/// that it gives come in their order and with their ids, and ZARGetShapeRef delivers any shape.
+/// @param low,high corners of the window in map coordinates, of which only x and y count; both null
+/// for all shapes, which must not throw
+KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL void
+ZARSetWindow(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high);
+
 /// Walks the shapes. @param id -1 or a shape id. @return the first id for -1, else the id behind
 /// `id`; -1 at the end. @throw if the layer cannot be read on, or has no shape `id`
 KELM_SERVICES_EXPORT int ZARGetNext(ZARLayer_t* layer, int id);

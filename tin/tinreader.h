@@ -4,6 +4,7 @@
 #include "services/crs.h"
 #include "services/mutex.h"
 #include "tin/bbox.h"
+#include "tin/loadoptions.h"
 #include "tin/point.h"
 #include "tin/tin.h"
 #include "tin/tinexport.h"
@@ -66,6 +67,10 @@ class KELM_TIN_EXPORT TinReader {
     /// which are 715827882 triangles; what the store throws; std::bad_alloc. The reader stays
     /// usable
     Tin* Load(const BBox<double, point2_t<double>>* poWindow);
+    /// Loads as told by options. A note tells if the base lies so far from the surface that
+    /// neighbouring positions there are more than 0.001 map units apart.
+    /// @throw kelm::ParameterException if the base is not finite; else as the other Load
+    Tin* Load(const BBox<double, point2_t<double>>* poWindow, const LoadOptions& oOptions);
 
     /// Chooses the vertical datum in which later loads deliver heights. Heights of a local CRS are
     /// never transformed, whatever the datums; a warning says so.
@@ -142,6 +147,8 @@ class KELM_TIN_EXPORT TinReader {
     void ReadShape(int id, const BBox<double, point2_t<double>>* poWindow,
                    load::CornerList& rCorners) const;
     load::ElevationFactor GetElevationFactor() const;
+    Tin* CreateTin(std::vector<containers::KeyPoint<double>>& oPoints,
+                   std::vector<Triangle_Id>& oIds, const LoadOptions& oOptions);
     load::HeightColumn GetColumn(point3_t<float>* poPoints, unsigned int nCount) const;
 
     ZARLayer_t* mpLayer;

@@ -9,6 +9,9 @@
 #include "tin/load/weld.h"
 #include "tin/triangulate.h"
 
+#include <algorithm>
+#include <cmath>
+#include <limits>
 #include <memory>
 
 namespace kelm::tin {
@@ -30,6 +33,28 @@ class ScopedLock {
     const threading::Mutex& mrMutex;
 };
 
+/// Tells the store the window of a walk, if the store asks for it.
+class ToldWindow {
+  public:
+    ToldWindow(ZARLayer_t* layer, const Window* window) {
+        if (window == nullptr || ZARSetWindow == nullptr)
+            return;
+        const ZARVertex low{window->min.x, window->min.y, 0.0};
+        const ZARVertex high{window->max.x, window->max.y, 0.0};
+        ZARSetWindow(layer, &low, &high);
+        mpLayer = layer;
+    }
+    ToldWindow(const ToldWindow&) = delete;
+    ToldWindow& operator=(const ToldWindow&) = delete;
+    ~ToldWindow() {
+        if (mpLayer != nullptr)
+            ZARSetWindow(mpLayer, nullptr, nullptr);
+    }
+
+  private:
+    ZARLayer_t* mpLayer = nullptr; ///< null if nothing was told
+};
+
 /// The shape, or null if the store cannot deliver it. A store that throws has told why.
 const ZARShape* FindShape(ZARLayer_t* layer, int id) {
     const ZARShape* shape = nullptr;
@@ -44,16 +69,46 @@ const ZARShape* FindShape(ZARLayer_t* layer, int id) {
     return shape;
 }
 
+/// Positions of such a surface would not be numbers.
+void TestBase(const LoadOptions& options) {
+    if (options.base && !(std::isfinite(options.base->x) && std::isfinite(options.base->y)))
+        throw ParameterException("base", ParameterException::PT_Invalid,
+                                 FormatString("%g, %g", options.base->x, options.base->y),
+                                 "finite numbers", "The XY base of a load must be finite",
+                                 "tin/tinreader", __PRETTY_FUNCTION__, __LINE__);
+}
+
+/// Notes if a base costs more than a thousandth of a map unit. @param box of the surface,
+/// surface-local
+void ReportFarBase(const point2_t<double>& base, const aabb_t<point2_t<float>>& box) {
+    constexpr double MOST_SPACING = 0.001;
+    const float far = std::max(
+        {std::fabs(box.min.x), std::fabs(box.min.y), std::fabs(box.max.x), std::fabs(box.max.y)});
+    const double spacing =
+        static_cast<double>(std::nextafter(far, std::numeric_limits<float>::infinity()) - far);
+    if (!(spacing <= MOST_SPACING)) // beyond the range of float it is no number
+        tellus::Report::AddInfo(FormatString(
+            "The surface reaches %.0f map units from its base %.3f, %.3f: neighbouring positions "
+            "there are %.2g map units apart",
+            static_cast<double>(far), base.x, base.y, spacing));
+}
+
 } // namespace
 
 Tin* TinReader::Load(const Window* poWindow) {
+    return Load(poWindow, {});
+}
+
+Tin* TinReader::Load(const Window* poWindow, const LoadOptions& oOptions) {
+    TestBase(oOptions);
     if (mnShapeCount < 1 || (poWindow != nullptr && !TestOverlap(*poWindow, moBBox)))
         return nullptr;
     const ScopedLock lock(moMutex);
+    const ToldWindow told(mpLayer, poWindow);
     load::CornerList corners(mnShapeCount);
     for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id))
         ReadShape(id, poWindow, corners);
-    return CreateTin(corners.GetPoints(), corners.GetIds());
+    return CreateTin(corners.GetPoints(), corners.GetIds(), oOptions);
 }
 
 std::string TinReader::GetCRSText() const {
@@ -87,6 +142,11 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
 }
 
 Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds) {
+    return CreateTin(oPoints, oIds, {});
+}
+
+Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds,
+                          const LoadOptions& oOptions) {
     if (oPoints.empty() || oIds.empty())
         return nullptr;
     std::vector<unsigned> oKeys(oPoints.size());
@@ -96,10 +156,12 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
     } catch (...) {
         throw Exception("Octree2 error", "tin/tinreader", __PRETTY_FUNCTION__, __LINE__);
     }
-    load::Assembly parts = load::Assemble(oPoints, oIds, oKeys, nVertices);
+    load::Assembly parts = load::Assemble(oPoints, oIds, oKeys, nVertices, oOptions.base);
     mdfXBase = parts.base.x;
     mdfYBase = parts.base.y;
     const aabb_t<point2_t<float>> oBox = load::ComputeBox(parts);
+    if (oOptions.base)
+        ReportFarBase(parts.base, oBox);
     (this->*mpfnHeightConvert)(&oBox, parts.vertices.get(), nVertices);
     auto surface =
         std::make_unique<Tin>(parts.vertices.get(), parts.vertexCount, parts.triangles.get(),

@@ -117,6 +117,37 @@ void FillGrid(const kelm::tin::Tin& surface, double low, double high, InterpGrid
         rGrid.GetArray()[i / 3] = Round(scripted::Convert(p[i], p[i + 1], p[i + 2], 1));
 }
 
+TEST_F(ReaderTest, WindowsOfOneBaseHaveTheSameBitsAndAFarBaseIsNoted) {
+    script.shapes = CreateStrip(1200, 50);
+    const Reader reader = Open(0.5, 3.0);
+    for (const double away : {0.0, 11e3, 15e3, 16e3, -12e4, 1e7}) {
+        const kelm::tin::LoadOptions options{{{STRIP_X + 0.1 - away, STRIP_Y}}};
+        const Window windows[] = {{501e3, 46e5, 5025e2, 47e5}, {502e3, 46e5, 504e3, 47e5}};
+        const Surface whole(reader->Load(nullptr, options));
+        EXPECT_EQ(whole->GetVertex(0)->x, float(away - 0.1));
+        for (const Window& window : windows) {
+            const Surface part(reader->Load(&window, options));
+            double x, y;
+            part->GetXYBase(x, y);
+            EXPECT_TRUE(x == options.base->x && y == options.base->y);
+            const point3_t<float>*const begin = whole->GetVertex(0), *const end =
+                                                                         begin +
+                                                                         whole->GetVertexCount();
+            const auto same = [&](const point3_t<float>& v) {
+                return v.x == part->GetVertex(0)->x;
+            };
+            const auto* const first = std::find_if(begin, end, same);
+            for (unsigned i = 0; i < part->GetVertexCount(); ++i)
+                ASSERT_TRUE(first[i].x == part->GetVertex(i)->x &&
+                            first[i].y == part->GetVertex(i)->y &&
+                            first[i].z == part->GetVertex(i)->z);
+        }
+    }
+    for (const kelm::tin::LoadOptions& bad :
+         {kelm::tin::LoadOptions{{{NaN, 0}}}, {{{0, -HUGE_VAL}}}})
+        EXPECT_TRUE(transcript.Refuses([&] { reader->Load(nullptr, bad); }));
+}
+
 TEST_F(ReaderTest, NeighboursShareVerticesWhoseHeightsAreElevatedThenConvertedThenNarrowed) {
     for (const unsigned n : {999U, 1000U, 1003U, 10001U})
         for (const unsigned heights : {1U, 5U, 997U}) { // for one the factor alone

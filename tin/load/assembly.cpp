@@ -74,9 +74,9 @@ Triangles CreateTriangles(const std::vector<Triangle_Id>& ids, const std::vector
 } // namespace
 
 Assembly Assemble(Points& points, std::vector<Triangle_Id>& ids, std::vector<unsigned>& keys,
-                  unsigned kept) {
+                  unsigned kept, const std::optional<point2_t<double>>& given) {
     std::vector<unsigned> keptCorners = FindKept(keys, kept);
-    const point2_t<double> base = FindBase(points, keptCorners);
+    const point2_t<double> base = given ? *given : FindBase(points, keptCorners);
     Vertices vertices = CreateVertices(points, keptCorners, base);
     ReleaseMemory(keptCorners);
     ReleaseMemory(points);

@@ -6,6 +6,7 @@
 #include "tin/triangleid.h"
 
 #include <memory>
+#include <optional>
 #include <vector>
 
 namespace kelm::tin::load {
@@ -19,13 +20,15 @@ struct Assembly {
     point2_t<double> base; ///< map coordinates of the local origin
 };
 
-/// Makes the arrays of welded corners. Vertices come in the order of their corners. The base is the
-/// first kept corner that has a finite position, else the origin.
+/// Makes the arrays of welded corners. Vertices come in the order of their corners.
 /// @param points,ids,keys as Weld leaves them; each list is emptied as soon as it falls out of use,
 /// so that the large ones do not coexist @param kept the number of kept corners
+/// @param given the base; if there is none, the base is the first kept corner that has a finite
+/// position, else the origin
 /// @throw std::bad_alloc
 Assembly Assemble(std::vector<containers::KeyPoint<double>>& points, std::vector<Triangle_Id>& ids,
-                  std::vector<unsigned>& keys, unsigned kept);
+                  std::vector<unsigned>& keys, unsigned kept,
+                  const std::optional<point2_t<double>>& given);
 
 /// @return box of the triangles in plan
 aabb_t<point2_t<float>> ComputeBox(const Assembly& parts);

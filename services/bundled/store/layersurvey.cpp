@@ -8,6 +8,7 @@
 #include <algorithm>
 #include <cmath>
 #include <limits>
+#include <utility>
 
 namespace kelm::store {
 
@@ -38,12 +39,13 @@ class Survey {
   private:
     void Walk();
     void AddShape();
+    void AddFeature();
     void TestCount() const;
     void TakeWarnings();
     void FinishWarnings();
     void AddRing(bool flat);
     double ComputeArea() const;
-    LayerSurvey GetResult() const;
+    LayerSurvey GetResult();
     void WarnOfHeights() const;
     void WarnOfColumns() const;
     void ReportIds() const;
@@ -55,6 +57,7 @@ class Survey {
     RefusalLog moRefusals;
     LayerType moType;
     ShapeIds moIds;
+    FeatureBlocks moBlocks;
     Extents moExtents;
     std::vector<ZARVertex> moVertices;
     std::int64_t mnDeliverable = 0;
@@ -98,7 +101,7 @@ void Survey::AddShape() {
     TakeWarnings();
     TestCount();
     if (moWalk.GetFacetNumber() == 0)
-        moIds.AddFeature(moWalk.GetFeature(), moWalk.GetFacetCount());
+        AddFeature();
     const Facet& facet = moWalk.GetFacet();
     const FacetFault fault = ReadFacet(facet, moVertices);
     if (fault == FacetFault::None)
@@ -107,6 +110,11 @@ void Survey::AddShape() {
     moRefusals.Add(moWalk.GetFeature(), reason,
                    reason == FacetFault::None ? ComputeArea() : facet.mdfRefusedArea);
     moType.Add(fault);
+}
+
+void Survey::AddFeature() {
+    moIds.AddFeature(moWalk.GetFeature(), moWalk.GetFacetCount());
+    moBlocks.AddFeature(moWalk.GetFeature(), moWalk.GetShapes() - 1, moWalk.GetPolygonsInFront());
 }
 
 void Survey::TestCount() const {
@@ -119,6 +127,7 @@ void Survey::TestCount() const {
 void Survey::AddRing(bool flat) {
     for (const ZARVertex& vertex : moVertices)
         moExtents.Add(vertex);
+    moBlocks.AddRing(moVertices);
     ++mnDeliverable;
     mnFlat += flat;
 }
@@ -133,11 +142,12 @@ double Survey::ComputeArea() const {
     return std::fabs(sum) / 2;
 }
 
-LayerSurvey Survey::GetResult() const {
+LayerSurvey Survey::GetResult() {
     LayerSurvey result;
     result.mnShapes = static_cast<int>(moWalk.GetShapes());
     result.mnType = moType.Get(GetLayer());
     result.moIds = moIds;
+    result.moBlocks = std::move(moBlocks);
     if (mnDeliverable > 0) {
         result.moLow = moExtents.moLow;
         result.moHigh = moExtents.moHigh;

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "services/bundled/store/facets/layerwalk.h"
+#include "services/bundled/store/runs/featureblocks.h"
 #include "services/bundled/store/shapeids.h"
 #include "services/vectorlayer.h"
 
@@ -11,6 +12,7 @@ struct LayerSurvey {
     int mnShapes = 0; ///< facets, those included that cannot be delivered
     int mnType = 2;   ///< 2 if the layer holds any facets, else 3 for lines, 1 for points
     ShapeIds moIds;
+    FeatureBlocks moBlocks; ///< to be used only if feature ids rise
     /// Corners of the extents of the deliverable shapes, heights as stored; zero if there is none.
     ZARVertex moLow{};
     ZARVertex moHigh{};

@@ -3,6 +3,8 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 
+#include <utility>
+
 namespace kelm::store {
 
 namespace {
@@ -12,14 +14,45 @@ constexpr const char* SOURCE = "services/bundled/store/storelayer";
 } // namespace
 
 StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, OGRLayer& layer)
-    : moFile(file), moWalk(dataset, layer), moSurvey(SurveyLayer(moWalk)) {
+    : moFile(file), moDataset(dataset), moWalk(dataset, layer), moStamp(dataset.GetStamp()),
+      moSurvey(SurveyLayer(moWalk)) {
     shapeCount = moSurvey.mnShapes;
     shapeCountValid = 1;
 }
 
+void StoreLayer::SetWindow(const ZARVertex* low, const ZARVertex* high) {
+    moRuns.reset();
+    mnId = -1;
+    if (low == nullptr || high == nullptr || !moWalk.GetReader().HasRuns() ||
+        !moSurvey.moBlocks.AreRising() || moDataset.GetStamp() != moStamp)
+        return;
+    std::vector<FeatureRun> runs = moSurvey.moBlocks.Find(*low, *high);
+    std::int64_t features = 0;
+    for (const FeatureRun& run : runs)
+        features += run.mnFeatures;
+    if (features <= moSurvey.moBlocks.GetFeatureCount() / 2)
+        moRuns = std::move(runs);
+}
+
 int StoreLayer::GetFirst() {
-    moWalk.Restart();
+    Restart();
     return Step();
+}
+
+void StoreLayer::Restart() {
+    mnRun = 0;
+    moWalk.Restart();
+}
+
+bool StoreLayer::Advance() {
+    if (!moRuns)
+        return moWalk.Advance();
+    while (mnRun == 0 || !moWalk.Advance()) {
+        if (mnRun == moRuns->size())
+            return false;
+        moWalk.Restart((*moRuns)[mnRun++]);
+    }
+    return true;
 }
 
 int StoreLayer::GetBehind(int id) {
@@ -41,7 +74,7 @@ ZARShape& StoreLayer::GetShape(int id) {
 
 int StoreLayer::Step() {
     mnId = -1;
-    const bool more = moWalk.Advance();
+    const bool more = Advance();
     const int id = more ? moSurvey.moIds.GetId(moWalk.GetFeature(), moWalk.GetFacetNumber(),
                                                moWalk.GetShapes())
                         : -1;
@@ -52,7 +85,7 @@ int StoreLayer::Step() {
 
 /// Some formats end early without an error; that would pass for a smaller surface.
 void StoreLayer::TestUnchanged(bool more, int id) const {
-    if (more ? id < 0 : moWalk.GetShapes() != moSurvey.mnShapes)
+    if (more ? id < 0 : !moRuns && moWalk.GetShapes() != moSurvey.mnShapes)
         throw DataException(FormatString("The %s has changed since it was opened: there were %d "
                                          "shapes",
                                          GetSubject().c_str(), moSurvey.mnShapes),
@@ -62,9 +95,12 @@ void StoreLayer::TestUnchanged(bool more, int id) const {
 void StoreLayer::Seek(int id) {
     if (id >= 0 && id == mnId)
         return;
-    // Ids rise along the walk, so one behind the present is found by walking on.
-    if (mnId < 0 || id < mnId)
-        moWalk.Restart();
+    // A shape that is asked for out of turn may lie beside the window. Ids rise along the walk, so
+    // one behind the present is found by walking on.
+    if (moRuns || mnId < 0 || id < mnId) {
+        moRuns.reset();
+        Restart();
+    }
     while (id >= 0 && Step() >= 0 && mnId < id)
         continue;
     if (id < 0 || mnId != id)

@@ -4,6 +4,8 @@
 #include "services/bundled/store/layercrs.h"
 #include "services/bundled/store/layersurvey.h"
 
+#include <cstddef>
+#include <optional>
 #include <vector>
 
 namespace kelm::store {
@@ -20,6 +22,9 @@ class StoreLayer final : public OpenLayer {
     int GetFirst() override;
     int GetBehind(int id) override;
     ZARShape& GetShape(int id) override;
+    /// Walks then skip the blocks of features beside the window, unless the file has been written
+    /// to since it was surveyed.
+    void SetWindow(const ZARVertex* low, const ZARVertex* high) override;
     int GetType() const override { return moSurvey.mnType; }
     ZARVertex GetLow() const override { return moSurvey.moLow; }
     ZARVertex GetHigh() const override { return moSurvey.moHigh; }
@@ -30,15 +35,21 @@ class StoreLayer final : public OpenLayer {
     _iobuf& GetFile() const override { return moFile; }
 
   private:
+    void Restart();
+    bool Advance();
     int Step();
     void TestUnchanged(bool more, int id) const;
     void Seek(int id);
     const std::string& GetSubject() const { return moWalk.GetReader().GetSubject(); }
 
     _iobuf& moFile;
+    const Dataset& moDataset;
     LayerWalk moWalk;
+    FileStamp moStamp; ///< from before the survey
     LayerSurvey moSurvey;
-    int mnId = -1; ///< of the facet that the walk is at, or -1
+    std::optional<std::vector<FeatureRun>> moRuns; ///< those of the window; none: the whole layer
+    std::size_t mnRun = 0;                         ///< the next one
+    int mnId = -1;                                 ///< of the facet that the walk is at, or -1
     std::vector<ZARVertex> moVertices;
     ZARShape moShape{};
 };

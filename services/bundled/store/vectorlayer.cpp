@@ -105,6 +105,10 @@ int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high) {
     return 0;
 }
 
+void ZARSetWindow(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high) {
+    Get(layer).SetWindow(low, high);
+}
+
 int ZARGetNext(ZARLayer_t* layer, int id) {
     return id == -1 ? Get(layer).GetFirst() : Get(layer).GetBehind(id);
 }

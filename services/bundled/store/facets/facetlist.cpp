@@ -42,6 +42,7 @@ bool IsOpenWall(const std::vector<ZARVertex>& vertices) {
 
 void FacetList::Assign(const OGRGeometry* geometry) {
     Clear();
+    mnInFront = mnPolygon;
     if (!geometry)
         return AddFault(FacetFault::NoGeometry);
     Visit(*geometry);
@@ -59,9 +60,9 @@ void FacetList::Clear() {
     moMade.clear();
 }
 
-void FacetList::Restart() {
+void FacetList::Restart(std::size_t polygons) {
     Clear();
-    mnPolygon = 0;
+    mnPolygon = polygons;
 }
 
 void FacetList::Visit(const OGRGeometry& geometry) {

@@ -38,8 +38,11 @@ class FacetList {
     /// Replaces the list. @param geometry may be null; must outlive the list's contents
     void Assign(const OGRGeometry* geometry);
     void Clear();
-    /// Goes back to the position in front of the layer's first geometry.
-    void Restart();
+    /// Goes to the position behind so many polygons that are no triangles: 0 for the layer's first
+    /// geometry.
+    void Restart(std::size_t polygons);
+    /// @return the polygons of the layer in front of the geometry that are no triangles
+    std::size_t GetPolygonsInFront() const { return mnInFront; }
 
     std::size_t GetCount() const { return moFacets.size(); }
     const Facet& Get(std::size_t number) const { return moFacets[number]; }
@@ -59,6 +62,7 @@ class FacetList {
     FacetCutter moCutter;
     std::vector<bool> moWhole; ///< by number of the polygon: delivered as it is stored?
     std::size_t mnPolygon = 0; ///< those met since the start that are no triangles
+    std::size_t mnInFront = 0; ///< of them, those in front of the geometry
     /// Geometries still to be visited, the next one last: nesting costs no call depth.
     std::vector<const OGRGeometry*> moPending;
     std::vector<std::unique_ptr<OGRGeometry>> moLinearised;

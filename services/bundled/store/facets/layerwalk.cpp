@@ -4,9 +4,16 @@ namespace kelm::store {
 
 void LayerWalk::Restart() {
     moReader.Restart();
-    moFacets.Restart();
+    moFacets.Restart(0);
     mnFacet = 0;
     mnShapes = 0;
+}
+
+void LayerWalk::Restart(const FeatureRun& run) {
+    moReader.Restart(run);
+    moFacets.Restart(run.mnPolygons);
+    mnFacet = 0;
+    mnShapes = run.mnShapes;
 }
 
 bool LayerWalk::Advance() {

@@ -15,6 +15,9 @@ class LayerWalk {
 
     /// Goes back to the position in front of the first facet.
     void Restart();
+    /// Goes to the position in front of a run, behind which Advance gives false. A walk over the
+    /// whole layer must have gone before, and the reader must have runs.
+    void Restart(const FeatureRun& run);
     /// Moves to the next facet. @return false behind the last one
     /// @throw kelm::DataException if the layer cannot be read on; Restart must come next
     bool Advance();
@@ -25,10 +28,12 @@ class LayerWalk {
     std::size_t GetFacetNumber() const { return mnFacet; }
     /// @return the number of facets of its feature
     std::size_t GetFacetCount() const { return moFacets.GetCount(); }
+    /// @return the polygons in front of its feature that are no triangles
+    std::size_t GetPolygonsInFront() const { return moFacets.GetPolygonsInFront(); }
     /// @return the id of its feature
     std::int64_t GetFeature() const { return mnFeature; }
 
-    /// @return the number of facets met since the start, the present one included
+    /// @return the number of the facet in the layer, from 1
     std::int64_t GetShapes() const { return mnShapes; }
     FeatureReader& GetReader() { return moReader; }
     const FeatureReader& GetReader() const { return moReader; }

@@ -1,5 +1,8 @@
 #include "services/bundled/store/files/dataset.h"
 
+#include "services/bundled/store/gdal/gdalcall.h"
+
+#include <cpl_string.h>
 #include <ogrsf_frmts.h>
 
 #include <utility>
@@ -24,5 +27,14 @@ std::vector<OGRLayer*> FindLayers(GDALDataset& handle) {
 Dataset::Dataset(std::string name, const Format& format, GDALDatasetUniquePtr handle)
     : moName(std::move(name)), moFormat(format), mpoHandle(std::move(handle)),
       moLayers(FindLayers(*mpoHandle)) {}
+
+FileStamp Dataset::GetStamp() const {
+    const GdalCall call;
+    const CPLStringList files(mpoHandle->GetFileList(), TRUE);
+    std::vector<std::string> paths;
+    for (int i = 0; i < files.size(); ++i)
+        paths.emplace_back(files[i]);
+    return FileStamp(paths);
+}
 
 } // namespace kelm::store

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "services/bundled/store/files/formats.h"
+#include "services/bundled/store/runs/filestamp.h"
 
 #include <gdal_priv.h>
 
@@ -27,6 +28,8 @@ class Dataset {
     const Format& GetFormat() const { return moFormat; }
     /// @return the layers that have a geometry, in GDAL's order; owned by the dataset
     const std::vector<OGRLayer*>& GetLayers() const { return moLayers; }
+    /// @return the stamp of the files as they are now
+    FileStamp GetStamp() const;
 
     /// @return true if no other reader has had a turn since this one took its own
     bool IsTurnOf(const FeatureReader& reader) const { return mpoTurn == &reader; }

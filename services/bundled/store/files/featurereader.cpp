@@ -60,6 +60,8 @@ bool FeatureReader::ReadCrs() {
 void FeatureReader::Prepare(bool sound) {
     GdalCall call;
     IgnoreAttributes(moLayer);
+    if (moDataset.GetFormat().mpfnRuns != nullptr)
+        mpoRuns = moDataset.GetFormat().mpfnRuns(moLayer);
     if (!sound || moDataset.GetFormat().Has(FT_ExactCount))
         mnKnown = moLayer.GetFeatureCount(sound ? FALSE : TRUE);
     TestFailure(call.TakeFailures());
@@ -71,8 +73,14 @@ void FeatureReader::AddWarnings(GdalCall& call) {
         AddWarning(moWarnings, text, times);
 }
 
+void FeatureReader::Restart(const FeatureRun& run) {
+    Restart();
+    moRun = run;
+}
+
 void FeatureReader::Restart() {
     moDataset.EndTurn();
+    moRun.reset();
     moFeatures.clear();
     mnNext = 0;
     mnRead = 0;
@@ -113,11 +121,23 @@ void FeatureReader::TestFailure(const std::string& failures) const {
 
 void FeatureReader::TakeTurn(GdalCall& call) {
     moDataset.TakeTurn(*this);
-    moLayer.ResetReading();
+    StartReading();
     const std::int64_t known = std::exchange(mnRead, 0);
     mnSkipped = 0;
     while (mnRead < known && Fetch(call) != nullptr)
         moFeatures.clear();
+}
+
+void FeatureReader::StartReading() {
+    if (moRun)
+        return mpoRuns->Start(*moRun);
+    if (mpoRuns)
+        mpoRuns->Stop();
+    moLayer.ResetReading();
+}
+
+OGRFeatureUniquePtr FeatureReader::ReadFeature() {
+    return moRun ? mpoRuns->Next() : OGRFeatureUniquePtr(moLayer.GetNextFeature());
 }
 
 void FeatureReader::FetchBatch(GdalCall& call) {
@@ -131,12 +151,12 @@ void FeatureReader::FetchBatch(GdalCall& call) {
 
 /// @return the next feature, which is kept, or null behind the last one or if the reading fails
 const OGRFeature* FeatureReader::Fetch(GdalCall& call) {
-    OGRFeatureUniquePtr feature(moLayer.GetNextFeature());
+    OGRFeatureUniquePtr feature = ReadFeature();
     std::string failures = call.TakeFailures();
     while (!feature && !failures.empty() && SkipsDamaged()) {
         ++mnSkipped;
         AddWarning(moWarnings, "a feature cannot be read: " + failures, 1);
-        feature.reset(moLayer.GetNextFeature());
+        feature = ReadFeature();
         failures = call.TakeFailures();
     }
     mnRead += feature != nullptr;
@@ -165,9 +185,21 @@ void FeatureReader::MarkDamage(OGRFeature& feature, const std::string& failures)
 
 void FeatureReader::TestEnd(const std::string& failures) {
     moFailure = failures;
+    if (moRun)
+        return TestRunEnd();
     if (mnKnown >= 0 && mnRead + mnSkipped != mnKnown)
         moFailure += FormatString("%sthe file ends early, it should have %lld features",
                                   failures.empty() ? "" : "; ", static_cast<long long>(mnKnown));
+}
+
+void FeatureReader::TestRunEnd() {
+    if (mnRead != moRun->mnFeatures)
+        moFailure += FormatString("%sthe file has changed since it was opened: there are %lld "
+                                  "features from %lld to %lld, there were %lld",
+                                  moFailure.empty() ? "" : "; ", static_cast<long long>(mnRead),
+                                  static_cast<long long>(moRun->mnFirst),
+                                  static_cast<long long>(moRun->mnLast),
+                                  static_cast<long long>(moRun->mnFeatures));
 }
 
 } // namespace kelm::store

@@ -6,6 +6,8 @@
 #include <ogrsf_frmts.h>
 
 #include <cstdint>
+#include <memory>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -26,6 +28,10 @@ class FeatureReader {
 
     /// Goes back to the position in front of the first feature.
     void Restart();
+    /// @return true if the layer can be read by runs
+    bool HasRuns() const { return mpoRuns != nullptr; }
+    /// Goes to the position in front of a run, behind which Next gives null. Needs HasRuns.
+    void Restart(const FeatureRun& run);
     /// @return the next feature, good until the next call, or null behind the last one
     /// @throw kelm::DataException if the layer cannot be read on; Restart must come next
     const OGRFeature* Next();
@@ -43,20 +49,25 @@ class FeatureReader {
     void AddWarnings(GdalCall& call);
     void ReadAhead();
     void TakeTurn(GdalCall& call);
+    void StartReading();
+    OGRFeatureUniquePtr ReadFeature();
     void FetchBatch(GdalCall& call);
     const OGRFeature* Fetch(GdalCall& call);
     void MarkDamage(OGRFeature& feature, const std::string& failures);
     bool SkipsDamaged() const;
     void TestEnd(const std::string& failures);
+    void TestRunEnd();
     void TestFailure(const std::string& failures) const;
 
     Dataset& moDataset;
     OGRLayer& moLayer;
+    std::unique_ptr<RunReader> mpoRuns;
+    std::optional<FeatureRun> moRun; ///< what is being read; none: the whole layer
     std::string moSubject;
     std::vector<OGRFeatureUniquePtr> moFeatures; ///< read ahead; a null is the end of the layer
     std::size_t mnNext = 0;
-    std::int64_t mnKnown = -1;  ///< number of features if it is known exactly, else -1
-    std::int64_t mnRead = 0;    ///< features that came from GDAL since the start
+    std::int64_t mnKnown = -1; ///< number of features if it is known exactly, else -1
+    std::int64_t mnRead = 0;   ///< features that came from GDAL since the start of the run or layer
     std::int64_t mnSkipped = 0; ///< damaged ones that GDAL did not give
     std::string moFailure;      ///< why the layer cannot be read on; empty if it can
     Warnings moWarnings;

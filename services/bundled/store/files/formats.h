@@ -1,5 +1,7 @@
 #pragma once
 
+#include "services/bundled/store/runs/runreader.h"
+
 #include <string>
 #include <vector>
 
@@ -29,6 +31,8 @@ struct Format {
     std::vector<const char*> moOptions;
     unsigned mnTraits = FT_None; ///< FormatTrait values, joined
     const char* mpszRings = "";  ///< see Confinement
+    /// Makes the reader of runs; null if every read must begin with the first feature.
+    std::unique_ptr<RunReader> (*mpfnRuns)(OGRLayer& layer) = nullptr;
 
     bool Has(FormatTrait trait) const { return (mnTraits & trait) != 0; }
 };

@@ -24,6 +24,10 @@ class OpenLayer : public ZARLayer_t {
     /// no such shape or it cannot be delivered
     virtual ZARShape& GetShape(int id) = 0;
 
+    /// Tells the window of the shapes that will be asked for. A layer that cannot make use of it
+    /// walks over all shapes. @param low,high both null: all shapes
+    virtual void SetWindow(const ZARVertex* /*low*/, const ZARVertex* /*high*/) {}
+
     /// @return 2 if the layer holds any facets, else 3 for lines, 1 for points
     virtual int GetType() const = 0;
     /// @return a corner of the extents of the deliverable shapes, heights as stored; zero if there
