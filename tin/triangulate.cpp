@@ -1,5 +1,7 @@
 #include "tin/triangulate.h"
 
+#include "tin/rings/earcutter.h"
+
 #include <algorithm>
 #include <cstddef>
 
@@ -132,6 +134,14 @@ class Ring {
 int Triangulate(const kelm::tin::Polygon<double>& oPolygon, std::vector<Triangle_Id>& oTriangles) {
     if (!oPolygon.IsSimple() || oPolygon.GetPointCount() < 3)
         return -1;
+    if (oPolygon.GetPointCount() > 256) {
+        kelm::tin::rings::EarCutter c(oPolygon.GetPoints(), oPolygon.GetPointCount(),
+                                      oPolygon.GetSignedArea() > 0.0);
+        const bool done = c.Cut(oTriangles);
+        if (!done)
+            oTriangles.clear();
+        return done ? 0 : -1;
+    }
     Ring ring(oPolygon);
     std::size_t budget = 2 * ring.GetSize();
     std::size_t v = ring.GetSize() - 1;

@@ -3,11 +3,10 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 #include "tin/ray2.h"
+#include "tin/rings/simplering.h"
 #include "tin/rules/extent.h"
 
 #include <algorithm>
-#include <cmath>
-#include <limits>
 
 namespace kelm::tin {
 
@@ -37,33 +36,6 @@ void VisitKept(const V* points, unsigned count, const Keep& keep) {
             keep(i);
         predecessor = point;
     }
-}
-
-/// Does the segment A-B meet one of the segments between consecutive points of a chain? Ends count;
-/// parallel segments never meet. Without a branch in the loop, so that pairs are tested side by
-/// side.
-template <typename T>
-bool TestMeetsChain(const point2_t<T>& a, const point2_t<T>& b, const point2_t<T>* chain,
-                    unsigned segments) {
-    const T rx = b.x - a.x;
-    const T ry = b.y - a.y;
-    T meets = T(0); // counted in T, for want of integer lanes of its width
-#pragma omp simd reduction(+ : meets)
-    for (unsigned j = 0; j < segments; ++j) {
-        const T qx = chain[j + 1].x - chain[j].x;
-        const T qy = chain[j + 1].y - chain[j].y;
-        const T wx = a.x - chain[j].x;
-        const T wy = a.y - chain[j].y;
-        const T d = rx * qy - qx * ry;
-        const T sign = std::copysign(T(1), d);
-        const T size = std::fabs(d);
-        const T s = (wy * qx - wx * qy) * sign;
-        const T t = (wy * rx - wx * ry) * sign;
-        const bool meet = !(std::numeric_limits<T>::epsilon() > size) & (T(0) <= s) & (s <= size) &
-                          (T(0) <= t) & (t <= size);
-        meets += meet ? T(1) : T(0);
-    }
-    return meets != T(0);
 }
 
 } // namespace
@@ -130,19 +102,7 @@ T Polygon<T>::GetSignedArea() const {
 
 template <typename T>
 bool Polygon<T>::IsSimple() const {
-    if (mnPoints < 4)
-        return true;
-    const unsigned last = mnPoints - 1;
-    const point2_t<T> closing[2] = {mpoPoints[last], mpoPoints[0]};
-    for (unsigned i = 0; i + 2 < mnPoints; ++i) {
-        const point2_t<T>& a = mpoPoints[i];
-        const point2_t<T>& b = mpoPoints[i + 1];
-        // The closing edge is a neighbour of the first one.
-        if (TestMeetsChain(a, b, mpoPoints + i + 2, last - i - 2) ||
-            (i > 0 && TestMeetsChain(a, b, closing, 1)))
-            return false;
-    }
-    return true;
+    return rings::TestSimple(mpoPoints, mnPoints);
 }
 
 template <typename T>

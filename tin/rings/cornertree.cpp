@@ -1,0 +1,82 @@
+#include "tin/rings/cornertree.h"
+
+#include "tin/rules/extent.h"
+
+#include <algorithm>
+
+namespace kelm::tin::rings {
+
+namespace {
+
+constexpr unsigned LEAF_CORNERS = 8;
+
+} // namespace
+
+void CornerTree::Build(std::vector<Item> oItems) {
+    moItems = std::move(oItems);
+    const auto count = static_cast<unsigned>(moItems.size());
+    mnFirstLeaf = 1;
+    while (mnFirstLeaf * LEAF_CORNERS < count)
+        mnFirstLeaf *= 2;
+    moNodes.resize(2 * std::size_t{mnFirstLeaf});
+    Fill(1, 0, count);
+}
+
+void CornerTree::Fill(unsigned node, unsigned first, unsigned last) {
+    rules::Extent<double> extent;
+    for (unsigned i = first; i < last; ++i)
+        extent.Add(moItems[i].at);
+    moNodes[node] = {extent.GetMin(), extent.GetMax(), first, last - first};
+    if (node >= mnFirstLeaf) {
+        for (unsigned i = first; i < last; ++i)
+            moLeaves[moItems[i].corner] = node;
+        return;
+    }
+    const unsigned middle = first + (last - first) / 2;
+    Halve(moNodes[node], middle, last);
+    Fill(2 * node, first, middle);
+    Fill(2 * node + 1, middle, last);
+}
+
+/// Puts the lower items first, on the longer axis of the node.
+void CornerTree::Halve(const Node& node, unsigned middle, unsigned last) {
+    const auto at = [&](unsigned i) { return moItems.begin() + static_cast<std::ptrdiff_t>(i); };
+    if (node.high.x - node.low.x > node.high.y - node.low.y)
+        std::nth_element(at(node.first), at(middle), at(last),
+                         [](const Item& a, const Item& b) { return a.at.x < b.at.x; });
+    else
+        std::nth_element(at(node.first), at(middle), at(last),
+                         [](const Item& a, const Item& b) { return a.at.y < b.at.y; });
+}
+
+void CornerTree::Remove(unsigned corner) {
+    const Node& leaf = moNodes[moLeaves[corner]];
+    unsigned at = leaf.first;
+    while (moItems[at].corner != corner)
+        ++at;
+    std::swap(moItems[at], moItems[leaf.first + leaf.count - 1]);
+    for (unsigned node = moLeaves[corner]; node > 0; node /= 2)
+        --moNodes[node].count;
+}
+
+unsigned CornerTree::FindBelow(unsigned node, const EarTriangle& triangle, const Three& own) const {
+    const Node& at = moNodes[node];
+    if (at.count == 0 || triangle.TestOutside(at.low, at.high))
+        return NONE;
+    if (node >= mnFirstLeaf)
+        return FindInLeaf(at, triangle, own);
+    const unsigned corner = FindBelow(2 * node, triangle, own);
+    return corner != NONE ? corner : FindBelow(2 * node + 1, triangle, own);
+}
+
+unsigned CornerTree::FindInLeaf(const Node& node, const EarTriangle& triangle,
+                                const Three& own) const {
+    for (unsigned i = node.first; i < node.first + node.count; ++i) {
+        const auto& [at, corner] = moItems[i];
+        if (triangle.TestInside(at) && corner != own[0] && corner != own[1] && corner != own[2])
+            return corner;
+    }
+    return NONE;
+}
+
+} // namespace kelm::tin::rings

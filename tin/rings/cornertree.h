@@ -1,0 +1,54 @@
+#pragma once
+
+#include "tin/rings/ear.h"
+
+#include <array>
+#include <vector>
+
+namespace kelm::tin::rings {
+
+/// Tree of boxes over the corners of a ring that are left to cut off.
+class CornerTree {
+  public:
+    static constexpr unsigned NONE = 0xFFFFFFFFU;
+
+    struct Item {
+        Point at; ///< without NaN, and so near the origin that no product overflows
+        unsigned corner;
+    };
+    using Three = std::array<unsigned, 3>;
+
+    /// @param corners bound of the corners' numbers @throw std::bad_alloc
+    explicit CornerTree(unsigned corners) : moLeaves(corners) {}
+
+    /// Holds these corners and no others. @throw std::bad_alloc
+    void Build(std::vector<Item> oItems);
+
+    /// Drops a corner that it holds.
+    void Remove(unsigned corner);
+
+    /// @return a corner inside a triangle other than the triangle's own; NONE without one
+    unsigned FindInside(const EarTriangle& triangle, const Three& own) const {
+        return FindBelow(1, triangle, own);
+    }
+
+  private:
+    struct Node {
+        Point low;
+        Point high;
+        unsigned first; ///< items from here
+        unsigned count; ///< that are left, below the node
+    };
+
+    void Fill(unsigned node, unsigned first, unsigned last);
+    void Halve(const Node& node, unsigned middle, unsigned last);
+    unsigned FindBelow(unsigned node, const EarTriangle& triangle, const Three& own) const;
+    unsigned FindInLeaf(const Node& node, const EarTriangle& triangle, const Three& own) const;
+
+    std::vector<Item> moItems;     ///< of a leaf side by side, those that are left first
+    std::vector<Node> moNodes;     ///< the children of k are 2 k and 2 k + 1, the root is 1
+    std::vector<unsigned> moLeaves; ///< by corner
+    unsigned mnFirstLeaf = 1;
+};
+
+} // namespace kelm::tin::rings

@@ -1,0 +1,161 @@
+#include "tin/rings/edgetree.h"
+
+#include "tin/rules/extent.h"
+
+#include <algorithm>
+
+namespace kelm::tin::rings {
+
+namespace {
+
+constexpr unsigned MOST_LEAF_EDGES = 8;
+
+/// Least gap between boxes that are apart, in parts of their size together.
+constexpr double LEAST_GAP = 0x1p-5;
+
+double Dot(const Point& a, const Point& b) {
+    return a.x * b.x + a.y * b.y;
+}
+
+double Cross(const Point& a, const Point& b) {
+    return a.x * b.y - a.y * b.x;
+}
+
+Point Subtract(const Point& a, const Point& b) {
+    return {a.x - b.x, a.y - b.y};
+}
+
+Point GetDirection(const Edge& edge) {
+    return Subtract(edge.to, edge.from);
+}
+
+} // namespace
+
+EdgeTree::EdgeTree(const Point* points, unsigned edges) : moOrigin(points[0]) {
+    rules::Extent<double> extent;
+    moEdges.reserve(edges);
+    for (unsigned i = 0; i < edges; ++i) {
+        moEdges.push_back({points[i], points[i + 1], i});
+        extent.Add(points[i]);
+        extent.Add(points[i + 1]);
+    }
+    const Point size = Subtract(extent.GetMax(), extent.GetMin());
+    mdfSlack = 0x1p-44 * std::max(size.x, size.y);
+    moNodes.reserve(edges / 2 + 2);
+    Build(0, edges);
+}
+
+unsigned EdgeTree::Build(unsigned first, unsigned last) {
+    const auto node = static_cast<unsigned>(moNodes.size());
+    moNodes.push_back(Fit(first, last));
+    if (last - first > MOST_LEAF_EDGES) {
+        const unsigned middle = first + (last - first) / 2;
+        Halve(first, middle, last);
+        Build(first, middle);
+        moNodes[node].right = Build(middle, last);
+    }
+    return node;
+}
+
+EdgeTree::Node EdgeTree::Fit(unsigned first, unsigned last) const {
+    Point axis{0.0, 0.0};
+    double square = 0.0;
+    for (unsigned i = first; i < last; ++i) {
+        const Point r = GetDirection(moEdges[i]);
+        if (const double length = Dot(r, r); length > square) {
+            square = length;
+            axis = r;
+        }
+    }
+    const double length = std::sqrt(square);
+    axis = {axis.x / length, axis.y / length};
+    rules::Range<double> along;
+    rules::Range<double> across;
+    for (unsigned i = first; i < last; ++i)
+        for (const Point& end : {moEdges[i].from, moEdges[i].to}) {
+            const Point p = Subtract(end, moOrigin);
+            along.Add(Dot(axis, p));
+            across.Add(Cross(axis, p));
+        }
+    const double u = along.low + (along.high - along.low) / 2;
+    const double v = across.low + (across.high - across.low) / 2;
+    return {{axis.x * u - axis.y * v, axis.y * u + axis.x * v},
+            axis,
+            (along.high - along.low) / 2 + mdfSlack,
+            (across.high - across.low) / 2 + mdfSlack,
+            first,
+            last};
+}
+
+/// Puts the edges with the lower midpoints first, on the axis on which they spread further.
+void EdgeTree::Halve(unsigned first, unsigned middle, unsigned last) {
+    rules::Extent<double> extent;
+    const auto getMiddle = [](const Edge& edge) {
+        return Point{edge.from.x + edge.to.x, edge.from.y + edge.to.y};
+    };
+    for (unsigned i = first; i < last; ++i)
+        extent.Add(getMiddle(moEdges[i]));
+    const Point size = Subtract(extent.GetMax(), extent.GetMin());
+    const auto at = [&](unsigned i) { return moEdges.begin() + static_cast<std::ptrdiff_t>(i); };
+    if (size.x > size.y)
+        std::nth_element(at(first), at(middle), at(last), [&](const Edge& a, const Edge& b) {
+            return getMiddle(a).x < getMiddle(b).x;
+        });
+    else
+        std::nth_element(at(first), at(middle), at(last), [&](const Edge& a, const Edge& b) {
+            return getMiddle(a).y < getMiddle(b).y;
+        });
+}
+
+bool EdgeTree::TestWithin(unsigned node) const {
+    const unsigned right = moNodes[node].right;
+    if (right == 0)
+        return TestEdges(moNodes[node], moNodes[node]);
+    return TestWithin(node + 1) || TestWithin(right) || TestBetween(node + 1, right);
+}
+
+bool EdgeTree::TestBetween(unsigned node, unsigned other) const {
+    const Node& a = moNodes[node];
+    const Node& b = moNodes[other];
+    if (TestApart(a, b))
+        return false;
+    if (a.right == 0 && b.right == 0)
+        return TestEdges(a, b);
+    // Nodes of one level have nearly as many edges.
+    if (b.right == 0 || (a.right != 0 && a.last - a.first >= b.last - b.first))
+        return TestBetween(node + 1, other) || TestBetween(a.right, other);
+    return TestBetween(node, other + 1) || TestBetween(node, b.right);
+}
+
+bool EdgeTree::TestEdges(const Node& node, const Node& other) const {
+    for (unsigned i = node.first; i < node.last; ++i) {
+        const Edge& a = moEdges[i];
+        const Point r = GetDirection(a);
+        unsigned meets = 0;
+        for (unsigned j = other.first; j < other.last; ++j) {
+            const Edge& b = moEdges[j];
+            const bool isNeighbour = a.number - b.number + 1U <= 2U;
+            meets += TestMeeting(a.from, r, b.from, b.to) & !isNeighbour ? 1U : 0U;
+        }
+        if (meets != 0)
+            return true;
+    }
+    return false;
+}
+
+/// Are the boxes apart on an axis of one of them (Gottschalk, Lin and Manocha 1996)?
+bool EdgeTree::TestApart(const Node& a, const Node& b) {
+    const Point d = Subtract(b.center, a.center);
+    const double c = std::fabs(Dot(a.axis, b.axis));
+    const double s = std::fabs(Cross(a.axis, b.axis));
+    const double gap = std::max(
+        std::max(std::fabs(Dot(a.axis, d)) - a.halfAlong - b.halfAlong * c - b.halfAcross * s,
+                 std::fabs(Cross(a.axis, d)) - a.halfAcross - b.halfAlong * s - b.halfAcross * c),
+        std::max(std::fabs(Dot(b.axis, d)) - b.halfAlong - a.halfAlong * c - a.halfAcross * s,
+                 std::fabs(Cross(b.axis, d)) - b.halfAcross - a.halfAlong * s - a.halfAcross * c));
+    const double size = std::fabs(d.x) + std::fabs(d.y) +
+                        2.0 * (a.halfAlong + a.halfAcross + b.halfAlong + b.halfAcross);
+    return gap >= LEAST_GAP * size;
+}
+
+} // namespace kelm::tin::rings
