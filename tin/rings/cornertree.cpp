@@ -12,6 +12,21 @@ constexpr unsigned LEAF_CORNERS = 8;
 
 } // namespace
 
+struct CornerTree::Query {
+    const EarTriangle& triangle;
+    rules::Extent<double> reach;
+    const Three& own;
+
+    bool TestOutside(const Point& low, const Point& high) const {
+        return low.x > reach.x.high || reach.x.low > high.x || low.y > reach.y.high ||
+               reach.y.low > high.y || triangle.TestOutside(low, high);
+    }
+    bool TestInside(const Item& item) const {
+        return triangle.TestInside(item.at.x, item.at.y) && item.corner != own[0] &&
+               item.corner != own[1] && item.corner != own[2];
+    }
+};
+
 void CornerTree::Build(std::vector<Item> oItems) {
     moItems = std::move(oItems);
     const auto count = static_cast<unsigned>(moItems.size());
@@ -59,23 +74,24 @@ void CornerTree::Remove(unsigned corner) {
         --moNodes[node].count;
 }
 
-unsigned CornerTree::FindBelow(unsigned node, const EarTriangle& triangle, const Three& own) const {
-    const Node& at = moNodes[node];
-    if (at.count == 0 || triangle.TestOutside(at.low, at.high))
-        return NONE;
-    if (node >= mnFirstLeaf)
-        return FindInLeaf(at, triangle, own);
-    const unsigned corner = FindBelow(2 * node, triangle, own);
-    return corner != NONE ? corner : FindBelow(2 * node + 1, triangle, own);
+unsigned CornerTree::FindInside(const EarTriangle& triangle, const Three& own) const {
+    return FindBelow(1, {triangle, triangle.GetReach(), own});
 }
 
-unsigned CornerTree::FindInLeaf(const Node& node, const EarTriangle& triangle,
-                                const Three& own) const {
-    for (unsigned i = node.first; i < node.first + node.count; ++i) {
-        const auto& [at, corner] = moItems[i];
-        if (triangle.TestInside(at) && corner != own[0] && corner != own[1] && corner != own[2])
-            return corner;
-    }
+unsigned CornerTree::FindBelow(unsigned node, const Query& query) const {
+    const Node& at = moNodes[node];
+    if (at.count == 0 || query.TestOutside(at.low, at.high))
+        return NONE;
+    if (node >= mnFirstLeaf)
+        return FindInLeaf(at, query);
+    const unsigned corner = FindBelow(2 * node, query);
+    return corner != NONE ? corner : FindBelow(2 * node + 1, query);
+}
+
+unsigned CornerTree::FindInLeaf(const Node& node, const Query& query) const {
+    for (unsigned i = node.first; i < node.first + node.count; ++i)
+        if (query.TestInside(moItems[i]))
+            return moItems[i].corner;
     return NONE;
 }
 

@@ -28,11 +28,10 @@ class CornerTree {
     void Remove(unsigned corner);
 
     /// @return a corner inside a triangle other than the triangle's own; NONE without one
-    unsigned FindInside(const EarTriangle& triangle, const Three& own) const {
-        return FindBelow(1, triangle, own);
-    }
+    unsigned FindInside(const EarTriangle& triangle, const Three& own) const;
 
   private:
+    struct Query;
     struct Node {
         Point low;
         Point high;
@@ -42,8 +41,8 @@ class CornerTree {
 
     void Fill(unsigned node, unsigned first, unsigned last);
     void Halve(const Node& node, unsigned middle, unsigned last);
-    unsigned FindBelow(unsigned node, const EarTriangle& triangle, const Three& own) const;
-    unsigned FindInLeaf(const Node& node, const EarTriangle& triangle, const Three& own) const;
+    unsigned FindBelow(unsigned node, const Query& query) const;
+    unsigned FindInLeaf(const Node& node, const Query& query) const;
 
     std::vector<Item> moItems;     ///< of a leaf side by side, those that are left first
     std::vector<Node> moNodes;     ///< the children of k are 2 k and 2 k + 1, the root is 1

@@ -1,6 +1,10 @@
 #pragma once
 
 #include "tin/point.h"
+#include "tin/rules/extent.h"
+
+#include <algorithm>
+#include <limits>
 
 namespace kelm::tin::rings {
 
@@ -9,30 +13,44 @@ using Point = point2_t<double>;
 /// Least turn of an ear, 2^-23: twice its area, in squared map units.
 constexpr double LEAST_TURN = 1.1920928955078125e-7;
 
-/// Triangle of three corners, with its edges at hand. A corner is inside unless it lies right of an
-/// edge: edges and corners are inside, without tolerance.
+/// The triangle that a corner Q of a counter-clockwise ring makes with its neighbours P and R.
 class EarTriangle {
   public:
     EarTriangle(const Point& p, const Point& q, const Point& r)
-        : moSides{{p, q.x - p.x, q.y - p.y}, {q, r.x - q.x, r.y - q.y}, {r, p.x - r.x, p.y - r.y}} {
+        : moPQ{p, q.x - p.x, q.y - p.y}, moQR{q, r.x - q.x, r.y - q.y},
+          moRP{r, p.x - r.x, p.y - r.y} {}
+
+    double GetTurn() const { return moPQ.dx * -moRP.dy - moPQ.dy * -moRP.dx; }
+
+    /// Does Q turn left as much as an ear must?
+    bool TestConvex() const { return !(LEAST_TURN > GetTurn()); }
+
+    /// Edges and corners are inside, without tolerance.
+    bool TestInside(double x, double y) const {
+        return !(moPQ.GetTurn(x, y) < 0.0) & !(moQR.GetTurn(x, y) < 0.0) &
+               !(moRP.GetTurn(x, y) < 0.0);
     }
 
-    /// Does Q turn left by at least that of an ear?
-    bool TestConvex() const {
-        const Side& pq = moSides[0];
-        const Side& rp = moSides[2];
-        return !(LEAST_TURN > pq.dx * (-rp.dy) - pq.dy * (-rp.dx));
-    }
-
-    bool TestInside(const Point& at) const {
-        return !(moSides[0].GetTurn(at.x, at.y) < 0.0) & !(moSides[1].GetTurn(at.x, at.y) < 0.0) &
-               !(moSides[2].GetTurn(at.x, at.y) < 0.0);
-    }
-
-    /// Is each place of a box outside? False may mean that none could tell it at once.
+    /// Is no place of a box inside, for that of one side all are outside? For coordinates whose
+    /// products do not overflow.
     bool TestOutside(const Point& low, const Point& high) const {
-        return moSides[0].TestRight(low, high) || moSides[1].TestRight(low, high) ||
-               moSides[2].TestRight(low, high);
+        return moPQ.TestOutside(low, high) || moQR.TestOutside(low, high) ||
+               moRP.TestOutside(low, high);
+    }
+
+    /// @return a box that holds all places inside. It is larger than the triangle, since far beyond
+    /// the tip of a needle rounding moves places inside; docs/guide/exactness.md has the proof.
+    rules::Extent<double> GetReach() const {
+        rules::Extent<double> box;
+        for (const Side* side : {&moPQ, &moQR, &moRP})
+            box.Add(side->from);
+        const double size = std::max(box.x.high - box.x.low, box.y.high - box.y.low);
+        const double part = 0x1p-48 * size * size / GetTurn();
+        const double reach =
+            part <= 0.5 ? 2.0 * part * size : std::numeric_limits<double>::infinity();
+        box.x.Add(box.x.low - reach, box.x.high + reach);
+        box.y.Add(box.y.low - reach, box.y.high + reach);
+        return box;
     }
 
   private:
@@ -41,17 +59,18 @@ class EarTriangle {
         double dx;
         double dy;
 
-        double GetTurn(double x, double y) const {
-            return dx * (y - from.y) - (x - from.x) * dy;
-        }
-        /// Rounding keeps order, so that a computed turn grows or falls with x as the exact one
-        /// does, and with y: no place of the box has a larger one than this corner.
-        bool TestRight(const Point& low, const Point& high) const {
+        double GetTurn(double x, double y) const { return dx * (y - from.y) - (x - from.x) * dy; }
+
+        /// Rounding keeps order. So the computed turn grows or falls with x alone and with y alone
+        /// as the exact one does, and no place of the box has a larger one than this corner.
+        bool TestOutside(const Point& low, const Point& high) const {
             return GetTurn(dy > 0.0 ? low.x : high.x, dx > 0.0 ? high.y : low.y) < 0.0;
         }
     };
 
-    Side moSides[3];
+    Side moPQ;
+    Side moQR;
+    Side moRP;
 };
 
 } // namespace kelm::tin::rings

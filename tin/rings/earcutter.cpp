@@ -65,7 +65,7 @@ unsigned EarCutter::FindBlocker(unsigned tip) const {
     if (moTree)
         return moTree->FindInside(triangle, {corner.previous, tip, corner.next});
     unsigned at = moCorners[corner.next].next;
-    while (at != corner.previous && !triangle.TestInside(moCorners[at].at))
+    while (at != corner.previous && !triangle.TestInside(moCorners[at].at.x, moCorners[at].at.y))
         at = moCorners[at].next;
     return at != corner.previous ? at : NONE;
 }
