@@ -47,7 +47,7 @@ Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
         throw DataException(FormatString("%d points could not forma polygon", vertices),
                             "tin/detail/polygon", __PRETTY_FUNCTION__, __LINE__);
     mnPoints = static_cast<unsigned>(vertices) - 1U;
-    mpoPoints = new point2_t<T>[mnPoints];
+    mpoPoints = mnPoints <= MOST_NEAR_POINTS ? moNearPoints : new point2_t<T>[mnPoints];
     for (unsigned i = 0; i < mnPoints; ++i)
         mpoPoints[i] = {poShape->vertices[i].x, poShape->vertices[i].y};
     ComputeBBox();
@@ -58,7 +58,7 @@ Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
 
 template <typename T>
 Polygon<T>::~Polygon() {
-    if (mpoPoints != nullptr && mbOwnsPoints)
+    if (mpoPoints != moNearPoints && mbOwnsPoints)
         delete[] mpoPoints;
 }
 
@@ -139,12 +139,10 @@ bool Polygon<T>::IsIntersected(const BBox<T, point2_t<T>>& oWindow) const {
 
 template class Polygon<double>;
 
-std::vector<unsigned> detail::FindRingVertices(const ZARShape& oShape) {
-    std::vector<unsigned> kept;
-    kept.reserve(static_cast<std::size_t>(oShape.vertexCount));
+void detail::FindRingVertices(const ZARShape& oShape, std::vector<unsigned>& rVertices) {
+    rVertices.clear();
     VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
-              [&](unsigned i) { kept.push_back(i); });
-    return kept;
+              [&](unsigned i) { rVertices.push_back(i); });
 }
 
 } // namespace kelm::tin
