@@ -71,18 +71,24 @@ EdgeTree::Node EdgeTree::Fit(unsigned first, unsigned last) const {
     axis = {axis.x / length, axis.y / length};
     rules::Range<double> along;
     rules::Range<double> across;
-    for (unsigned i = first; i < last; ++i)
+    double lean = 0.0;
+    for (unsigned i = first; i < last; ++i) {
+        const Point r = GetDirection(moEdges[i]);
+        const double c = Cross(axis, r);
+        lean = std::max(lean, c * c / Dot(r, r));
         for (const Point& end : {moEdges[i].from, moEdges[i].to}) {
             const Point p = Subtract(end, moOrigin);
             along.Add(Dot(axis, p));
             across.Add(Cross(axis, p));
         }
+    }
     const double u = along.low + (along.high - along.low) / 2;
     const double v = across.low + (across.high - across.low) / 2;
     return {{axis.x * u - axis.y * v, axis.y * u + axis.x * v},
             axis,
             (along.high - along.low) / 2 + mdfSlack,
             (across.high - across.low) / 2 + mdfSlack,
+            2.0 * std::sqrt(lean) + 0x1p-40,
             first,
             last};
 }
@@ -148,14 +154,18 @@ bool EdgeTree::TestApart(const Node& a, const Node& b) {
     const Point d = Subtract(b.center, a.center);
     const double c = std::fabs(Dot(a.axis, b.axis));
     const double s = std::fabs(Cross(a.axis, b.axis));
-    const double gap = std::max(
-        std::max(std::fabs(Dot(a.axis, d)) - a.halfAlong - b.halfAlong * c - b.halfAcross * s,
-                 std::fabs(Cross(a.axis, d)) - a.halfAcross - b.halfAlong * s - b.halfAcross * c),
-        std::max(std::fabs(Dot(b.axis, d)) - b.halfAlong - a.halfAlong * c - a.halfAcross * s,
-                 std::fabs(Cross(b.axis, d)) - b.halfAcross - a.halfAlong * s - a.halfAcross * c));
+    const double acrossA =
+        std::fabs(Cross(a.axis, d)) - a.halfAcross - b.halfAlong * s - b.halfAcross * c;
+    const double acrossB =
+        std::fabs(Cross(b.axis, d)) - b.halfAcross - a.halfAlong * s - a.halfAcross * c;
+    const double alongA =
+        std::fabs(Dot(a.axis, d)) - a.halfAlong - b.halfAlong * c - b.halfAcross * s;
+    const double alongB =
+        std::fabs(Dot(b.axis, d)) - b.halfAlong - a.halfAlong * c - a.halfAcross * s;
     const double size = std::fabs(d.x) + std::fabs(d.y) +
                         2.0 * (a.halfAlong + a.halfAcross + b.halfAlong + b.halfAcross);
-    return gap >= LEAST_GAP * size;
+    return std::max({acrossA, acrossB, alongA, alongB}) >= LEAST_GAP * size ||
+           acrossA >= a.lean * size || acrossB >= b.lean * size;
 }
 
 } // namespace kelm::tin::rings

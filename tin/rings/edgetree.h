@@ -34,6 +34,7 @@ class EdgeTree {
         Point axis;         ///< direction of the longest edge, of length 1
         double halfAlong;   ///< extent along the axis, to both sides
         double halfAcross;  ///< extent across it
+        double lean;        ///< twice the largest sine between an edge and the axis
         unsigned first;     ///< edges from here
         unsigned last;      ///< to before here
         unsigned right = 0; ///< the right child; the left one is next to the node. 0 for a leaf

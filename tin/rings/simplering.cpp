@@ -10,7 +10,7 @@ namespace kelm::tin::rings {
 namespace {
 
 /// Least corners for which the index is faster.
-constexpr unsigned LEAST_INDEXED = 400;
+constexpr unsigned LEAST_INDEXED = 257;
 
 /// Does the edge i of a ring meet an edge from i + 2 on? The closing edge is a neighbour of the
 /// first one.
