@@ -55,8 +55,9 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     shape.vertexCount = static_cast<int>(ring.size());
     try {
         const Polygon<double> polygon(&shape, orient);
-        if (orient == PO_Undefined)
-            Require(kelm::tin::detail::FindRingVertices(shape).size() == polygon.GetPointCount());
+        std::vector<unsigned> vertices;
+        kelm::tin::detail::FindRingVertices(shape, vertices);
+        Require(orient != PO_Undefined || vertices.size() == polygon.GetPointCount());
         std::vector<Triangle_Id> triangles;
         if (Triangulate(polygon, triangles) == 0) {
             Require(triangles.size() + 2 == polygon.GetPointCount());

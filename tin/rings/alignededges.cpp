@@ -142,8 +142,8 @@ class AlignedEdges {
     }
 
     bool TestPair(unsigned i, unsigned j) const {
-        return i - j + 1U > 2U && TestMeeting(mpoPoints[i], GetEdge(mpoPoints, i), mpoPoints[j],
-                                              mpoPoints[j + 1]);
+        return i - j + 1U > 2U &&
+               TestMeeting(mpoPoints[i], GetEdge(mpoPoints, i), mpoPoints[j], mpoPoints[j + 1]);
     }
 
     const Point* mpoPoints;

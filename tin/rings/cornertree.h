@@ -44,8 +44,8 @@ class CornerTree {
     unsigned FindBelow(unsigned node, const Query& query) const;
     unsigned FindInLeaf(const Node& node, const Query& query) const;
 
-    std::vector<Item> moItems;     ///< of a leaf side by side, those that are left first
-    std::vector<Node> moNodes;     ///< the children of k are 2 k and 2 k + 1, the root is 1
+    std::vector<Item> moItems;      ///< of a leaf side by side, those that are left first
+    std::vector<Node> moNodes;      ///< the children of k are 2 k and 2 k + 1, the root is 1
     std::vector<unsigned> moLeaves; ///< by corner
     unsigned mnFirstLeaf = 1;
 };

@@ -17,8 +17,8 @@ constexpr double LEAST_TURN = 1.1920928955078125e-7;
 class EarTriangle {
   public:
     EarTriangle(const Point& p, const Point& q, const Point& r)
-        : moPQ{p, q.x - p.x, q.y - p.y}, moQR{q, r.x - q.x, r.y - q.y},
-          moRP{r, p.x - r.x, p.y - r.y} {}
+        : moPQ{p, q.x - p.x, q.y - p.y}, moQR{q, r.x - q.x, r.y - q.y}, moRP{r, p.x - r.x,
+                                                                             p.y - r.y} {}
 
     double GetTurn() const { return moPQ.dx * -moRP.dy - moPQ.dy * -moRP.dx; }
 

@@ -49,7 +49,7 @@ class EarCutter {
     bool mbForward;
     unsigned mnPoints;
     unsigned mnLeft;
-    unsigned mnIndexed; ///< corners in the tree when it was built
+    unsigned mnIndexed;            ///< corners in the tree when it was built
     std::vector<Corner> moCorners; ///< counter-clockwise
     NumberSet moCandidates;
     std::optional<CornerTree> moTree; ///< none if coordinates are not bounded

@@ -13,6 +13,9 @@ constexpr unsigned MOST_LEAF_EDGES = 8;
 /// Least gap between boxes that are apart, in parts of their size together.
 constexpr double LEAST_GAP = 0x1p-5;
 
+/// So many parts of their size are more than rounding moves an edge across another.
+constexpr double LEAST_LEAN = 0x1p-40;
+
 double Dot(const Point& a, const Point& b) {
     return a.x * b.x + a.y * b.y;
 }
@@ -58,39 +61,49 @@ unsigned EdgeTree::Build(unsigned first, unsigned last) {
 }
 
 EdgeTree::Node EdgeTree::Fit(unsigned first, unsigned last) const {
-    Point axis{0.0, 0.0};
-    double square = 0.0;
-    for (unsigned i = first; i < last; ++i) {
-        const Point r = GetDirection(moEdges[i]);
-        if (const double length = Dot(r, r); length > square) {
-            square = length;
-            axis = r;
-        }
-    }
-    const double length = std::sqrt(square);
-    axis = {axis.x / length, axis.y / length};
+    const Point axis = FindAxis(first, last);
     rules::Range<double> along;
     rules::Range<double> across;
-    double lean = 0.0;
-    for (unsigned i = first; i < last; ++i) {
-        const Point r = GetDirection(moEdges[i]);
-        const double c = Cross(axis, r);
-        lean = std::max(lean, c * c / Dot(r, r));
+    for (unsigned i = first; i < last; ++i)
         for (const Point& end : {moEdges[i].from, moEdges[i].to}) {
             const Point p = Subtract(end, moOrigin);
             along.Add(Dot(axis, p));
             across.Add(Cross(axis, p));
         }
-    }
     const double u = along.low + (along.high - along.low) / 2;
     const double v = across.low + (across.high - across.low) / 2;
     return {{axis.x * u - axis.y * v, axis.y * u + axis.x * v},
             axis,
             (along.high - along.low) / 2 + mdfSlack,
             (across.high - across.low) / 2 + mdfSlack,
-            2.0 * std::sqrt(lean) + 0x1p-40,
+            FindLean(axis, first, last),
             first,
             last};
+}
+
+/// @return direction of the longest edge
+Point EdgeTree::FindAxis(unsigned first, unsigned last) const {
+    Point axis{0.0, 0.0};
+    double square = 0.0;
+    for (unsigned i = first; i < last; ++i) {
+        const Point r = GetDirection(moEdges[i]);
+        if (const double other = Dot(r, r); other > square) {
+            square = other;
+            axis = r;
+        }
+    }
+    const double length = std::sqrt(square);
+    return {axis.x / length, axis.y / length};
+}
+
+double EdgeTree::FindLean(const Point& axis, unsigned first, unsigned last) const {
+    double square = 0.0;
+    for (unsigned i = first; i < last; ++i) {
+        const Point r = GetDirection(moEdges[i]);
+        const double across = Cross(axis, r);
+        square = std::max(square, across * across / Dot(r, r));
+    }
+    return 2.0 * std::sqrt(square) + LEAST_LEAN;
 }
 
 /// Puts the edges with the lower midpoints first, on the axis on which they spread further.
@@ -150,13 +163,16 @@ bool EdgeTree::TestEdges(const Node& node, const Node& other) const {
 }
 
 /// Are the boxes apart on an axis of one of them (Gottschalk, Lin and Manocha 1996)?
+///
+/// A gap beside one box is enough if it is wider than the lines of its edges lean into, over the
+/// size of both boxes: then the other box lies on one side of all these lines.
 bool EdgeTree::TestApart(const Node& a, const Node& b) {
     const Point d = Subtract(b.center, a.center);
     const double c = std::fabs(Dot(a.axis, b.axis));
     const double s = std::fabs(Cross(a.axis, b.axis));
-    const double acrossA =
+    const double besideA =
         std::fabs(Cross(a.axis, d)) - a.halfAcross - b.halfAlong * s - b.halfAcross * c;
-    const double acrossB =
+    const double besideB =
         std::fabs(Cross(b.axis, d)) - b.halfAcross - a.halfAlong * s - a.halfAcross * c;
     const double alongA =
         std::fabs(Dot(a.axis, d)) - a.halfAlong - b.halfAlong * c - b.halfAcross * s;
@@ -164,8 +180,8 @@ bool EdgeTree::TestApart(const Node& a, const Node& b) {
         std::fabs(Dot(b.axis, d)) - b.halfAlong - a.halfAlong * c - a.halfAcross * s;
     const double size = std::fabs(d.x) + std::fabs(d.y) +
                         2.0 * (a.halfAlong + a.halfAcross + b.halfAlong + b.halfAcross);
-    return std::max({acrossA, acrossB, alongA, alongB}) >= LEAST_GAP * size ||
-           acrossA >= a.lean * size || acrossB >= b.lean * size;
+    return std::max({besideA, besideB, alongA, alongB}) >= LEAST_GAP * size ||
+           besideA >= a.lean * size || besideB >= b.lean * size;
 }
 
 } // namespace kelm::tin::rings

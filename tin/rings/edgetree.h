@@ -16,13 +16,14 @@ struct Edge {
 /// Oriented boxes over the edges of a chain, halved again and again. It finds two edges that meet
 /// without a look at pairs that stand apart.
 ///
-/// Boxes are apart if they leave a gap of at least 1/32 of the size of both together. Edges in two
-/// such boxes may still meet by the rounded rule, but only if they are nearly parallel and nearly
-/// on one line: TestAlignedMeet sees to these. docs/guide/exactness.md has the proof.
+/// Boxes are apart if they leave a gap of 1/32 of the size of both together, or a smaller one along
+/// which the edges of one box run. Edges in boxes apart by the first may still meet by the rounded
+/// rule, but only if they are nearly parallel and nearly on one line: TestAlignedMeet sees to
+/// these. docs/guide/exactness.md has the proof.
 class EdgeTree {
   public:
-    /// @param points corner coordinates, bounded as SimpleRing asks @param edges 1 or more, one less
-    /// than the points @throw std::bad_alloc
+    /// @param points corner coordinates, bounded as TestSimpleByIndex sees to @param edges 1 or
+    /// more, one less than the points @throw std::bad_alloc
     EdgeTree(const Point* points, unsigned edges);
 
     /// @return true if it finds edges that meet and do not follow each other
@@ -42,6 +43,8 @@ class EdgeTree {
 
     unsigned Build(unsigned first, unsigned last);
     Node Fit(unsigned first, unsigned last) const;
+    Point FindAxis(unsigned first, unsigned last) const;
+    double FindLean(const Point& axis, unsigned first, unsigned last) const;
     void Halve(unsigned first, unsigned middle, unsigned last);
     bool TestWithin(unsigned node) const;
     bool TestBetween(unsigned node, unsigned other) const;

@@ -8,8 +8,8 @@
 
 namespace kelm::tin::rings {
 
-/// Cuts the ears off a ring of few corners, in the order of a cursor that goes around it. A try takes
-/// time linear in the corners. It needs no memory but for the triangles.
+/// Cuts the ears off a ring of few corners, in the order of a cursor that goes around it. A try
+/// takes time linear in the corners. It needs no memory but for the triangles.
 class SmallRing {
   public:
     static constexpr unsigned MOST_CORNERS = 256;
