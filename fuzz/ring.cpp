@@ -1,7 +1,11 @@
-// A polygon ring: refused, or cut into triangles that cover it exactly.
+// A polygon ring: refused, or cut into triangles that cover it exactly; alike with an index and
+// without.
 
 #include "fuzz/bytes.h"
 #include "services/exception.h"
+#include "tin/rings/earcutter.h"
+#include "tin/rings/simplering.h"
+#include "tin/rings/smallring.h"
 #include "tin/triangulate.h"
 
 #include <algorithm>
@@ -9,6 +13,7 @@
 
 using fuzz::Require;
 using kelm::tin::Polygon;
+namespace rings = kelm::tin::rings;
 
 namespace {
 
@@ -41,6 +46,23 @@ void TestAreas(const Polygon<double>& oPolygon, const std::vector<Triangle_Id>& 
     Require(sum == std::abs(ring));
 }
 
+/// Also for rings that cross themselves.
+void TestIndex(const Polygon<double>& oPolygon) {
+    const point2_t<double>* points = oPolygon.GetPoints();
+    const unsigned count = oPolygon.GetPointCount();
+    Require(rings::TestSimpleByIndex(points, count) == rings::TestSimpleByPairs(points, count));
+    if (count < 3)
+        return;
+    std::vector<Triangle_Id> small;
+    std::vector<Triangle_Id> large;
+    const bool isCut = rings::SmallRing(points, count, true).Cut(small);
+    Require(rings::EarCutter(points, count, true).Cut(large) == isCut);
+    const auto isSame = [](const Triangle_Id& a, const Triangle_Id& b) {
+        return a.id0 == b.id0 && a.id1 == b.id1 && a.id2 == b.id2;
+    };
+    Require(std::equal(small.begin(), small.end(), large.begin(), large.end(), isSame));
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -58,6 +80,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         std::vector<unsigned> vertices;
         kelm::tin::detail::FindRingVertices(shape, vertices);
         Require(orient != PO_Undefined || vertices.size() == polygon.GetPointCount());
+        TestIndex(polygon);
         std::vector<Triangle_Id> triangles;
         if (Triangulate(polygon, triangles) == 0) {
             Require(triangles.size() + 2 == polygon.GetPointCount());

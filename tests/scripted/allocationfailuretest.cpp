@@ -1,6 +1,7 @@
 #include "services/exception.h"
 #include "tests/scripted/readerfixture.h"
 #include "tests/support/allocationcounter.h"
+#include "tin/triangulate.h"
 
 #include <omp.h>
 
@@ -47,6 +48,18 @@ TEST_F(AllocationFailureTest, OpeningAndLoadingWithPolygonsAndADatumChange) {
             return Summarise(Load(*reader));
         });
     }
+}
+
+TEST_F(AllocationFailureTest, ARingThatIsLargeEnoughForAnIndex) {
+    std::vector<ZARVertex> arc;
+    for (int i = -150; i <= 150; ++i)
+        arc.push_back({1.0 * i, 1.0 * i * i, 0});
+    const ZARShape shape{arc.data(), static_cast<int>(arc.size())};
+    FailEach([&] {
+        std::vector<Triangle_Id> ids;
+        return Triangulate(kelm::tin::Polygon<double>(&shape, PO_Undefined), ids) +
+               static_cast<int>(ids.size());
+    });
 }
 
 TEST_F(AllocationFailureTest, AReaderConvertsToTheDatumThatItTells) {
