@@ -140,7 +140,6 @@ bool Polygon<T>::IsIntersected(const BBox<T, point2_t<T>>& oWindow) const {
 template class Polygon<double>;
 
 void detail::FindRingVertices(const ZARShape& oShape, std::vector<unsigned>& rVertices) {
-    rVertices.clear();
     VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
               [&](unsigned i) { rVertices.push_back(i); });
 }

@@ -71,7 +71,7 @@ extern template class KELM_TIN_EXPORT Polygon<double>;
 namespace detail {
 
 /// Lists the shape vertex of each point of the polygon that a shape gives with PO_Undefined.
-/// @param rVertices is written anew @throw std::bad_alloc
+/// @param rVertices is appended to @throw std::bad_alloc
 void FindRingVertices(const ZARShape& oShape, std::vector<unsigned>& rVertices);
 
 } // namespace detail
