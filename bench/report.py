@@ -3,8 +3,8 @@
 
 Usage: report.py ROUND.json ... > docs/benchmarks.md
 
-Each figure is the median of the rounds. Fails if a benchmark failed, for one because our index and
-our scan disagree.
+Each figure is the median of the rounds. Fails if a benchmark failed, for example because our
+index and our scan disagree.
 """
 
 import json
@@ -17,79 +17,86 @@ import sys
 # Why a goal is missed, by its key in get_goals(). A goal that is short and has no sentence here is
 # printed as unexplained.
 CAUSES = {
-    "random": "Not proved, there are no hardware counters here: a height seems to wait for memory. It "
-              "follows the nodes down, then reads a leaf's list, its triangles and their vertices, "
-              "each at an address that the one before tells",
-    "line-short": "Not proved, as above: on the larger terrains next to all that a short segment "
-                  "reads is out of cache, and a leaf reads each of up to five triangles where "
+    "random": "Not proved, since there are no hardware counters here: a height seems to wait for "
+              "memory. It follows the nodes down, then reads a leaf's list, its triangles and "
+              "their vertices. Each read gives the address of the next",
+    "line-short": "Not proved, as above: on the larger terrains almost all that a short segment "
+                  "reads is out of the cache. A leaf reads each of up to five triangles, while "
                   "Boost's node holds their boxes side by side",
-    "line-long": "As for short segments; the higher the line, the more a 3-D index drops",
-    "scan": "While the triangles fit the cache, the time is that of testing each box, a load and "
-            "six operations a triangle; beyond it, that of the memory alone",
-    "raster": "The walk hands out every cell with column, row and height, two divisions in double "
-              "a cell by the inside rule; the plain walk trusts the ends of a row, divides once a "
-              "row and writes to the raster directly",
+    "line-long": "As for short segments. The higher the line, the more a 3-D index leaves out",
+    "scan": "While the triangles fit the cache, the time is that of testing each box: a load and "
+            "six operations for each triangle. Beyond the cache it is the time of the memory",
+    "raster": "The walk gives column, row and height of every cell, with two divisions in double "
+              "for each cell by the inside rule. The plain walk trusts the ends of a row, "
+              "divides once for each row and writes to the raster directly",
     "load": "The loop makes nothing. A load also carries each corner through the list, welds it, "
-            "and makes vertices and triangles of them",
-    "growth": "At 100k all that a build or a height visits lies in the cache, at 4M next to nothing. At "
-              "equal density of the positions, the row `fine`, a height does not grow as much",
+            "and makes vertices and triangles",
+    "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing "
+              "is. At equal density of the positions, in the row `fine`, a height grows less",
 }
 
 # Title, key, unit of a figure (factor on nanoseconds an item, text), workload in words.
 SUBJECTS = [
     ("Build", "build", (1, "ns a triangle"),
-     "An index over a terrain that is in memory in the form that each builds from: our triangles, "
-     "CGAL's triangles, Embree's shared buffers, a vector of boxes for Boost. Releasing it is not "
-     "timed. Terrains are fractal, their nodes 10 m apart with 3 m of jitter, two triangles a "
-     "cell, in row order or shuffled; `jacksboro` is real (17,619 triangles). `same`: as many copies of "
-     "one triangle. `crowded`: vertices crowd towards a corner of the box by powers of two."),
+     "An index over a terrain in memory. Each library builds from its own form: our triangles, "
+     "CGAL's triangles, Embree's shared buffers, and a vector of boxes for Boost. The time to "
+     "release the index is not counted. Terrains are fractal. Their nodes are 10 m apart with 3 "
+     "m of jitter, with two triangles in a cell, in row order or shuffled. `jacksboro` is real "
+     "(17,619 triangles). `same` is so many copies of one triangle. In `crowded` vertices crowd "
+     "towards a corner of the box by powers of two."),
     ("Memory of an index", "memory", (0, "bytes a triangle"),
-     "Resident memory that a build adds at its peak and keeps, beyond what it is built over, each "
-     "in a process of its own."),
+     "Resident memory that a build adds, at its peak and afterwards, beyond what it is built "
+     "from. Each build runs in a process of its own."),
     ("Degenerate surfaces", "degenerate", (1e-6, "ms"),
-     "A million triangles (100k if `quick`), an index of ours, each figure one call: `same` and `crowded` as above; `vertical` triangles "
-     "in a diagonal; a `tower` of growing triangles over one point; `slivers` of 10,000 km side by "
-     "side; `far`: each spans the range of `float`. The height in the middle of the surface's box, "
-     "and the crossing of its diagonal."),
+     "Our index over a million triangles (100k if `quick`). Each figure is one call. `same` and "
+     "`crowded` are as above. `vertical` has upright triangles on a diagonal. `tower` has "
+     "growing triangles over one point. `slivers` are 10,000 km long, side by side. In `far` "
+     "each triangle spans the range of `float`. The height is that in the middle of the "
+     "surface's box. The crossing is that of the box's diagonal."),
     ("Heights along scanlines", "height/scanline", (1, "ns a height"),
-     "The greatest height at a million positions, row by row over the whole extent, one call a "
-     "position. CGAL lists the triangles that a plumb line meets, Boost those whose box holds the "
-     "position; the highest is looked up. Embree casts a ray down, by its robust flag: the first "
-     "hit is the highest; in the second column a filter lists all hits."),
+     "The greatest height at a million positions, row by row over the whole extent, one call for "
+     "each position. CGAL lists the triangles that a plumb line meets. Boost lists those whose "
+     "box holds the position. From both lists the highest is taken. Embree casts a ray down, "
+     "with its robust flag. In its first column the first hit is the highest. In its second "
+     "column a filter lists all hits."),
     ("Heights along fine scanlines", "height/fine", (1, "ns a height"),
-     "The same at a million positions 2.24 m apart, ten to a triangle on each terrain, of which "
-     "they cross the larger ones in part only."),
+     "The same at a million positions 2.24 m apart. On each terrain there are ten positions in a "
+     "triangle, so they cross only a part of the larger terrains."),
     ("Heights at random positions", "height/random", (1, "ns a height"),
      "The same at a million positions in random order."),
     ("Highest crossing of short segments", "line/2%", (1e-3, "µs a segment"),
-     "20,000 lines of sight of 2 % of the extent, from 1 m above the ground to at least 1 m and up "
-     "to 5 % of the length above it. Our index and Boost's know the plan only and see every "
-     "triangle below the segment. CGAL's and Embree's are three-dimensional and see those whose "
-     "box the segment passes through; for Embree, the first hit from the higher end."),
+     "20,000 lines of sight. Each is 2 % of the extent long. It starts 1 m above the ground. It "
+     "ends 1 m, plus up to 5 % of its length, above the ground. Our index and Boost's know only "
+     "the plan, and visit every triangle below the segment. Those of CGAL and Embree are "
+     "three-dimensional, and visit the triangles whose box the segment passes through. Embree "
+     "takes the first hit from the higher end."),
     ("Highest crossing of long segments", "line/50%", (1e-3, "µs a segment"),
      "The same for 2,000 segments of 50 % of the extent."),
     ("Heights without an index", "scan", (1e-3, "µs a height"),
      "One height by a scan of all triangles, beside reading one word of each cache line of the "
      "array of triangles."),
     ("Welding", "weld", (1, "ns a corner"),
-     "Three corners a triangle in map coordinates, 24 bytes each: for every corner the first one "
-     "that is within 1e-9 on each axis; for meshoptimizer, whose bits are the same. `twins`: one "
-     "corner in a thousand is moved by the least step of a double. `ours, corners to surface` adds "
-     "what follows in a load: vertices, triangles and their boxes."),
+     "Three corners for each triangle, in map coordinates, 24 bytes each. For every corner it "
+     "finds the first one within 1e-9 on each axis. meshoptimizer finds the first one with the "
+     "same bits. In `twins` one corner in a thousand is moved by the smallest step of a double. "
+     "`ours, corners to surface` adds what follows in a load: vertices, triangles and their "
+     "boxes."),
     ("Rings, star-shaped", "ring/star", (1e-3, "µs a ring"),
-     "Rings of 4 to 500 corners around a centre, tested for being simple and cut into triangles. "
-     "GEOS: isSimple and PolygonTriangulator on a polygon made beforehand. CGAL: constrained "
-     "Delaunay. Ours starts from the vertices of a shape."),
+     "Rings of 4 to 500 corners around a centre. Each is tested for being simple and cut into "
+     "triangles. GEOS uses isSimple and PolygonTriangulator on a polygon made beforehand. CGAL "
+     "uses constrained Delaunay. Ours starts from the vertices of a shape."),
     ("Rings, wiggly", "ring/wiggly", (1e-3, "µs a ring"),
      "The same for bands that go up and down at each step."),
     ("Whole surface to a raster", "raster", (1e-6, "ms a raster"),
-     "2000 x 2000 cells over the whole terrain, the greatest height in each, from triangles in "
-     "grid coordinates. Embree casts a ray a cell, its index built beforehand. The row walks are "
-     "plain loops in `double` over the triangles: one tests and weights each cell of a row, the "
-     "other takes them for inside and steps along the plane. GDAL triangulates the vertices anew."),
+     "2000 x 2000 cells over the whole terrain, with the greatest height in each, from triangles "
+     "in grid coordinates. Embree casts a ray for each cell; its index is built beforehand. The "
+     "row walks are plain loops in `double` over the triangles. One tests and weights each cell "
+     "of a row. The other takes the cells for inside and steps along the plane. GDAL "
+     "triangulates the vertices anew."),
     ("Loading, GeoPackage", "load/GPKG", (1e-9, "s"),
-     "Triangles as polygons with heights, each load in a process of its own: processor time of "
-     "`Load` beside a loop over all features that reads each corner and keeps nothing."),
+     "Triangles as polygons with heights, each load in a process of its own. The time is the "
+     "processor time of `Load`, beside a loop over all features that reads each corner and keeps "
+     "nothing."),
     ("Loading, FlatGeobuf", "load/FlatGeobuf", (1e-9, "s"), "The same."),
     ("Loading, Shapefile", "load/ESRI Shapefile", (1e-9, "s"), "The same."),
 ]
@@ -175,7 +182,7 @@ def format_cell(results, subject, row, who, factor):
 
 
 def get_lead(results, subject):
-    """On lines: by how much the three-dimensional indices lead."""
+    """Tells by how much the three-dimensional indices lead on lines."""
     parts = []
     for who in ("CGAL", "Embree, first hit"):
         leads = [1 / ratio for row in results.get_rows(subject)
@@ -186,7 +193,7 @@ def get_lead(results, subject):
 
 
 def get_notes(results, subject):
-    """Where a competitor's answers differ from ours."""
+    """Tells where a competitor's answers differ from ours."""
     notes = []
     for who in results.get_columns(subject):
         named = [describe_difference(results, subject, row, who)
@@ -348,7 +355,8 @@ def get_growth(results, subject, start, end, per_log):
 
 
 def get_growth_goal(results):
-    """Forty times the triangles: a quadratic build would take forty times as long for each."""
+    """From 100k to 4M there are forty times the triangles. A quadratic build would take forty times
+    as long for each triangle."""
     goal = Goal("growth", "Growth from 100k to 4M: a build as n log n (1.5 for caches), a height "
                 "along scanlines at most 1.5 x; no quadratic path (4 a triangle)")
     goal.at_most("build by n log n", get_growth(results, "build", "100k", "4M", True), 1.5)
@@ -374,7 +382,7 @@ def format_growth(results):
     if not rows:
         return ""
     sizes = ["10k", "100k", "1M", "4M"][:len(rows[0]) - 2]
-    return ("## Growth\n\nTime an item by that at 10k.\n\n"
+    return ("## Growth\n\nThe time of an item divided by that at 10k.\n\n"
             + format_table(["Work", ""] + sizes, rows))
 
 
@@ -419,10 +427,10 @@ def main(paths):
         sys.exit("Failed:\n" + "\n".join(sorted(set(results.failures))))
     parts = [
         "# Benchmarks",
-        "Made by `scripts/bench`, which installs the others from Debian, builds, runs everything "
-        "and writes this page. One thread, pinned to one core, processor time, median of the "
-        "rounds. In brackets stands the ratio: the other's time by ours, above 1 where ours is "
-        "the quicker. In each run every competitor's answers are compared with ours, and ours "
+        "`scripts/bench` makes this page. It installs the competitors from Debian, builds "
+        "everything and runs it. Times are processor times of one thread on one core, and the "
+        "median of the rounds. The ratio in brackets is the other's time divided by ours; above "
+        "1 ours is quicker. Each run compares every competitor's answers with ours, and ours "
         "with a scan of all triangles.",
         format_machine(results, len(paths)),
         "## Goals",

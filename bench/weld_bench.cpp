@@ -49,7 +49,7 @@ StandIns WeldByOctree(Corners& rCorners) {
 StandIns WeldAsLoad(Corners& rCorners) {
     StandIns standIns(rCorners.size());
     return tin::load::CornerHash::FindStandIns(rCorners, standIns) ? standIns
-                                                                     : WeldByOctree(rCorners);
+                                                                   : WeldByOctree(rCorners);
 }
 
 /// The first corner of each number, which are given by first appearance.

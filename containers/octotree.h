@@ -9,15 +9,14 @@
 
 namespace kelm::containers {
 
-/// Point octree that tells which points are one: a leaf holds exactly one point, and a leaf that
+/// Point octree that finds points that coincide: a leaf holds exactly one point, and a leaf that
 /// receives a second one is split at the centre of its cell.
 ///
 /// A new point is dropped if it lies within the tolerance of the point held by the leaf that it
-/// reaches, so of several points at one place the first stays. Two kinds of points are held
-/// without a leaf, counted but not to be found: those that are not finite, and those that no
-/// halving of their cell can part from a held point, which only coordinates from 2^53 on can be.
-/// The depth is that of halving the root's cell down to the least distance of two points: never
-/// above 2200.
+/// reaches, so of several points at one place the first stays. Two kinds of points are counted but
+/// have no leaf, so no search finds them: points that are not finite, and points that no halving of
+/// their cell can part from a held point. The second kind needs coordinates from 2^53 on. The depth
+/// grows until a cell is as small as the least distance of two points. It is never above 2200.
 ///
 /// A tree owns its nodes. Searches only read and may run on any number of threads.
 template <typename T, typename K>
@@ -91,8 +90,7 @@ void TakeHalf(int side, T& low, T& high) {
 
 } // namespace detail
 
-/// A value has one side at most on each axis, so trying the octants in turn and falling through to
-/// 7 comes to this.
+/// On each axis the point lies on one side at most. A point outside the cell goes to octant 7.
 template <typename T, typename K>
 int OctoTree<T, K>::Classify(const Point& point, const Box& cell, Box& subCell) {
     int x = detail::GetSide(point.x, cell.min.x, cell.max.x);

@@ -9,8 +9,8 @@ using kelm::tin::AabbTree;
 using kelm::tin::Tin;
 
 int main() {
-    // A hill of four triangles around its top. Vertices are relative to the map position of the
-    // base, so that 32 bits keep their millimetres; heights are absolute, in metres.
+    // A hill of four triangles around its top. x and y of the vertices are relative to the base, so
+    // a float keeps their millimetres. Heights are not relative. All are in metres.
     const double xBase = 500000.0;
     const double yBase = 4649776.0;
     auto* vertices = new point3_t<float>[5];
@@ -28,7 +28,7 @@ int main() {
                 tree.GetNodeCount(), static_cast<unsigned long long>(surface.GetObjBytes()),
                 static_cast<unsigned long long>(tree.GetObjBytes()));
 
-    // The top, a point on a shared edge, one on a slope, and one beside the surface.
+    // The top, a position on a shared edge, one on a slope, and one outside the surface.
     const double positions[][2] = {{500050.0, 4649826.0},
                                    {500025.0, 4649801.0},
                                    {500060.5, 4649790.25},

@@ -14,7 +14,7 @@
 /// A layer of a file, as the command line names it.
 struct Layer {
     std::string file;
-    int number = 0; ///< from 1 on, below 1 for the first
+    int number = 0; ///< from 1 on; below 1 for the first layer
 };
 
 inline void AddLayerOptions(CLI::App& app, Layer& layer) {
@@ -24,7 +24,7 @@ inline void AddLayerOptions(CLI::App& app, Layer& layer) {
     app.add_option("--layer", layer.number, "Number of the layer from 1 on; else the first");
 }
 
-/// Loads the whole layer, its heights as they stand.
+/// Loads the whole layer, with heights as they are stored.
 inline std::unique_ptr<kelm::tin::Tin> LoadTerrain(const Layer& layer) {
     const std::unique_ptr<kelm::tin::TinReader> reader(kelm::tin::TinReaderFactory::CreateTinReader(
         layer.file.c_str(), layer.number, 0.0, 1.0, kelm::ogc::cs::VD_Other));
@@ -34,8 +34,8 @@ inline std::unique_ptr<kelm::tin::Tin> LoadTerrain(const Layer& layer) {
     return terrain;
 }
 
-/// The CRS of a layer, asked of GDAL: a reader has one, but it is made for computing, not for
-/// showing or writing it. @return an empty CRS if the layer has none
+/// Reads the CRS of a layer by GDAL. The CRS of a reader can only compute: it cannot be printed or
+/// written to a file. @return an empty CRS if the layer has none
 inline OGRSpatialReference ReadCrs(const Layer& layer) {
     GDALAllRegister();
     const GDALDatasetUniquePtr file(GDALDataset::Open(layer.file.c_str(), GDAL_OF_VECTOR));

@@ -1,9 +1,10 @@
-// Opens a terrain, tells what is known of it before and after the load, and answers positions:
+// Opens a terrain, prints what is known of it before and after the load, and prints heights at
+// positions:
 //
 //     terrain_heights terrain.gpkg --source orthometric --output ellipsoidal --at 745000,4052000
 //     terrain_heights terrain.gpkg --stdin < positions.csv > heights.txt
 //
-// Answers go to standard output, one line a position; all else goes to standard error.
+// Heights go to standard output, one line for each position. All else goes to standard error.
 
 #include "command.h"
 #include "terrain.h"
@@ -23,7 +24,7 @@ namespace {
 
 struct Options {
     DatumType source = VD_Other;
-    std::optional<DatumType> output; ///< if not the source's
+    std::optional<DatumType> output; ///< none: the same as the source
     double offset = 0.0;
     double scale = 1.0;
     std::vector<double> window;
@@ -48,7 +49,7 @@ void DefineOptions(CLI::App& app, Options& options) {
     app.add_flag("--stdin", options.readStdin, "Read positions from a CSV with columns x and y");
 }
 
-/// For byte counts and printf, which has no format for std::uint64_t.
+/// A byte count for printf, which has no format for std::uint64_t.
 using Bytes = unsigned long long;
 
 /// The most memory that the process has held so far.
@@ -70,7 +71,7 @@ void PrintLayer(const TinReader& reader, const OGRSpatialReference& crs) {
                  Bytes{EstimateAabbTreeBytes(shapes)});
 }
 
-/// Loads on another thread, so that this one can tell how long it has been at work.
+/// Loads on another thread, so that this thread can print how long the load has run.
 std::unique_ptr<Tin> Load(TinReader& reader, const std::vector<double>& sides) {
     BBox<double, point2_t<double>> window;
     if (!sides.empty()) {

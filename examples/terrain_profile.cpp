@@ -1,9 +1,10 @@
-// Writes a CSV of the heights along a line over a terrain, and of where the sight line from its
-// first to its last point meets the ground:
+// Writes the heights along a line over a terrain as a CSV. With --eye it also writes where the
+// sight line from the first point to the last one meets the ground:
 //
 //     terrain_profile terrain.gpkg --line 741000,4048000,750000,4056000 --step 20 --eye 30
 //
-// A sight line is straight in map coordinates: no curvature of the earth, no refraction.
+// A sight line is straight in map coordinates. It knows no curvature of the earth and no
+// refraction.
 
 #include "command.h"
 #include "terrain.h"
@@ -20,7 +21,7 @@ namespace {
 struct Options {
     std::vector<double> line; ///< x and y in turn
     double step = 0.0;
-    std::optional<double> eye; ///< none: no sight line is asked for
+    std::optional<double> eye; ///< none: no sight line
     double target = 0.0;
 };
 
@@ -50,7 +51,7 @@ void TestOptions(const Options& options) {
         throw CLI::ValidationError("--eye", "must be above 0, and the target not below it");
 }
 
-/// The points of a line, and between them stations at most a step apart.
+/// The points of a line and, between them, stations at most a step apart.
 std::vector<Station> PlaceStations(const std::vector<double>& line, double step) {
     std::vector<Station> stations{{0.0, {line[0], line[1]}}};
     for (std::size_t i = 2; i < line.size(); i += 2) {
@@ -67,8 +68,8 @@ std::vector<Station> PlaceStations(const std::vector<double>& line, double step)
     return stations;
 }
 
-/// The terrain under a line, with an index of its own. Cut station by station: each stretch between
-/// two stations then finds in the strip just the triangles that it would find in the terrain.
+/// The terrain under a line, with an index of its own. The strip is cut along the stretches between
+/// stations, so a query on such a stretch finds the same triangles in the strip as in the terrain.
 struct Strip {
     Strip(const Tin& terrain, const AabbTree& index, const std::vector<Station>& stations)
         : surface(Cut(terrain, index, stations)), tree(surface.get()) {}
@@ -87,8 +88,8 @@ struct Strip {
         return surface->GetHeight(at.x, at.y, height, &tree);
     }
 
-    /// Does the line meet the ground, or is it under ground at its end? The second catches a
-    /// crossing just on the edge of two triangles, which rounding can hide from the first.
+    /// Does the line meet the ground, or does it end below ground? Rounding can hide a crossing at
+    /// the edge of two triangles; then the line ends below ground.
     bool TestMeeting(const Place& a, const Place& b) const {
         float height;
         return surface->GetLineIntersectHeight(a, b, height, &tree) ||
@@ -131,10 +132,10 @@ std::vector<Place> PlaceSight(const Strip& strip, const std::vector<Station>& st
     return sight;
 }
 
-/// A crossing query tells the highest crossing of a line, which need not be the first. So the line
-/// is tried stretch by stretch from the eye on, and the first stretch that meets the ground is
-/// halved until it is shorter than a thousandth of the step. What the line meets as close as that
-/// to the target is the target.
+/// A crossing query gives the highest crossing of a line, which need not be the first one. So the
+/// line is tried stretch by stretch from the eye on. The first stretch that meets the ground is
+/// halved until it is shorter than a thousandth of the step. A crossing that close to the target
+/// counts as the target.
 void PrintSight(const Strip& strip, const std::vector<Station>& stations, const Options& options) {
     const std::vector<Place> sight = PlaceSight(strip, stations, options);
     PrintRow("eye", 0.0, sight.front());

@@ -2,8 +2,8 @@
 //
 //     terrain_raster terrain.gpkg heights.tif --cell 20
 //
-// A cell holds the height at its centre, the greatest where sheets lie above each other, and the
-// no-data value where there is no surface.
+// A cell holds the height at its centre. Where sheets lie above each other it holds the greatest
+// height. Where there is no surface it holds the no-data value.
 
 #include "command.h"
 #include "terrain.h"
@@ -18,10 +18,10 @@ using namespace kelm::tin;
 
 namespace {
 
-/// Below every height, so that the greatest height of a cell is a plain maximum.
-constexpr float kfNoData = std::numeric_limits<float>::lowest();
+/// Lower than every height, so that a plain maximum finds the greatest height of a cell.
+constexpr float NO_DATA = std::numeric_limits<float>::lowest();
 
-/// Rows of cells from north to south, their sides on whole multiples of the cell.
+/// Rows of cells from north to south. The sides of cells lie at whole multiples of the cell size.
 struct Grid {
     double cell; ///< side in map units
     double left; ///< western side of the first column, in cells
@@ -39,7 +39,7 @@ Grid MakeGrid(const Tin& terrain, double cell) {
     const double top = std::ceil(box.max.y / cell);
     const double cols = std::max(1.0, std::ceil(box.max.x / cell) - left);
     const double rows = std::max(1.0, top - std::floor(box.min.y / cell));
-    // Grid coordinates are float: on a longer side they do not tell 1/256 of a cell apart.
+    // Grid coordinates are float. On a longer side they could not tell 1/256 of a cell apart.
     if (!(cols <= 65536.0 && rows <= 65536.0))
         throw std::runtime_error("the cells are too small: more than 65536 on a side");
     const auto count = static_cast<std::size_t>(cols * rows);
@@ -48,11 +48,12 @@ Grid MakeGrid(const Tin& terrain, double cell) {
             top,
             static_cast<int>(cols),
             static_cast<int>(rows),
-            std::vector<float>(count, kfNoData),
+            std::vector<float>(count, NO_DATA),
             count > 10'000'000 ? GDALTermProgress : GDALDummyProgress};
 }
 
-/// The terrain in grid coordinates: x is the column and y the row, whole at the centre of a cell.
+/// The terrain in grid coordinates: x is the column and y is the row. The centre of a cell has
+/// whole coordinates.
 std::unique_ptr<Tin> MoveToGrid(const Tin& terrain, const Grid& grid) {
     double xBase;
     double yBase;
@@ -78,8 +79,8 @@ std::unique_ptr<Tin> MoveToGrid(const Tin& terrain, const Grid& grid) {
                                  0.0);
 }
 
-/// Walks triangles first to last - 1 on all threads. They meet at edges and may overlap: the
-/// greatest height of a cell is the same in whatever order they come.
+/// Walks triangles first to last - 1 on all threads. Triangles may share a cell. The order in which
+/// they come does not matter, since the greatest height counts.
 void FillCells(const Tin& sheet, unsigned first, unsigned last, Grid& grid) {
     std::exception_ptr failure; // an exception must not leave the parallel loop
 #pragma omp parallel for schedule(dynamic, 16)
@@ -113,30 +114,30 @@ void Fill(const Tin& sheet, Grid& grid) {
     }
 }
 
-/// Rounding can put a centre that lies just on an inner edge outside the triangles on both sides.
-/// Such a cell has surface around it, unlike one beside the surface, and gets the mean of that.
+/// Rounding can put a centre that lies on an inner edge outside the triangles on both sides. Such a
+/// cell has surface all around, and gets the mean of four heights close by.
 void CloseGaps(const Tin& sheet, Grid& grid) {
     const AabbTree tree(&sheet);
     const auto find = [&](float x, float y, float& height) {
         return sheet.GetHeight(x, y, height, &tree);
     };
-    constexpr float beside = 1.0f / 256.0f;
+    constexpr float BESIDE = 1.0f / 256.0f;
     float* cell = grid.heights.data();
     for (int row = 0; row < grid.rows; ++row)
         for (int col = 0; col < grid.cols; ++col, ++cell) {
-            if (*cell != kfNoData)
+            if (*cell != NO_DATA)
                 continue;
             const auto x = static_cast<float>(col);
             const auto y = static_cast<float>(row);
             float a, b, c, d;
-            if (find(x - beside, y - beside, a) && find(x + beside, y + beside, b) &&
-                find(x - beside, y + beside, c) && find(x + beside, y - beside, d))
+            if (find(x - BESIDE, y - BESIDE, a) && find(x + BESIDE, y + BESIDE, b) &&
+                find(x - BESIDE, y + BESIDE, c) && find(x + BESIDE, y - BESIDE, d))
                 *cell = (a + b + c + d) / 4.0f;
         }
 }
 
-/// GDAL tells the reason of a failure itself, on standard error; one may come with the last tile,
-/// when the file is closed.
+/// GDAL prints the reason of a failure on standard error. The last tile is written when the file is
+/// closed, and that can fail too.
 void Write(Grid& grid, const OGRSpatialReference& crs, const std::string& name) {
     const char* options[] = {"TILED=YES", "COMPRESS=DEFLATE", "PREDICTOR=3", nullptr};
     double place[] = {grid.left * grid.cell, grid.cell, 0.0, grid.top * grid.cell, 0.0, -grid.cell};
@@ -147,7 +148,7 @@ void Write(Grid& grid, const OGRSpatialReference& crs, const std::string& name) 
         file->SetGeoTransform(place);
         file->SetSpatialRef(crs.IsEmpty() ? nullptr : &crs);
         GDALRasterBand& band = *file->GetRasterBand(1);
-        band.SetNoDataValue(static_cast<double>(kfNoData));
+        band.SetNoDataValue(static_cast<double>(NO_DATA));
         GDALRasterIOExtraArg extra;
         INIT_RASTERIO_EXTRA_ARG(extra);
         extra.pProgressData = GDALCreateScaledProgress(0.5, 1.0, grid.progress, nullptr);

@@ -2,7 +2,9 @@
 // exception. The first byte chooses the format.
 
 #include "fuzz/bytes.h"
-#include "services/bundled/datasetfile.h"
+#include "services/bundled/store/files/opendataset.h"
+#include "services/bundled/store/landxml/landxmlfile.h"
+#include "services/bundled/store/storefile.h"
 #include "services/exception.h"
 #include "services/vectorlayer.h"
 #include "tin/tinreader.h"
@@ -10,6 +12,7 @@
 #include <cpl_vsi.h>
 
 #include <memory>
+#include <sstream>
 #include <string>
 
 namespace {
@@ -35,11 +38,10 @@ void WriteParts(fuzz::Bytes& rBytes, const Name& getName) {
 }
 
 /// @return the name to open
-std::string WriteFile(fuzz::Bytes& rBytes) {
+std::string WriteFile(fuzz::Bytes& rBytes, unsigned format) {
     static const char* const ENDINGS[] = {"gpkg", "fgb",    "geojson", "gml",
                                           "dxf",  "sqlite", "shp",     "gdb"};
     static const char* const SHAPE_PARTS[] = {".shp", ".shx", ".dbf", ".prj"};
-    const unsigned format = rBytes.TakeFrom(0, 7);
     std::string name = std::string(FOLDER) + "/input." + ENDINGS[format];
     if (format == 6)
         WriteParts(rBytes, [](unsigned id) {
@@ -56,10 +58,20 @@ std::string WriteFile(fuzz::Bytes& rBytes) {
     return name;
 }
 
-void Load(const std::string& name) {
+/// LandXML is read from a stream, without GDAL.
+std::unique_ptr<_iobuf> Open(fuzz::Bytes& rBytes) {
+    using namespace kelm::store;
+    const unsigned format = rBytes.TakeFrom(0, 8);
+    if (format < 8)
+        return std::make_unique<StoreFile>(OpenDataset(WriteFile(rBytes, format), "input"));
+    const auto* text = reinterpret_cast<const char*>(rBytes.GetNext());
+    std::istringstream stream(std::string(text, rBytes.GetSize()));
+    return std::make_unique<landxml::LandXmlFile>(stream, "input");
+}
+
+void Load(fuzz::Bytes& rBytes) {
     using namespace kelm;
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(store::OpenDataset(name, "input").release(),
-                                                      &ZARClose);
+    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(Open(rBytes).release(), &ZARClose);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     if (layer == nullptr || ZARGetLayerType(layer, 0) == 0)
         return;
@@ -77,9 +89,8 @@ void Load(const std::string& name) {
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     fuzz::Bytes bytes(data, size);
-    const std::string name = WriteFile(bytes);
     try {
-        Load(name);
+        Load(bytes);
     } catch (const kelm::Exception& e) {
         fuzz::Require(e.what()[0] != '\0');
     }

@@ -3,17 +3,17 @@
 
 #include "fuzz/bytes.h"
 #include "services/exception.h"
-#include "tin/rings/earcutter.h"
-#include "tin/rings/simplering.h"
-#include "tin/rings/smallring.h"
+#include "services/rings/cutting/earclipping.h"
+#include "services/rings/cutting/simplering.h"
 #include "tin/triangulate.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 
 using fuzz::Require;
 using kelm::tin::Polygon;
-namespace rings = kelm::tin::rings;
+namespace rings = kelm::rings;
 
 namespace {
 
@@ -46,21 +46,24 @@ void TestAreas(const Polygon<double>& oPolygon, const std::vector<Triangle_Id>& 
     Require(sum == std::abs(ring));
 }
 
-/// Also for rings that cross themselves.
-void TestIndex(const Polygon<double>& oPolygon) {
-    const point2_t<double>* points = oPolygon.GetPoints();
-    const unsigned count = oPolygon.GetPointCount();
-    Require(rings::TestSimpleByIndex(points, count) == rings::TestSimpleByPairs(points, count));
+using Corners = std::vector<std::array<unsigned, 3>>;
+
+/// Also for rings that cross themselves. @param steps after which the index gives way
+void TestIndex(const std::vector<rings::Point>& points, rings::StepLimit steps) {
+    const auto count = static_cast<unsigned>(points.size());
+    Require(rings::IsSimpleByIndex(points.data(), count, steps) ==
+            rings::IsSimpleByPairs(points.data(), count));
     if (count < 3)
         return;
-    std::vector<Triangle_Id> small;
-    std::vector<Triangle_Id> large;
-    const bool isCut = rings::SmallRing(points, count, true).Cut(small);
-    Require(rings::EarCutter(points, count, true).Cut(large) == isCut);
-    const auto isSame = [](const Triangle_Id& a, const Triangle_Id& b) {
-        return a.id0 == b.id0 && a.id1 == b.id1 && a.id2 == b.id2;
+    const rings::CounterClockwise<rings::Point> corners{points.data(), count, true};
+    Corners scanned;
+    Corners indexed;
+    const auto addTo = [](Corners& list) {
+        return [&](unsigned u, unsigned v, unsigned w) { list.push_back({u, v, w}); };
     };
-    Require(std::equal(small.begin(), small.end(), large.begin(), large.end(), isSame));
+    const bool isCut = rings::ClipSmallRing(corners, addTo(scanned));
+    Require(rings::ClipLargeRing(corners, steps, addTo(indexed)) == isCut);
+    Require(scanned == indexed);
 }
 
 } // namespace
@@ -80,7 +83,11 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         std::vector<unsigned> vertices;
         kelm::tin::detail::FindRingVertices(shape, vertices);
         Require(orient != PO_Undefined || vertices.size() == polygon.GetPointCount());
-        TestIndex(polygon);
+        std::vector<rings::Point> points;
+        for (unsigned i = 0; i < polygon.GetPointCount(); ++i)
+            points.push_back({polygon.GetPoints()[i].x, polygon.GetPoints()[i].y});
+        for (const std::size_t steps : {size % 64, ~std::size_t{0}})
+            TestIndex(points, rings::StepLimit(steps));
         std::vector<Triangle_Id> triangles;
         if (Triangulate(polygon, triangles) == 0) {
             Require(triangles.size() + 2 == polygon.GetPointCount());

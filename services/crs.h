@@ -4,8 +4,9 @@
 
 /// Contract of the coordinate reference services: CRS objects and the transform between them.
 ///
-/// The library tests no result of these calls: an operation that cannot deliver throws. An object
-/// is used by one thread at a time; different objects may be used on different threads.
+/// An operation that cannot deliver its result throws; the library does not test what the functions
+/// of this header return. An object is used by one thread at a time; different objects may be used
+/// on different threads.
 
 struct ProjInfo_t;
 
@@ -21,7 +22,7 @@ enum DatumType : int {
 
 /// Unit of the heights of a compound CRS.
 enum LinearUnitType : int {
-    LU_Default = 0 ///< that of the layer's own CRS for such heights if it names one, else metres
+    LU_Default = 0 ///< the unit of the height axis of the layer's own CRS, else metres
 };
 
 /// A coordinate reference system.
@@ -43,10 +44,10 @@ class KELM_SERVICES_EXPORT IMathTransform {
   public:
     virtual ~IMathTransform();
     /// Transforms points. @param source nCount triples x, y, z, with x as easting or longitude
-    /// @param target nCount triples, another array; z is the height in the target CRS. Without
-    /// meaning after a throw
+    /// @param target nCount triples in an array that does not overlap the source; z is the height
+    /// in the target CRS. After a throw its contents mean nothing
     /// @return true; not relied on. @throw if any point cannot be transformed, telling how many
-    /// and the first of them
+    /// cannot and where the first of them is
     virtual bool TransformPoints(const double* source, double* target, unsigned int nCount) = 0;
 };
 
@@ -62,15 +63,16 @@ class KELM_SERVICES_EXPORT IProjInfoFactory {
   public:
     /// @param poInfo the record that the vector layer store filled
     /// @return the two-dimensional CRS of the layer, which also knows the layer's vertical CRS; the
-    /// caller owns it. A record without CRS gives a local one. @throw if the record's CRS cannot be
-    /// read or has no map coordinates
+    /// caller owns it. A record without a CRS gives a local one. @throw if the record's CRS cannot
+    /// be read or has no map coordinates. The bundled store leaves the record empty if GDAL cannot
+    /// read the CRS of the layer
     virtual cs::ICRS* CreateCRS(ProjInfo_t* poInfo) = 0;
 
   protected:
     ~IProjInfoFactory();
 };
 
-/// Door of the coordinate reference services.
+/// Entry to the coordinate reference services.
 class KELM_SERVICES_EXPORT ProjectionEngine {
   public:
     /// @return the factory; not to be released. Safe to call from any thread
@@ -79,21 +81,23 @@ class KELM_SERVICES_EXPORT ProjectionEngine {
 
 namespace utils {
 
-/// @return true if the CRS is a local one, to which no datum change applies: none at all (null
-/// too), or one of a site with no stated place on the earth
+/// @return true if the CRS is a local one, to which no datum change applies: no CRS at all (null
+/// included), or that of a site with no stated place on the earth
 KELM_SERVICES_EXPORT bool IsCRSLocal(const cs::ICRS* poCRS);
 
-/// Joins a horizontal CRS and a vertical datum. @param poHorizontal not taken over
-/// @param eDatum VD_Ellipsoidal, or VD_Orthometric, which is the vertical CRS that the layer itself
-/// names, else EGM96 height (EPSG:5773); any code with a local CRS
+/// Joins a horizontal CRS and a vertical datum. @param poHorizontal stays with the caller
+/// @param eDatum VD_Ellipsoidal, or VD_Orthometric; with a local CRS any code. VD_Orthometric is
+/// the vertical CRS that the layer itself names, else EGM96 height (EPSG:5773)
+/// @param eUnit LU_Default
 /// @return a new CRS of three dimensions; the caller owns it. @throw if there is no such CRS
 KELM_SERVICES_EXPORT cs::ICRS* CreateCompoundCS(cs::ICRS* poHorizontal, cs::DatumType eDatum,
                                                 cs::LinearUnitType eUnit);
 
 /// Makes the transform between two CRSs of three dimensions. @param dfReserved always 0.0
 /// @return a new transform, independent of both CRS objects; the caller owns it. Between equal CRSs
-/// it changes no bit; between different heights of local CRSs its TransformPoints throws
-/// @throw if there is none of full accuracy, naming the grid files that are missing
+/// it changes no bit. Between different heights of local CRSs its TransformPoints throws
+/// @throw if there is no transform of sufficient accuracy, 11 m or better by PROJ or unknown,
+/// naming the grid files that are missing
 KELM_SERVICES_EXPORT ct::IMathTransform*
 CreateCRSTransform(const cs::ICRS* poSource, const cs::ICRS* poTarget, double dfReserved);
 

@@ -7,13 +7,13 @@
 
 namespace kelm {
 
-/// Root of the failures that the library raises. Thrown by value; what() is the message.
+/// Base of all failures that the library raises. Thrown by value; what() is the message.
 ///
 /// Reading an exception object is safe from any number of threads.
 class KELM_SERVICES_EXPORT Exception : public std::exception {
   public:
     /// @param message    the text for a person
-    /// @param sourcePath path of the source that raised the failure, without its ending
+    /// @param sourcePath path of the source that raised the failure, without its file extension
     /// @param function   signature of the enclosing function, as text
     /// @param line       line in that source
     Exception(std::string message, std::string sourcePath, std::string function, unsigned line);
@@ -43,7 +43,7 @@ class KELM_SERVICES_EXPORT DataException : public Exception {
     ~DataException() override;
 };
 
-/// An argument that a contract excludes.
+/// An argument that a contract does not allow.
 class KELM_SERVICES_EXPORT ParameterException : public DataException {
   public:
     /// What is wrong with the argument. The library raises one kind only.

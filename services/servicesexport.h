@@ -1,5 +1,5 @@
 #pragma once
 
-/// Marks what the outside services hand to the library and to its callers: everything else of an
-/// implementation stays hidden in its shared object.
+/// Marks what the services offer to the library and to its callers. All else of an implementation
+/// stays hidden in its shared object.
 #define KELM_SERVICES_EXPORT __attribute__((visibility("default")))

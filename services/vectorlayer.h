@@ -6,20 +6,18 @@
 
 /// Contract of the vector layer store: files, layers, shapes and their vertices.
 ///
-/// The library calls one store, whichever implementation it is linked with. Calls that concern one
-/// file come from one thread at a time; different files may be used on different threads.
-///
-/// The bundled store reads GeoPackage, ESRI Shapefile, FlatGeobuf, GeoJSON, GML, DXF, File
-/// Geodatabase and SQLite files. Its shape ids lead to feature ids by the rule of
-/// services/bundled/shapeids.h.
+/// The library calls the one store that it is linked with. Calls that concern one file come from
+/// one thread at a time; different files may be used on different threads. The store chooses which
+/// formats it reads and how it numbers shapes.
 
 /// An open file of the store. Opaque: only a store knows its contents.
 struct _iobuf;
 
-/// Segment type of vector layers.
+/// Segment type of vector layers. A segment is a numbered part of a file; one of this type is a
+/// layer.
 constexpr int ZAR_SEGMENT_VECTOR = 116;
 
-/// One vertex of a shape: map coordinates and stored height.
+/// One vertex of a shape: map coordinates and height as stored, in the units of the layer's CRS.
 struct ZARVertex {
     double x;
     double y;
@@ -32,8 +30,7 @@ struct ZARShape {
     int vertexCount;
 };
 
-/// An open layer. A store may keep more behind these two fields. The bundled store refuses a null
-/// layer with a kelm::ParameterException.
+/// An open layer. A store may keep more behind these two fields.
 struct ZARLayer_t {
     int shapeCount;
     int shapeCountValid; ///< non-zero if shapeCount can be relied on
@@ -41,25 +38,29 @@ struct ZARLayer_t {
 
 /// Spatial reference of a layer, as the store hands it to the coordinate reference services.
 struct ProjInfo_t {
-    std::string definition; ///< the CRS as WKT; empty if the layer has none
+    /// The CRS as text; empty if the layer has none. The bundled services read WKT and PROJJSON,
+    /// and the bundled store writes PROJJSON.
+    std::string definition;
 };
 
-/// Opens a file for reading. @param mode always "r". @return never null. @throw any exception, if
-/// the file is missing, unreadable or of a format that the store does not know.
+/// Opens a file for reading. @param mode always "r". @return never null; the caller ends it with
+/// ZARClose. @throw any exception, if the file is missing, unreadable or of a format that the store
+/// does not know
 KELM_SERVICES_EXPORT _iobuf* ZAROpen(const char* name, const char* mode);
 
-/// Closes a file and ends its layers; null is let be. Does not throw.
+/// Closes a file and ends its layers; does nothing for null. Does not throw.
 KELM_SERVICES_EXPORT void ZARClose(_iobuf* file);
 
 /// @return the number of segments of this type; a null file has none
 KELM_SERVICES_EXPORT int ZARSegCount(_iobuf* file, int type);
 
-/// @return the number of the first segment of this type behind `after` (0: from the start), or 0,
-/// as for a null file
+/// @param after a segment number, or 0 for the start. With 0 a store may skip segments without
+/// polygons. @return the number of the next segment of this type, or 0 if there is none or the file
+/// is null
 KELM_SERVICES_EXPORT int ZARSegNext(_iobuf* file, int type, int after);
 
-/// @return the layer of a segment, owned by the file, or null if there is no such layer or no file
-/// @throw any exception, if the layer cannot be read
+/// @return the layer of a segment, owned by the file; null if there is no such layer or the file is
+/// null. @throw any exception, if the layer cannot be read
 KELM_SERVICES_EXPORT ZARLayer_t* ZARGetLayer(_iobuf* file, int segment);
 
 /// @param n always 0. @return 2 or 4 for a layer of polygons, 1 or 3 for one of points or lines
@@ -68,7 +69,8 @@ KELM_SERVICES_EXPORT int ZARGetLayerType(ZARLayer_t* layer, int n);
 /// Fills `*info` with the spatial reference of the layer. @return 0; not relied on
 KELM_SERVICES_EXPORT int ZARGetProjectionInfo(ZARLayer_t* layer, ProjInfo_t* info);
 
-/// Fills both corners of the layer's extents, heights as stored. @return 0; not relied on
+/// Fills both corners of the layer's extents: map coordinates, and heights as stored.
+/// @return 0; not relied on
 KELM_SERVICES_EXPORT int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVertex* high);
 
 /// Walks the shapes. @param id -1 or a shape id. @return the first id for -1, else the id behind
@@ -79,5 +81,5 @@ KELM_SERVICES_EXPORT int ZARGetNext(ZARLayer_t* layer, int id);
 /// shape. @throw any exception, if this one shape cannot be delivered
 KELM_SERVICES_EXPORT ZARShape* ZARGetShapeRef(ZARLayer_t* layer, int id);
 
-/// @return the file that a layer belongs to
+/// @return the file that owns a layer
 KELM_SERVICES_EXPORT _iobuf* ZARLayer2fp(ZARLayer_t* layer);

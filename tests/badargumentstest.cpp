@@ -1,12 +1,9 @@
-#include "services/exception.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
+#include "tests/support/gdaltranscript.h"
 #include "tests/support/sheets.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
-
-#include <cpl_conv.h>
-#include <cpl_error.h>
 
 namespace kelm::tin::test {
 
@@ -14,37 +11,37 @@ constexpr double NaN = std::numeric_limits<double>::quiet_NaN();
 constexpr double FAR = std::numeric_limits<double>::max();
 using MapPoint = point2_t<double>;
 
-TEST(BadArguments, OfReadersAreRefused) {
-    const char* const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg";
+TEST(BadArgumentsTest, OfReadersAreRefused) {
+    kelm::test::GdalTranscript transcript;
+    transcript.moFolder = KELM_TIN_DATA_DIR;
+    const char *const good = KELM_TIN_DATA_DIR "/jacksboro.gpkg", *const none = nullptr;
     const auto open = [](const char* name, int layer, double scale = 1, int datum = 2002) {
         return std::unique_ptr<TinReader>(
             TinReaderFactory::CreateTinReader(name, layer, 0, scale, ogc::cs::DatumType(datum)));
     };
-    for (const char* name : {"", "/", "%s%n", "/dev/null", static_cast<const char*>(nullptr)})
-        EXPECT_THROW(open(name, 1), DataException);
-    EXPECT_THROW(open(good, 2), DataException);
-    EXPECT_THROW(open(good, 1, 0), ParameterException);
-    EXPECT_THROW(open(good, 1, 1, 3000), DataException);
-    const auto reader = open(good, -9); // the first layer
-    EXPECT_THROW(reader->SetOutputVerticalDatum(ogc::cs::DatumType(1000)), ParameterException);
-    EXPECT_THROW(ZARGetNext(nullptr, -1), ParameterException);
+    for (const auto& work : std::vector<std::function<void()>>{
+             [&] { open("", 1); }, [&] { open("%s%n", 1); }, [&] { open(none, 1); },
+             [&] { open(good, 2); }, [&] { open(good, 1, 0); }, [&] { open(good, 1, NaN); },
+             [&] { open(good, 1, -HUGE_VAL); }, [&] { open(good, 1, 1, 3000); },
+             [&] { ZARGetNext(nullptr, -1); }, [&] { ZAROpen(good, "r+"); },
+             [&] { ZAROpen(good, none); }, [&] { ZAROpen("", "r"); }, [&] { ZAROpen(none, "r"); }})
+        EXPECT_TRUE(transcript.Refuses(work));
     EXPECT_EQ(ZARSegNext(nullptr, 116, 0), 0);
     const auto window = MakeBox(MapPoint{NaN, FAR}, MapPoint{1, -FAR});
-    EXPECT_EQ(reader->Load(&window), nullptr);
+    EXPECT_EQ(open(good, -9)->Load(&window), nullptr); // the first layer
 }
 
-TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
+TEST(BadArgumentsTest, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
+    kelm::test::Transcript transcript;
     Mesh mesh;
     mesh.Add({0, 0, 1}, {8, 0, 2}, {0, 8, 3});
     const OpenTin tin = mesh.MakeTin(10, 20);
     Triangle t = *tin.GetTriangle(0);
-    Triangle_Id ids[1] = {};
     Point *const v = tin.GetVertex(0), *const hole[] = {v + 1, v, nullptr};
-    EXPECT_THROW(Tin(v, 3, static_cast<Triangle_Id*>(nullptr), 1, 0, 0), DataException);
-    EXPECT_THROW(Tin(nullptr, 3, ids, 1, 0, 0), DataException);
-    EXPECT_THROW(AabbTree{nullptr}, ParameterException);
-    EXPECT_THROW(Triangle{nullptr}, DataException);
-    EXPECT_THROW(t.SetVertices(hole), DataException);
+    for (const auto& work : std::vector<std::function<void()>>{
+             [] { AabbTree{nullptr}; }, [] { AabbTree().CreateTree(nullptr); },
+             [] { Triangle{nullptr}; }, [&] { t.SetVertices(hole); }})
+        EXPECT_TRUE(transcript.Refuses(work));
     EXPECT_TRUE(t.GetVertex(0) == v && tin.GetVertex(3) == nullptr && !tin.GetTriangle(~0U));
     const AabbTree tree(&tin), rootless, *const indices[] = {nullptr, &tree, &rootless};
     float h = UNTOUCHED;
@@ -63,36 +60,23 @@ TEST(BadArguments, OfSurfacesTreesAndTrianglesAreRefusedOrFindNothing) {
     EXPECT_EQ(t.GetGridPointsNum(9, 0) + t.GetGridPointsNum(-9, 9), 0U);
 }
 
-TEST(BadArguments, ARefusalTellsWhereAndWhatWasExpected) {
+TEST(BadArgumentsTest, ARefusalIsCopiedWholeAndATextForTheHostIsNoFormat) {
+    kelm::test::GdalTranscript transcript;
     ParameterException kept("", ParameterException::PT_Invalid, "", "", "", "", "", 0);
     DataException plain("", "", "", 0);
-    try {
-        AabbTree().CreateTree(nullptr);
-    } catch (const ParameterException& refusal) {
-        kept = refusal;
-        plain = refusal;
-    }
-    EXPECT_EQ(kept.GetParameter(), "poTin");
-    EXPECT_TRUE(kept.GetActual().empty() && kept.GetExpected().empty());
-    EXPECT_EQ(kept.GetType(), ParameterException::PT_Invalid);
-    EXPECT_EQ(plain.GetMessage(), "The TIN used to create AabbTree cannot be empty");
-    EXPECT_TRUE(plain.what() == kept.GetMessage() && plain.GetSourcePath() == "tin/aabbtree");
-    EXPECT_NE(DataException(plain).GetFunction().find("CreateTree"), std::string::npos);
-    EXPECT_GT(ParameterException(kept).GetLine(), 0U);
-}
-
-TEST(BadArguments, ATextForTheHostIsNoFormat) {
-    static std::string last;
+    const ParameterException refusal("p", ParameterException::PT_Invalid, "actual", "expected",
+                                     "message", "source", "function", 7);
+    kept = refusal;
+    plain = refusal;
+    transcript.Refuses([&] { throw ParameterException(kept); });
+    transcript.Refuses([&] { throw DataException(plain); });
+    EXPECT_TRUE(plain.GetFunction() == "function" && DataException(plain).GetLine() == 7);
     const std::string text = FormatString("%d %s%%s%%n", 7, std::string(20000, 'x').c_str());
     EXPECT_EQ(text, "7 " + std::string(20000, 'x') + "%s%n");
-    CPLPushErrorHandler([](CPLErr, int, const char* pszText) { last = pszText; });
-    CPLSetThreadLocalConfigOption("CPL_DEBUG", "TIN");
     tellus::Warning::Warn(text, "tin/tinreader", 12);
-    EXPECT_EQ(last, text + " (tin/tinreader:12)");
     tellus::Report::AddInfo(text);
-    EXPECT_EQ(last, "TIN: " + text);
-    CPLSetThreadLocalConfigOption("CPL_DEBUG", nullptr);
-    CPLPopErrorHandler();
+    EXPECT_EQ(transcript.Take(), "source: p=actual!expected: message\nsource: message\n" + text +
+                                     " (tin/tinreader)\nTIN: " + text + '\n');
 }
 
 } // namespace kelm::tin::test

@@ -29,10 +29,7 @@ void* BuildSearchAndDestroy(void* pKind) {
         tree.GetInfo()->SetDivisionType(eType);
         tree.SetCapacity(1);
         tree.CreateTree(&tin);
-        Indices all;
-        tree.FindLeaves(EVERYWHERE, all);
-        std::sort(all.begin(), all.end());
-        EXPECT_EQ(all, tin.GetAll());
+        EXPECT_EQ(GetAllLeaves(tree), tin.GetAll());
         float h = LOWEST, wanted = LOWEST;
         EXPECT_EQ(tin.GetHeight(2.0F, 2.0F, h, &tree), tin.GetHeight(2.0F, 2.0F, wanted, nullptr));
         EXPECT_EQ(h, wanted);

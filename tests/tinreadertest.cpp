@@ -1,11 +1,5 @@
-#include "tin/tinreader.h"
-#include "tests/support/layerwriter.h"
-#include "tests/support/temporaryfolder.h"
-#include "tin/tinreaderfactory.h"
+#include "tests/support/filetest.h"
 
-#include <gtest/gtest.h>
-
-#include <memory>
 #include <thread>
 
 using namespace kelm::ogc::cs;
@@ -14,8 +8,8 @@ using namespace kelm::tin;
 namespace {
 
 std::unique_ptr<Tin> LoadTerrain(DatumType eOutput) {
-    const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-        KELM_TIN_DATA_DIR "/jacksboro.gpkg", 0, 0.0, 1.0, VD_Orthometric));
+    const auto reader =
+        kelm::test::OpenReader(KELM_TIN_DATA_DIR "/jacksboro.gpkg", 0, VD_Orthometric);
     reader->SetOutputVerticalDatum(eOutput);
     return std::unique_ptr<Tin>(reader->Load(nullptr));
 }
@@ -33,20 +27,6 @@ TEST(TinReaderTest, TheTerrainIsTheSameOnEveryThreadAndChangesItsDatum) {
         ASSERT_TRUE(v.x == w.x && v.y == w.y && v.z == w.z) << i;
         ASSERT_NEAR(geoidal->GetVertex(i)->z - v.z, 30.6F, 0.5F) << "EGM96 of the place";
     }
-}
-
-TEST(TinReaderTest, ALayerWithoutACrsKeepsItsHeightsAndSaysSo) {
-    static std::string last;
-    const kelm::test::TemporaryFolder folder;
-    const std::string path = kelm::test::WriteLayer(
-        folder.GetPath("a.gpkg"), "GPKG", {{kelm::test::MakeTriangle(0, 0, 5)}, wkbPolygon25D, ""});
-    const std::unique_ptr<TinReader> reader(
-        TinReaderFactory::CreateTinReader(path.c_str(), 0, 0.0, 1.0, VD_Orthometric));
-    CPLPushErrorHandler([](CPLErr, int, const char* pszText) { last = pszText; });
-    reader->SetOutputVerticalDatum(VD_Ellipsoidal);
-    CPLPopErrorHandler();
-    EXPECT_EQ(last.find("The layer has a local CRS, or none: its heights are the same"), 0U);
-    EXPECT_EQ(std::unique_ptr<Tin>(reader->Load(nullptr))->GetVertex(0)->z, 5.0F);
 }
 
 } // namespace

@@ -54,12 +54,43 @@ std::size_t ExpectFound(const OpenTin& tin, const AabbTree& tree, const Point& a
     return CountMissing(byLine[1], touched) + CountMissing(byRegion[1], met);
 }
 
+constexpr double BASE_X = 500000.37, BASE_Y = 4649776.81;
+
+/// Compares a surface, asked in map coordinates, with triangles of another.
+void ExpectOnMap(const Tin& tin, const Tin& origin, const Indices& list, const Point& at) {
+    double x, y;
+    tin.GetXYBase(x, y);
+    BBox<double, point3_t<double>> box;
+    tin.GetRawBBox(box);
+    const auto &low = tin.GetBBox().min, &high = tin.GetBBox().max;
+    EXPECT_TRUE(x == BASE_X && y == BASE_Y && box.min.x == double(low.x) + x &&
+                box.min.y == double(low.y) + y && box.max.x == double(high.x) + x &&
+                box.max.y == double(high.y) + y && float(box.min.z) == low.z &&
+                float(box.max.z) == high.z);
+    const point3_t<double> a{x + double(at.x), y + double(at.y), 99}, b{a.x + 30, a.y, -99};
+    const Point p{float(a.x - x), float(a.y - y), 99}, q{float(b.x - x), float(b.y - y), -99};
+    float h, height = LOWEST, crossing = LOWEST, found = LOWEST;
+    for (const unsigned i : list) {
+        const Triangle& t = *origin.GetTriangle(i);
+        if (t.GetHeight(p.x, p.y, h) && h > height)
+            height = h;
+        if (t.IsIntersectedLine(p.x, p.y, q.x, q.y) &&
+            t.GetLineIntersectHeight(p, q, h) == IR_Inside && h > crossing)
+            crossing = h;
+    }
+    tin.GetHeight(a.x, a.y, found, nullptr);
+    EXPECT_EQ(found, height);
+    tin.GetLineIntersectHeight(a, b, found = LOWEST, nullptr);
+    EXPECT_EQ(found, crossing);
+}
+
 /// Compares a subset, and releases it, with the triangles of a list.
-void ExpectSubset(const Mesh& mesh, const Indices& list, const Tin* poSubset) {
+void ExpectSubset(const Mesh& mesh, const Tin& origin, const Indices& list, const Tin* poSubset) {
     const std::unique_ptr<const Tin> subset(poSubset);
     ASSERT_EQ(subset == nullptr, list.empty());
     if (list.empty())
         return;
+    ExpectOnMap(*subset, origin, list, *subset->GetVertex(0));
     std::set<unsigned> used;
     for (const unsigned i : list)
         used.insert({mesh.ids[i].id0, mesh.ids[i].id1, mesh.ids[i].id2});
@@ -74,7 +105,7 @@ void ExpectSubset(const Mesh& mesh, const Indices& list, const Tin* poSubset) {
     }
 }
 
-TEST(TinSearch, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
+TEST(TinSearchTest, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
     Random random;
     std::size_t missed = 0;
     for (const int nThreads : {1, 2, 8})
@@ -97,11 +128,18 @@ TEST(TinSearch, TreeAndScanFindWhatALoopFindsOnAnyNumberOfThreads) {
     EXPECT_LT(missed, 300U); // a box test may lose what ends at the rim of a box
 }
 
-TEST(TinSubset, RenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
+TEST(TinSubsetTest, OfCopiesTooRenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
     Random random;
     for (const Mesh& mesh : MakeMeshes(random))
         for (unsigned i = 0; i < 20; ++i) {
-            const OpenTin tin = mesh.MakeTin(500, -3);
+            OpenTin made = mesh.MakeTin(BASE_X, BASE_Y), assigned = Mesh(mesh).MakeTin();
+            const OpenTin copy(made), moved(std::move(made));
+            // A copy assignment does not release them.
+            const std::unique_ptr<const Point[]> vertices(assigned.GetVertex(0));
+            const std::unique_ptr<const Triangle[]> triangles(assigned.GetTriangle(0));
+            assigned = moved;
+            const OpenTin& tin = i % 4 == 0 ? copy : i % 4 == 1 ? moved : assigned;
+            ExpectOnMap(tin, tin, tin.GetAll(), *tin.GetVertex(i));
             const AabbTree tree(&tin), *const index = i % 2 == 0 ? &tree : nullptr;
             Indices list, selected, line, met;
             std::vector<unsigned char> mask;
@@ -110,27 +148,27 @@ TEST(TinSubset, RenumbersWhatIsListedMaskedOrFoundInMapCoordinates) {
                 mask.push_back(static_cast<unsigned char>(list[id] % 3));
                 selected.insert(selected.end(), mask[id] == 1, id);
             }
-            ExpectSubset(mesh, list, tin.Subset(list));
-            ExpectSubset(mesh, selected, tin.Subset(mask));
+            ExpectSubset(mesh, tin, list, tin.Subset(list));
+            ExpectSubset(mesh, tin, selected, tin.Subset(mask));
             std::vector<Point2> local;
             std::vector<point2_t<double>> map;
             for (unsigned k = 0; k < 2 + i % 5; ++k) { // whole, so that both frames hold them
                 const unsigned x = random.Below(120), y = random.Below(120);
                 local.push_back({static_cast<float>(x), static_cast<float>(y)});
-                map.push_back({x + 500.0, y - 3.0});
+                map.push_back({BASE_X + x, BASE_Y + y});
                 if (k > 0) // a scan appends
                     tin.FindTrianglesByLine(local[k - 1], local[k], line, nullptr);
             }
             const std::set<unsigned> once(line.begin(), line.end());
-            ExpectSubset(mesh, {once.begin(), once.end()},
+            ExpectSubset(mesh, tin, {once.begin(), once.end()},
                          tin.SubsetByLineString(map.data(), 2 + i % 5, index));
             tin.FindTrianglesByRegion(MakeBox(local[0], local[1]), met, index);
-            ExpectSubset(mesh, met, tin.SubsetByRegion(MakeBox(map[0], map[1]), index));
+            ExpectSubset(mesh, tin, met, tin.SubsetByRegion(MakeBox(map[0], map[1]), index));
         }
 }
 
 // Leaks and double releases show under the address sanitizer.
-TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
+TEST(TinTest, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     Point vertices[3] = {{1, 2, 3}, {4, 5, 6}, {7, 9, 9}};
     Triangle triangle;
     for (const unsigned n : {0U, 1U}) {
@@ -142,11 +180,11 @@ TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     Mesh mesh;
     mesh.Add({3, 7, NOT_A_NUMBER}, {NOT_A_NUMBER, 2, -3}, {1.5F, NOT_A_NUMBER, 8});
     mesh.vertices.push_back({2, 50, 4}); // no triangle uses it
-    OpenTin tin = mesh.MakeTin(100000000.25, -0.5), copy(tin);
+    OpenTin tin = mesh.MakeTin(BASE_X, BASE_Y), copy(tin);
     BBox<double, point3_t<double>> box;
     tin.GetRawBBox(box);
-    EXPECT_TRUE(box.min.x == 100000001.75 && box.min.y == 1.5 && box.min.z == -3);
-    EXPECT_TRUE(box.max.x == 100000003.25 && box.max.y == 49.5 && box.max.z == 8);
+    EXPECT_TRUE(box.min.x == BASE_X + 1.5 && box.min.y == BASE_Y + 2 && box.min.z == -3);
+    EXPECT_TRUE(box.max.x == BASE_X + 3 && box.max.y == BASE_Y + 50 && box.max.z == 8);
     float low, high;
     tin.SetHeightRange(4, -4);
     tin.GetHeightRange(low, high);
@@ -155,9 +193,6 @@ TEST(Tin, OwnsItsArraysUnlessACountIsZeroOrItIsACopy) {
     EXPECT_TRUE(low == 4 && high == -4 && tin.GetTriangle(0)->GetBBox().min.x == -9);
     tin = copy; // goes on owning
     EXPECT_TRUE(copy.GetVertex(3) == tin.GetVertex(3) && tin.GetObjBytes() == 4 * 12 + 48 + 88);
-    const auto kept = std::make_unique<OpenTin>(mesh.MakeTin()); // a temporary hands them on
-    tin = mesh.MakeTin();
-    EXPECT_TRUE(tin.GetVertex(3)->y == 50 && kept->GetVertex(3)->y == 50);
 }
 
 } // namespace

@@ -18,7 +18,7 @@ struct NodeBlock;
 
 /// Side of a triangle at a split.
 enum DivisionSide : int {
-    DS_Left = 0, ///< the centre is at or beyond the triangle's centroid
+    DS_Left = 0, ///< the triangle's centroid is at or below the split
     DS_Right = 1 ///< every other case, NaN included
 };
 
@@ -67,10 +67,10 @@ class KELM_TIN_EXPORT AabbTreeInfo {
 /// or it is a leaf with a list of triangle indices, ascending.
 ///
 /// Boxes and positions are surface-local `float`. Every node owns its list. The node on which
-/// CreateChild ran is the top; it owns all nodes below it, and no other node owns any.
+/// CreateChild ran is the top; it owns all nodes below it.
 ///
-/// A copy has a list of its own and the same children. A copy of a top owns the nodes below as the
-/// top itself does, so only one of the two may be destroyed. A copy of a node below the top owns no
+/// A copy has a list of its own and the same children. If a top is copied, both own the nodes
+/// below, so only one of the two may be destroyed. A copy of a node below the top owns no
 /// node. It may be destroyed at any time; its children may not be used after the top is gone. A
 /// move exchanges the contents of both nodes.
 ///
@@ -90,8 +90,8 @@ class KELM_TIN_EXPORT AabbNode {
     /// `list`. Nodes are built depth first, left before right.
     ///
     /// A node of more triangles than the tree's capacity is divided at the mean of the centroids.
-    /// A set that cannot be divided on either axis becomes one leaf. A note says so, and the
-    /// tree's capacity rises to its size for all nodes built afterwards.
+    /// A set that cannot be divided on either axis becomes one leaf. A note says so. The size of
+    /// that set is the tree's capacity for all nodes built afterwards.
     /// @param triangles the surface's array; boxes are read as stored @param list ascending
     /// indices into it @param tree the tree that holds this node
     /// @throw std::bad_alloc; what was built so far stays linked and is released with this node
@@ -106,7 +106,7 @@ class KELM_TIN_EXPORT AabbNode {
     /// point2_t<float> and point3_t<float>.
     template <typename P>
     void FindLeavesByLine(const P& a, const P& b, std::vector<unsigned>& out) const;
-    /// Appends this node's own list, whatever the position or box.
+    /// Appends this node's own list. The position and the box are not used.
     void AddLeaves(std::vector<unsigned>& list, float x, float y) const;
     void AddLeaves(std::vector<unsigned>& list, const BBox<float, point2_t<float>>& box) const;
 

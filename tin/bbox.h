@@ -5,9 +5,9 @@
 
 namespace kelm::tin {
 
-/// Axis-aligned box that objects own. `min` holds the lowest value on every axis, `max` the
-/// highest; nothing orders them, and an inverted box is not an error. There is no empty state: a
-/// default box is the point at the origin.
+/// Axis-aligned box. `min` holds the lowest value on every axis, `max` the highest. Nothing puts
+/// them in order, and an inverted box is not an error. There is no empty state: a default box is
+/// the point at the origin.
 ///
 /// Exactly four instances exist, all made in the library.
 template <typename T, typename P>
@@ -27,8 +27,8 @@ extern template class KELM_TIN_EXPORT BBox<float, point3_t<float>>;
 extern template class KELM_TIN_EXPORT BBox<double, point2_t<double>>;
 extern template class KELM_TIN_EXPORT BBox<double, point3_t<double>>;
 
-/// True if the position lies in the box in plan, its edges included. A NaN is nowhere: each
-/// comparison is written so that a NaN fails it. The rule of every point test of the system.
+/// True if the position lies in the box in plan, its edges included. A NaN is not in any box: each
+/// comparison is written so that a NaN fails it. All tests of a point in a box use this one.
 template <typename T, typename P>
 inline bool TestInside(const BBox<T, P>& box, T x, T y) {
     return x >= box.min.x && box.max.x >= x && y >= box.min.y && box.max.y >= y;

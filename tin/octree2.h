@@ -13,8 +13,8 @@ namespace kelm::tin {
 /// A tree is made whole by its constructor and is then only searched.
 class KELM_TIN_EXPORT Octree2 : public containers::OctoTree<double, unsigned> {
   public:
-    /// Inserts all points in order. @param points not empty; not changed @param keys one key a
-    /// point; on return 1 for a point that is held and 0 for one that was dropped
+    /// Inserts all points in order. @param points not empty; not changed @param keys at the call
+    /// the key of each point; on return 1 if the point is held and 0 if it was dropped
     /// @throw std::bad_alloc
     Octree2(std::vector<containers::KeyPoint<double>>& points, std::vector<unsigned>& keys);
 

@@ -36,9 +36,9 @@ class Ray2 {
 
 namespace detail {
 
-/// Narrows the interval of a segment to one slab; false once it is empty. Both comparisons are
-/// plain greater-than tests: a NaN, which an end on the slab's side along a zero direction gives,
-/// must leave the interval open.
+/// Narrows the interval of a segment to one slab; false once it is empty. If the direction is 0 and
+/// the origin lies on a side, the product is NaN. Both comparisons are plain greater-than tests, so
+/// that a NaN does not shrink the interval.
 template <typename T>
 inline bool ClipToSlab(T low, T high, T origin, T dirInv, int sign, T& tMin, T& tMax) {
     const T tNear = ((sign == 1 ? high : low) - origin) * dirInv;

@@ -90,15 +90,14 @@ Tin& Tin::operator=(const Tin& other) {
     return *this;
 }
 
-Tin::Tin(Tin&& other) noexcept : Tin(static_cast<const Tin&>(other)) {
-    mbOwnsArrays = std::exchange(other.mbOwnsArrays, false);
+Tin::Tin(Tin&& other) noexcept {
+    *this = std::move(other);
 }
 
 Tin& Tin::operator=(Tin&& other) noexcept {
     if (&other == this)
         return *this;
-    const bool isShared = mpoTriangles == other.mpoTriangles;
-    if (!isShared)
+    if (mpoTriangles != other.mpoTriangles)
         Release();
     *this = static_cast<const Tin&>(other);
     mbOwnsArrays = std::exchange(other.mbOwnsArrays, false) || mbOwnsArrays;

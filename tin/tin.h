@@ -20,9 +20,9 @@ class AabbTree;
 /// plus the base's x; the same holds for y. Heights have no base. A surface knows no file, no datum
 /// and no index. To make its queries fast, build an AabbTree over it and pass it along.
 ///
-/// A surface is empty, with both arrays null, or has vertices and triangles; this never changes. It
-/// owns both arrays, which must come from the array form of new. What its accessors hand out stays
-/// its own.
+/// A surface is empty, with both arrays null, or has vertices and triangles. Only an assignment or
+/// a move changes which arrays it has. A surface made from arrays owns them; they must come from
+/// the array form of new. What its accessors hand out stays its own.
 ///
 /// A copy refers to the same arrays but does not own them. Do not use it after the owner is gone. A
 /// move hands the ownership on; the source still refers to the arrays, as a copy does.
@@ -48,8 +48,8 @@ class KELM_TIN_EXPORT Tin {
     /// The copy owns nothing.
     Tin(const Tin& other);
     /// Copies as the constructor does. Arrays that the target owned are not released: take their
-    /// addresses before, and delete them, or move another surface into the target instead. The
-    /// target goes on owning arrays that `other` refers to as well.
+    /// addresses before, and delete them, or move another surface into the target instead. If both
+    /// refer to the same arrays and the target owned them, it still does.
     Tin& operator=(const Tin& other);
     /// Takes over what the other owns.
     Tin(Tin&& other) noexcept;
@@ -99,7 +99,7 @@ class KELM_TIN_EXPORT Tin {
     /// The highest crossing of the segment from a to b with the surface, as the segment's own
     /// height there.
     /// @param h untouched if the segment misses the surface's box in plan; the lowest finite
-    /// `float` if it meets the box but crosses no triangle. It may be a coordinate of a or b
+    /// `float` if it meets the box but crosses no triangle. `h` may refer to a coordinate of a or b
     /// @return is there a crossing?
     bool GetLineIntersectHeight(const point3_t<float>& a, const point3_t<float>& b, float& h,
                                 const AabbTree* tree) const;
@@ -110,12 +110,13 @@ class KELM_TIN_EXPORT Tin {
     /// caller deletes it. It shares nothing with this one. Without an index it takes the triangles
     /// of which an edge meets the region, in ascending order. With one it takes all triangles of
     /// each leaf whose box meets the region, in tree order.
-    /// @return null if there is none. A NaN bound leaves its side open without an index, and meets
-    /// no box of one
+    /// @return null if there is none. Without an index a NaN bound leaves its side open. With one
+    /// it meets no box
     Tin* SubsetByRegion(const BBox<float, point2_t<float>>& region, const AabbTree* tree) const;
     Tin* SubsetByRegion(const BBox<double, point2_t<double>>& region, const AabbTree* tree) const;
     /// The same for the triangles that the segments between consecutive points touch in plan, in
-    /// ascending order with an index and without.
+    /// ascending order with an index and without. With one, a segment that grazes a box of the
+    /// index within rounding can miss triangles in it.
     /// @param points count points; fewer than two, or null, select nothing
     Tin* SubsetByLineString(const point2_t<float>* points, unsigned count,
                             const AabbTree* tree) const;
@@ -131,8 +132,8 @@ class KELM_TIN_EXPORT Tin {
               unsigned triangleCount);
 
     /// Triangles that hold a position, surface-local. Without a tree they are ascending and
-    /// appended to `result`. With one they are in tree order, and entries that stood in `result`
-    /// are put to the same test.
+    /// appended to `result`. With one they are in tree order, and earlier entries of `result` that
+    /// do not hold the position are removed.
     void FindTrianglesByPoint(const float& x, const float& y, std::vector<unsigned>& result,
                               const AabbTree* tree) const;
     /// Triangles of a region, surface-local, as SubsetByRegion tells; appended to `result`.
@@ -145,8 +146,9 @@ class KELM_TIN_EXPORT Tin {
     void FindTrianglesByLine(const P& a, const P& b, std::vector<unsigned>& out,
                              const AabbTree* tree) const;
 
-    /// A new surface of the triangles whose byte in the mask is 1, as SubsetByRegion gives it. A
-    /// mask of another length than the triangles selects by what it has.
+    /// A new surface of the triangles whose byte in the mask is 1, as SubsetByRegion gives it. In a
+    /// mask that is too short the missing bytes count as 0; in one that is too long the rest is
+    /// ignored.
     Tin* Subset(const std::vector<unsigned char>& mask) const;
     /// A new surface of the listed triangles, in list order, repeats included. Vertices keep the
     /// order they have here. @return null if the list is empty

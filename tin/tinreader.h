@@ -38,8 +38,8 @@ class KELM_TIN_EXPORT TinReader {
     using DatumType = ogc::cs::DatumType;
 
     /// Usually called by TinReaderFactory::CreateTinReader.
-    /// @param poLayer taken over, with its file, unless the constructor throws. A reader on null
-    /// loads nothing @param dfOffset,dfScale elevation factor: a stored height h counts as
+    /// @param poLayer taken over, with its file, unless the constructor throws. If it is null, the
+    /// reader loads nothing @param dfOffset,dfScale elevation factor: a stored height h counts as
     /// (h + dfOffset) * dfScale; both finite @param eSourceDatum vertical datum of the stored
     /// heights, and the first output datum
     /// @throw kelm::ParameterException if dfScale is zero, the datum is not a vertical one or the
@@ -56,9 +56,8 @@ class KELM_TIN_EXPORT TinReader {
     ///
     /// A shape of four vertices is a triangle as it stands. A larger one is cut into triangles, or
     /// left out with a warning that names it. Corners that agree within 1e-9 map units on all three
-    /// axes become one vertex. A polygon that meets the window enters whole. A corner that is not
-    /// finite is never welded; nor are corners so far out that a `double` no longer resolves 1
-    /// unit.
+    /// axes become one vertex. A shape that meets the window enters whole. A corner that is not
+    /// finite is never welded. Different corners beyond 2^53 map units may stay apart.
     /// @param poWindow in the map coordinates of the layer; null for the whole layer
     /// @return a new surface, which the caller deletes; null if no polygon gave a triangle
     /// @throw kelm::DataException for a shape of fewer than four vertices or heights that cannot be
@@ -70,8 +69,8 @@ class KELM_TIN_EXPORT TinReader {
     /// Chooses the vertical datum in which later loads deliver heights. Heights of a local CRS are
     /// never transformed, whatever the datums; a warning says so.
     /// @throw kelm::ParameterException if the code is not in 2000 to 2999, or if just one of source
-    /// and output is VD_Other; what the reference services throw, for one if the grid of the datum
-    /// is not installed. The reader then keeps its former output datum
+    /// and output is VD_Other; what the reference services throw, for example if a grid file is not
+    /// installed. The reader then keeps its former output datum
     void SetOutputVerticalDatum(DatumType eType);
 
     /// @return number of shapes of the layer
@@ -124,8 +123,8 @@ class KELM_TIN_EXPORT TinReader {
     /// Sends a grid over the window through the transform and interpolates each vertex in it.
     bool HeightConvertManyPoints(const aabb_t<point2_t<float>>* poWindow, point3_t<float>* poPoints,
                                  unsigned int nCount) const;
-    /// Lays out a new grid over the window, its nodes 100 map units apart, and fills it with
-    /// heights in the output datum.
+    /// Lays out a new grid over the window, with a spacing of 100 map units within the limits of
+    /// InterpGrid3D, and fills it with heights in the output datum.
     void BuildInterpGridForWindow(const aabb_t<point2_t<float>>* poWindow, float fZMin, float fZMax,
                                   InterpGrid3D& oGrid) const;
 

@@ -6,6 +6,7 @@
 #include "tin/load/shapecount.h"
 #include "tin/tinreader.h"
 
+#include <cmath>
 #include <exception>
 #include <memory>
 
@@ -21,16 +22,34 @@ using OpenFile = std::unique_ptr<_iobuf, FileCloser>;
 #define THROW_DATA_EXCEPTION(text)                                                                 \
     throw DataException(text, "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__)
 
-/// The message is the same whatever went wrong; the store's own reason goes to the report.
+/// The message is the same whatever went wrong; the exception of the store is nested in it. To be
+/// called where that exception is being handled.
+[[noreturn]] void ThrowUnsupported(const char* pszFilename) {
+    std::throw_with_nested(
+        DataException(FormatString("The format of file %s is not supported by ZAR", pszFilename),
+                      "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__));
+}
+
 _iobuf* Open(const char* pszFilename) {
     try {
         return ZAROpen(pszFilename, "r");
     } catch (const std::exception& reason) {
         tellus::Report::AddInfo(reason.what());
+        ThrowUnsupported(pszFilename);
     } catch (...) {
+        ThrowUnsupported(pszFilename);
     }
-    THROW_DATA_EXCEPTION(
-        FormatString("The format of file %s is not supported by ZAR", pszFilename));
+}
+
+/// A height of such a factor would be none, and no later step could tell.
+void TestFinite(const char* parameter, double value) {
+    if (!std::isfinite(value))
+        throw ParameterException(parameter, ParameterException::PT_Invalid,
+                                 FormatString("%g", value), "a finite number",
+                                 FormatString("The elevation factor's %s must be a finite number, "
+                                              "but is %g",
+                                              parameter, value),
+                                 "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__);
 }
 
 } // namespace
@@ -58,6 +77,8 @@ TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int 
         THROW_DATA_EXCEPTION(
             FormatString("The provided vector layer %d in the input file %s is empty.", layerNumber,
                          pszFilename));
+    TestFinite("dfOffset", dfOffset);
+    TestFinite("dfScale", dfScale);
     auto reader = std::make_unique<TinReader>(layer, dfOffset, dfScale, eSourceDatum);
     // The reader closes the file by way of its layer.
     static_cast<void>(file.release());

@@ -19,7 +19,7 @@ namespace rules {
 class Barycentric;
 }
 
-/// Selects a coordinate by its index among the components of a vertex.
+/// Axis of a vertex in plan.
 enum Axis : int { AX_X = 0, AX_Y = 1 };
 
 /// Triangle of a surface: three vertices by reference, and their box in plan.
@@ -97,18 +97,19 @@ class KELM_TIN_EXPORT Triangle {
     /// @param cols,rows size of the grid; nothing is listed if one is below 1
     /// @param points column and row of each cell are appended
     /// @param heights one height a cell is appended
-    /// @return half the size of `points`, earlier entries included; 0 if the triangle covers no
-    /// range of the grid; 4294967295 if the number is greater
+    /// @return the number of cells in `points`, earlier ones included; 0 if the box of the triangle
+    /// lies outside the grid, whatever `points` holds; 4294967295 if the number is greater
     /// @throw std::bad_alloc, and both lists are then as they were
     unsigned GetGridPoints(int cols, int rows, std::vector<int>& points,
                            std::vector<float>& heights) const;
-    /// Writes column and row of each cell between the two edges of every row, unconfirmed: ends of
-    /// a run that the inside test would refuse are included. Same frame and rules as GetGridPoints.
+    /// Writes column and row of each cell between the two edges of every row, without the inside
+    /// test: cells at both ends of a row may lie outside the triangle. Same frame and rules as
+    /// GetGridPoints.
     /// @param points room for 2 * GetGridPointsNum(cols, rows) values
     /// @return the number of cells written
     unsigned GetGridPointsCR(int* points, int cols, int rows) const;
-    /// @return the number of cells that GetGridPointsCR writes for the same grid. Both end at
-    /// 4294967295 cells: the cells behind are left out
+    /// @return the number of cells that GetGridPointsCR writes for the same grid. Both stop after
+    /// 4294967295 cells
     unsigned GetGridPointsNum(int cols, int rows) const;
 
   protected:

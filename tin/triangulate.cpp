@@ -1,19 +1,13 @@
 #include "tin/triangulate.h"
 
-#include "tin/rings/earcutter.h"
-#include "tin/rings/smallring.h"
+#include "services/rings/cutting/earclipping.h"
 
 int Triangulate(const kelm::tin::Polygon<double>& oPolygon, std::vector<Triangle_Id>& oTriangles) {
-    using namespace kelm::tin::rings;
-    const Point* const points = oPolygon.GetPoints();
-    const unsigned count = oPolygon.GetPointCount();
-    if (!oPolygon.IsSimple() || count < 3)
+    if (!oPolygon.IsSimple() || oPolygon.GetPointCount() < 3)
         return -1;
-    const bool isForward = oPolygon.GetSignedArea() > 0.0;
-    const bool isCut = count <= SmallRing::MOST_CORNERS
-                           ? SmallRing(points, count, isForward).Cut(oTriangles)
-                           : EarCutter(points, count, isForward).Cut(oTriangles);
-    if (!isCut)
-        oTriangles.clear();
-    return isCut ? 0 : -1;
+    const auto clip = [&](unsigned u, unsigned v, unsigned w) { oTriangles.push_back({u, v, w}); };
+    if (kelm::rings::ClipEars(oPolygon.GetPoints(), oPolygon.GetPointCount(), clip))
+        return 0;
+    oTriangles.clear();
+    return -1;
 }

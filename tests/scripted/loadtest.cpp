@@ -1,4 +1,3 @@
-#include "services/exception.h"
 #include "services/interpgrid3d.h"
 #include "tests/scripted/readerfixture.h"
 
@@ -38,11 +37,32 @@ TEST_F(ReaderTest, WhatCannotBeUsedIsLeftOutAndTheReaderLoadsOn) {
     const Reader reader = Open();
     script.shapes.push_back({{}, {}, {}});
     for (int i = 0; i < 2; ++i) // a lock left behind would stop the second
-        EXPECT_THROW(Load(*reader), kelm::DataException);
+        EXPECT_TRUE(transcript.Refuses([&] { Load(*reader); }));
     script.shapes = {{{}}, {}, {{0, 0, 0}, {9, 9, 0}, {9, 0, 0}, {0, 9, 0}, {}}, script.shapes[0]};
     EXPECT_EQ(Load(*reader)->GetTriangleCount(), 1U);
     script.shapes.pop_back();
     EXPECT_EQ(Load(*reader), nullptr);
+}
+
+TEST_F(ReaderTest, AWindowLoadsTheSameTrianglesWithABaseOfTheirOwn) {
+    script.shapes = CreateStrip(1200, 50);
+    for (Ring& ring : script.shapes)
+        for (ZARVertex& vertex : ring)
+            vertex = {vertex.x + 0.12, vertex.y + 49776.31, vertex.z};
+    const Reader reader = Open();
+    const Window window(500100, 4600000, 500900, 4700000);
+    const Surface whole = Load(*reader), part = Load(*reader, &window);
+    ASSERT_NE(part, nullptr);
+    const ZARVertex& base = script.shapes[25][0]; // the first that meets the window
+    kelm::tin::BBox<double, point3_t<double>> box;
+    part->GetRawBBox(box);
+    EXPECT_TRUE(box.min.x == base.x && box.min.y == base.y - 40 && box.max.y == base.y);
+    for (double at = 500105; at < 500890; at += 1.7) {
+        float height = -1, expected = -2;
+        EXPECT_TRUE(whole->GetHeight(at, base.y - 20, expected, nullptr));
+        EXPECT_TRUE(part->GetHeight(at, base.y - 20, height, nullptr));
+        EXPECT_NEAR(height, expected, 1e-3);
+    }
 }
 
 TEST_F(ReaderTest, OfEachRunOfRepeatsTheFirstVertexGivesTheHeight) {
@@ -61,6 +81,15 @@ TEST_F(ReaderTest, AWildCornerSpoilsNeitherTheWeldingNorTheBase) {
     EXPECT_EQ(welded->GetVertexCount(), 4U);
     for (const int corner : {1, 2})
         EXPECT_EQ(welded->GetTriangle(0)->GetVertex(corner), welded->GetVertex(0));
+    const double side = 0.63 / 1048576; // of a cell of the hash: both corners next to it are one
+    for (const ZARVertex& far : {ZARVertex{1, 0, 0}, {0, 1, 0}, {0, 0, 1}})
+        for (const double low : {side - 5e-11, side + 8.5e-10}) {
+            const double high = 2 * side + 8e-10 - low;
+            script.shapes = {
+                Close({{low * far.x, low * far.y, low * far.z}, {7, 0, 1}, {0, 7, 2}}),
+                Close({{high * far.x, high * far.y, high * far.z}, {8, 0, 1}, {0, 9, 2}})};
+            EXPECT_EQ(Load(*Open())->GetVertexCount(), 5U);
+        }
     script.shapes = {Close({{7, HUGE_VAL, 3}, {100, 200, NaN}, {103, 201, 5}})};
     EXPECT_EQ(Load(*Open())->GetVertex(2)->x, 3.0F);
 }

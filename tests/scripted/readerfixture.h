@@ -1,13 +1,11 @@
 #pragma once
 
+#include "tests/digest/digest.h"
 #include "tests/support/scriptedservices.h"
+#include "tests/support/transcript.h"
 #include "tin/aabbtree.h"
 #include "tin/tinreader.h"
 #include "tin/tinreaderfactory.h"
-
-#include <gtest/gtest.h>
-
-#include <memory>
 
 using kelm::ogc::cs::DatumType;
 using kelm::tin::AabbTree;
@@ -85,7 +83,11 @@ struct Opened : kelm::tin::Tin {
 
 /// A script with one triangle, whose first height is 5.
 struct ReaderTest : testing::Test {
-    ReaderTest() { script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})}; }
+    ReaderTest() {
+        script.shapes = {Close({{10, 20, 5}, {14, 20, 6}, {10, 23, 7}})};
+        Recording::poTranscript = &transcript.moLines;
+    }
+    ~ReaderTest() override { Recording::poTranscript = nullptr; }
 
     static Reader Open(double offset = 0.0, double scale = 1.0, int source = 2002) {
         return Reader(kelm::tin::TinReaderFactory::CreateTinReader("some.file", 0, offset, scale,
@@ -96,4 +98,5 @@ struct ReaderTest : testing::Test {
     }
 
     scripted::Script script;
+    kelm::test::Transcript transcript;
 };

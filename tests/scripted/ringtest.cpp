@@ -1,7 +1,6 @@
+#include "services/rings/cutting/earclipping.h"
+#include "services/rings/cutting/simplering.h"
 #include "tests/support/allocationcounter.h"
-#include "tin/rings/earcutter.h"
-#include "tin/rings/simplering.h"
-#include "tin/rings/smallring.h"
 #include "tin/triangulate.h"
 
 #include <gtest/gtest.h>
@@ -12,7 +11,7 @@
 
 namespace {
 
-using kelm::tin::rings::Point;
+using kelm::rings::Point;
 using Ring = std::vector<Point>;
 using Corners = std::vector<std::array<unsigned, 3>>;
 
@@ -63,13 +62,15 @@ bool Cut(const Ring& p, bool isForward, Corners& rCorners) {
     return true;
 }
 
-template <typename Cutter>
-bool CutBy(const Ring& ring, bool isForward, Corners& rCorners) {
-    std::vector<Triangle_Id> ids;
-    const bool isCut = Cutter(ring.data(), static_cast<unsigned>(ring.size()), isForward).Cut(ids);
-    for (const Triangle_Id& id : ids)
-        rCorners.push_back({id.id0, id.id1, id.id2});
-    return isCut;
+/// By one of the library's ways. @param steps of the index before it gives way; -1 for no index
+bool CutBy(int steps, const Ring& ring, bool isForward, Corners& rCorners) {
+    const auto count = static_cast<unsigned>(ring.size());
+    const kelm::rings::CounterClockwise<Point> corners{ring.data(), count, isForward};
+    const auto clip = [&](unsigned u, unsigned v, unsigned w) {
+        rCorners.push_back({corners.GetPoint(u), corners.GetPoint(v), corners.GetPoint(w)});
+    };
+    return steps < 0 ? ClipSmallRing(corners, clip)
+                     : ClipLargeRing(corners, kelm::rings::StepLimit(steps), clip);
 }
 
 struct RingTest : testing::Test {
@@ -156,16 +157,19 @@ TEST_F(RingTest, AnIndexChangesNoVerdictAndNoTriangle) {
         const auto count = static_cast<unsigned>(ring.size());
         const bool isSimple = TestSimple(ring);
         simple[kind] += isSimple;
-        ASSERT_EQ(kelm::tin::rings::TestSimpleByIndex(ring.data(), count), isSimple) << i;
-        ASSERT_EQ(kelm::tin::rings::TestSimpleByPairs(ring.data(), count), isSimple) << i;
+        ASSERT_EQ(kelm::rings::IsSimpleByPairs(ring.data(), count), isSimple) << i;
+        for (const int steps : {0, 1 << 30})
+            ASSERT_EQ(IsSimpleByIndex(ring.data(), count, kelm::rings::StepLimit(steps)), isSimple)
+                << i;
         for (const bool isForward : {false, true}) {
-            Corners expected, small, large;
+            Corners expected;
             const bool isCut = Cut(ring, isForward, expected);
             cut[kind] += isCut;
-            ASSERT_EQ(CutBy<kelm::tin::rings::SmallRing>(ring, isForward, small), isCut) << i;
-            ASSERT_EQ(small, expected) << i;
-            ASSERT_EQ(CutBy<kelm::tin::rings::EarCutter>(ring, isForward, large), isCut) << i;
-            ASSERT_EQ(large, expected) << i;
+            for (const int steps : {-1, int(Below(200)), 1 << 30}) {
+                Corners corners;
+                ASSERT_EQ(CutBy(steps, ring, isForward, corners), isCut) << i << ' ' << steps;
+                ASSERT_EQ(corners, expected) << i << ' ' << steps;
+            }
         }
     }
     for (unsigned kind = 0; kind < 5; ++kind) {

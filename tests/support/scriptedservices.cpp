@@ -61,7 +61,7 @@ int ZARGetProjectionInfo(ZARLayer_t*, ProjInfo_t*) {
     return Call(), -1;
 }
 int ZARGetExtents(ZARLayer_t*, ZARVertex* low, ZARVertex* high) {
-    return Call(), *low = {-1e6, -1e6, -3}, *high = {1e7 - 1e6, 1e6, 9}, -1;
+    return Call(), *low = {-1e6, -1e6, -3}, *high = {1e6, 9e6, 9}, -1;
 }
 int ZARGetNext(ZARLayer_t*, int id) {
     const int next = id == -1 ? 100 : id + 10;

@@ -53,6 +53,15 @@ struct OpenTin : Tin {
     }
 };
 
+using Corners = std::vector<Point>;
+
+struct OwnTriangle : Triangle {
+    explicit OwnTriangle(const Corners& v) : corners(v) {
+        SetVertices(&corners[0], &corners[1], &corners[2]);
+    }
+    Corners corners;
+};
+
 struct Mesh {
     std::vector<Point> vertices;
     std::vector<Triangle_Id> ids;
@@ -71,6 +80,15 @@ struct Mesh {
                        static_cast<unsigned>(ids.size()), dfXBase, dfYBase);
     }
 };
+
+/// @return the sorted triangles of a tree or node
+template <typename T>
+Indices GetAllLeaves(const T& tree) {
+    Indices all;
+    tree.FindLeaves(EVERYWHERE, all);
+    std::sort(all.begin(), all.end());
+    return all;
+}
 
 /// 23 by 23 squares of 10 by 10, work for a team of threads; each node moves by up to fJitter.
 inline Mesh MakeSheet(float fJitter, Random& random) {

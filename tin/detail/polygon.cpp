@@ -2,43 +2,14 @@
 
 #include "services/exception.h"
 #include "services/reporting.h"
+#include "services/rings/cutting/simplering.h"
 #include "tin/ray2.h"
-#include "tin/rings/simplering.h"
 #include "tin/rules/extent.h"
 
 #include <algorithm>
+#include <iterator>
 
 namespace kelm::tin {
-
-namespace {
-
-/// Points that differ by less than this on both axes, in map units, are one.
-template <typename T>
-constexpr T REPEAT_TOLERANCE = T(1e-9);
-
-template <typename V>
-bool IsRepeat(const V& point, const V& predecessor) {
-    const auto dx = point.x - predecessor.x;
-    const auto dy = point.y - predecessor.y;
-    constexpr auto tolerance = REPEAT_TOLERANCE<decltype(point.x + dx)>;
-    return dx > -tolerance && tolerance > dx && dy > -tolerance && tolerance > dy;
-}
-
-/// Calls keep(i) for each point that is no repeat. A point is compared with its immediate
-/// predecessor, kept or not, so that a chain of close points collapses to its first one.
-template <typename V, typename Keep>
-void VisitKept(const V* points, unsigned count, const Keep& keep) {
-    keep(0U);
-    V predecessor = points[0];
-    for (unsigned i = 1; i < count; ++i) {
-        const V point = points[i];
-        if (!IsRepeat(point, predecessor))
-            keep(i);
-        predecessor = point;
-    }
-}
-
-} // namespace
 
 template <typename T>
 Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
@@ -47,7 +18,7 @@ Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
         throw DataException(FormatString("%d points could not forma polygon", vertices),
                             "tin/detail/polygon", __PRETTY_FUNCTION__, __LINE__);
     mnPoints = static_cast<unsigned>(vertices) - 1U;
-    mpoPoints = mnPoints <= MOST_NEAR_POINTS ? moNearPoints : new point2_t<T>[mnPoints];
+    mpoPoints = mnPoints <= std::size(moNearPoints) ? moNearPoints : new point2_t<T>[mnPoints];
     for (unsigned i = 0; i < mnPoints; ++i)
         mpoPoints[i] = {poShape->vertices[i].x, poShape->vertices[i].y};
     ComputeBBox();
@@ -85,24 +56,18 @@ void Polygon<T>::SetOrient(PolygonOrient eOrient) {
 template <typename T>
 void Polygon<T>::RemoveRepeatedPoints() {
     unsigned kept = 0;
-    VisitKept(mpoPoints, mnPoints, [&](unsigned i) { mpoPoints[kept++] = mpoPoints[i]; });
+    rings::VisitKept(mpoPoints, mnPoints, [&](unsigned i) { mpoPoints[kept++] = mpoPoints[i]; });
     mnPoints = kept;
 }
 
 template <typename T>
 T Polygon<T>::GetSignedArea() const {
-    T sum = T(0);
-    for (unsigned i = 0; i < mnPoints; ++i) {
-        const point2_t<T>& p = mpoPoints[i];
-        const point2_t<T>& q = mpoPoints[i + 1 == mnPoints ? 0 : i + 1];
-        sum += p.x * q.y - p.y * q.x;
-    }
-    return sum * T(0.5);
+    return rings::ComputeSignedArea<T>(mpoPoints, mnPoints);
 }
 
 template <typename T>
 bool Polygon<T>::IsSimple() const {
-    return rings::TestSimple(mpoPoints, mnPoints);
+    return rings::IsSimple(mpoPoints, mnPoints);
 }
 
 template <typename T>
@@ -140,8 +105,8 @@ bool Polygon<T>::IsIntersected(const BBox<T, point2_t<T>>& oWindow) const {
 template class Polygon<double>;
 
 void detail::FindRingVertices(const ZARShape& oShape, std::vector<unsigned>& rVertices) {
-    VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
-              [&](unsigned i) { rVertices.push_back(i); });
+    rings::VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
+                     [&](unsigned i) { rVertices.push_back(i); });
 }
 
 } // namespace kelm::tin

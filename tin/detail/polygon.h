@@ -61,9 +61,7 @@ class Polygon {
     PolygonOrient meOrient = PO_Undefined;
     point2_t<T>* mpoPoints = nullptr;
     unsigned mnPoints = 0;
-
-    static constexpr unsigned MOST_NEAR_POINTS = 16;
-    point2_t<T> moNearPoints[MOST_NEAR_POINTS]; ///< the array of a ring that fits into it
+    point2_t<T> moNearPoints[16]; ///< the array of a ring that fits into it
 };
 
 extern template class KELM_TIN_EXPORT Polygon<double>;

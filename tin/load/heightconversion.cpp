@@ -1,7 +1,6 @@
 #include "tin/load/heightconversion.h"
 
 #include "services/interpgrid3d.h"
-#include "services/reporting.h"
 #include "tin/parallel/parallelblocks.h"
 #include "tin/rules/extent.h"
 #include "tin/rules/frame.h"
@@ -17,7 +16,7 @@ namespace {
 /// Vertex count above which the elevation factor alone is worth a team.
 constexpr unsigned PARALLEL_ABOVE = 10000;
 
-constexpr double GRID_SPACING = 100.0; ///< map units, in x and y
+constexpr double GRID_SPACING = 100.0; ///< map units, in x and y; the grid may choose less
 constexpr float LEAST_Z_SPACING = 1.0F;
 
 using Values = std::unique_ptr<double[]>;
@@ -25,19 +24,6 @@ using Values = std::unique_ptr<double[]>;
 /// Three values a point, unset.
 Values CreateTriples(unsigned count) {
     return Values(new double[3 * std::size_t{count}]);
-}
-
-/// Do map coordinates look like degrees? One cell of the grid then spans the surface many times
-/// over, and what it gives between its nodes has little to do with the datum.
-bool LooksLikeDegrees(const point2_t<double>& low, const point2_t<double>& high) {
-    return low.x >= -360.0 && high.x <= 360.0 && low.y >= -90.0 && high.y <= 90.0;
-}
-
-void WarnOfDegrees() {
-    tellus::Warning::Warn("Heights are interpolated between positions 100 map units apart, and the "
-                          "coordinates look like degrees: use a projected layer to change the "
-                          "vertical datum of a large surface.",
-                          "tin/tinreader", __LINE__);
 }
 
 /// Kept out of line: merged into a vectorised loop, g++ 12 has dropped the rounding.
@@ -106,8 +92,6 @@ void BuildGrid(const aabb_t<point2_t<float>>& window, const point2_t<double>& ba
     grid.LayoutGrid(low.x, low.y, static_cast<double>(zMin), high.x, high.y,
                     static_cast<double>(zMax), GRID_SPACING, GRID_SPACING,
                     static_cast<double>(zSpacing));
-    if (LooksLikeDegrees(low, high))
-        WarnOfDegrees();
     const unsigned count = grid.GetNumGridPoints();
     Values positions = CreateTriples(count);
     grid.GetGridPositions(positions.get());

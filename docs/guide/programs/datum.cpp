@@ -13,7 +13,7 @@ using namespace kelm::tin;
 namespace {
 
 float GetHeight(TinReader& reader, DatumType datum) {
-    reader.SetOutputVerticalDatum(datum); // counts for loads from now on
+    reader.SetOutputVerticalDatum(datum); // for all later loads
     const std::unique_ptr<Tin> terrain(reader.Load(nullptr));
     const AabbTree tree(terrain.get());
     float height = 0.0f;
@@ -33,7 +33,7 @@ int main(int argc, char** argv) {
         std::printf("above the ellipsoid: %.2f m\n",
                     static_cast<double>(GetHeight(*reader, VD_Ellipsoidal)));
 
-        // The elevation factor comes first: (stored height + offset) * scale, here metres to feet.
+        // A stored height counts as (height + offset) * scale. Here that turns metres into feet.
         const std::unique_ptr<TinReader> feet(
             TinReaderFactory::CreateTinReader(file, 0, 0.0, 1.0 / 0.3048, VD_Other));
         std::printf("in feet:             %.2f ft\n",

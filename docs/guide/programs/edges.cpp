@@ -22,7 +22,7 @@ int main() {
     vertices[1] = {10.0f, 0.0f, 10.0f};
     vertices[2] = {10.0f, 10.0f, 10.0f};
     vertices[3] = {0.0f, 10.0f, 10.0f};
-    vertices[4] = {10.0f, 0.0f, 40.0f}; // a wall upon its eastern side
+    vertices[4] = {10.0f, 0.0f, 40.0f}; // a wall on its eastern side
     vertices[5] = {10.0f, 10.0f, 40.0f};
     vertices[6] = {4.0f, 0.0f, 25.0f}; // a sheet above it
     vertices[7] = {8.0f, 0.0f, 25.0f};
@@ -35,7 +35,7 @@ int main() {
     Print("below a sheet", surface, 7.0f, 2.0f);
     Print("on the sheet's edge", surface, 8.0f, 2.0f);
 
-    // A line that passes the wall in space: the wall is seen by lines, not by heights.
+    // Lines meet a wall; height queries do not.
     float height;
     if (surface.GetLineIntersectHeight(point3_t<float>{5, 5, 20}, point3_t<float>{15, 5, 20},
                                        height, nullptr))

@@ -10,8 +10,8 @@ using namespace kelm::tin;
 
 int main(int argc, char** argv) {
     try {
-        // Layer 0: the first one. Offset 0 and scale 1: heights as stored. VD_Other: never
-        // converted.
+        // Layer 0 is the first layer that holds polygons. Offset 0 and scale 1 keep heights as they
+        // are stored. Heights of VD_Other are never converted.
         const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
             argc > 1 ? argv[1] : "", 0, 0.0, 1.0, kelm::ogc::cs::VD_Other));
         const auto& extents = reader->GetBBox();
@@ -28,7 +28,7 @@ int main(int argc, char** argv) {
         if (terrain->GetHeight(745000.0, 4052000.0, height, &tree))
             std::printf("%.3f m at 745000, 4052000\n", static_cast<double>(height));
 
-        // Every polygon that meets the window, whole: the surface reaches a little beyond it.
+        // Each polygon that meets the window is loaded whole, so the surface reaches beyond it.
         BBox<double, point2_t<double>> window;
         window.min = {744000.0, 4051000.0};
         window.max = {746000.0, 4053000.0};

@@ -21,7 +21,7 @@ void Print(const char* what, bool found, float height) {
 } // namespace
 
 int main() {
-    // Two triangles that meet nowhere, and a roof at 50 m above the second one.
+    // Two triangles that do not touch. Above the second one lies a roof at 50 m.
     auto* vertices = new point3_t<float>[9];
     vertices[0] = {0.0f, 0.0f, 10.0f};
     vertices[1] = {100.0f, 0.0f, 20.0f};
@@ -41,7 +41,7 @@ int main() {
     Print("map position", found, height);
     found = surface.GetHeight(20.0f, 30.0f, height, &tree); // float: relative to the base
     Print("the same, surface-local", found, height);
-    found = surface.GetHeight(20.0f, 30.0f, height, nullptr); // no index: all triangles are tried
+    found = surface.GetHeight(20.0f, 30.0f, height, nullptr); // no index: tries all triangles
     Print("the same, without an index", found, height);
     found = surface.GetHeight(320.0f, 30.0f, height, &tree);
     Print("below the roof", found, height);

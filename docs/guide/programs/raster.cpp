@@ -11,14 +11,15 @@ using namespace kelm::tin;
 
 namespace {
 
-constexpr double kCell = 2000.0;   // side of a cell in metres
-constexpr double kLeft = 738000.0; // western side of the first column
-constexpr double kTop = 4060000.0; // northern side of the first row
-constexpr int kCols = 8;
-constexpr int kRows = 8;
-constexpr float kNoData = -9999.0f;
+constexpr double CELL = 2000.0;   // side of a cell in metres
+constexpr double LEFT = 738000.0; // western side of the first column
+constexpr double TOP = 4060000.0; // northern side of the first row
+constexpr int COLS = 8;
+constexpr int ROWS = 8;
+constexpr float NO_DATA = -9999.0f;
 
-/// The same triangles in grid coordinates: x counts columns, y rows, whole at the centre of a cell.
+/// The same triangles in grid coordinates: x counts columns and y counts rows. The centre of a cell
+/// has whole coordinates.
 std::unique_ptr<Tin> MoveToGrid(const Tin& terrain) {
     double xBase;
     double yBase;
@@ -26,8 +27,8 @@ std::unique_ptr<Tin> MoveToGrid(const Tin& terrain) {
     auto vertices = std::make_unique<point3_t<float>[]>(terrain.GetVertexCount());
     for (unsigned i = 0; i < terrain.GetVertexCount(); ++i) {
         const point3_t<float>& v = *terrain.GetVertex(i);
-        const double col = (xBase + static_cast<double>(v.x) - kLeft) / kCell - 0.5;
-        const double row = (kTop - yBase - static_cast<double>(v.y)) / kCell - 0.5;
+        const double col = (xBase + static_cast<double>(v.x) - LEFT) / CELL - 0.5;
+        const double row = (TOP - yBase - static_cast<double>(v.y)) / CELL - 0.5;
         vertices[i] = {static_cast<float>(col), static_cast<float>(row), v.z};
     }
     auto ids = std::make_unique<Triangle_Id[]>(terrain.GetTriangleCount());
@@ -43,13 +44,13 @@ std::unique_ptr<Tin> MoveToGrid(const Tin& terrain) {
 }
 
 std::vector<float> MakeRaster(const Tin& sheet) {
-    std::vector<float> raster(kCols * kRows, kNoData);
-    std::vector<int> cells; // column and row of each cell in turn
+    std::vector<float> raster(COLS * ROWS, NO_DATA);
+    std::vector<int> cells; // column and row of each cell, in turn
     std::vector<float> heights;
     for (unsigned i = 0; i < sheet.GetTriangleCount(); ++i)
-        sheet.GetTriangle(i)->GetGridPoints(kCols, kRows, cells, heights);
+        sheet.GetTriangle(i)->GetGridPoints(COLS, ROWS, cells, heights);
     for (std::size_t i = 0; i < heights.size(); ++i) {
-        float& cell = raster[static_cast<std::size_t>(cells[2 * i + 1] * kCols + cells[2 * i])];
+        float& cell = raster[static_cast<std::size_t>(cells[2 * i + 1] * COLS + cells[2 * i])];
         cell = std::max(cell, heights[i]);
     }
     return raster;
@@ -64,7 +65,7 @@ int main(int argc, char** argv) {
         const std::unique_ptr<Tin> terrain(reader->Load(nullptr));
         const std::vector<float> raster = MakeRaster(*MoveToGrid(*terrain));
         for (std::size_t i = 0; i < raster.size(); ++i)
-            std::printf("%9.2f%s", static_cast<double>(raster[i]), (i + 1) % kCols ? "" : "\n");
+            std::printf("%9.2f%s", static_cast<double>(raster[i]), (i + 1) % COLS ? "" : "\n");
     } catch (const std::exception& failure) {
         std::fprintf(stderr, "%s\n", failure.what());
         return 1;

@@ -27,7 +27,7 @@ int main(int argc, char** argv) {
         const std::unique_ptr<Tin> terrain(reader->Load(nullptr));
         const AabbTree tree(terrain.get());
 
-        // Subsets are new surfaces of their own: they share nothing, and the caller deletes them.
+        // A subset is a new surface. It shares nothing with the terrain; the caller deletes it.
         BBox<double, point2_t<double>> region;
         region.min = {744000.0, 4051000.0};
         region.max = {746000.0, 4053000.0};

@@ -12,7 +12,7 @@ using namespace kelm::tin;
 
 namespace {
 
-/// How many positions of every n-th row of a raster over the terrain have a height.
+/// Counts the positions with a height in the rows first, first + n and so on of a raster.
 void CountRows(const Tin& terrain, const AabbTree& tree, int first, int n, unsigned& found) {
     for (int row = first; row < 1000; row += n)
         for (int col = 0; col < 1000; ++col) {
@@ -31,13 +31,13 @@ int main(int argc, char** argv) {
         const std::unique_ptr<Tin> terrain(reader->Load(nullptr));
         const AabbTree tree(terrain.get());
 
-        // One surface and one index serve all threads: queries only read.
-        constexpr int kThreads = 4;
-        std::vector<unsigned> found(kThreads);
+        // All threads share one surface and one index, since queries only read.
+        constexpr int THREADS = 4;
+        std::vector<unsigned> found(THREADS);
         std::vector<std::thread> threads;
-        for (int i = 0; i < kThreads; ++i)
+        for (int i = 0; i < THREADS; ++i)
             threads.emplace_back([&, i] {
-                CountRows(*terrain, tree, i, kThreads, found[static_cast<std::size_t>(i)]);
+                CountRows(*terrain, tree, i, THREADS, found[static_cast<std::size_t>(i)]);
             });
         for (std::thread& thread : threads)
             thread.join();

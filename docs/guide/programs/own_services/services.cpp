@@ -1,5 +1,5 @@
-// One layer in memory in place of files, no coordinate reference systems, and a log on standard
-// output.
+// Services of a host: one layer in memory instead of files, no coordinate reference systems, and a
+// log on standard output.
 
 #include <services/crs.h>
 #include <services/exception.h>
@@ -22,7 +22,7 @@ struct _iobuf {
 
 namespace {
 
-/// The library hands the layer back; what else belongs to it is found here.
+/// The library passes only the layer to some functions. They find the file here.
 _iobuf* theFile = nullptr;
 
 } // namespace

@@ -1,0 +1,46 @@
+#pragma once
+
+#include "services/bundled/store/facets/facetlist.h"
+#include "services/bundled/store/files/featurereader.h"
+
+#include <cstdint>
+
+namespace kelm::store {
+
+/// A walk over the facets of a layer, in reading order.
+class LayerWalk {
+  public:
+    /// @param dataset owns the layer, and outlives this walk. @throw kelm::DataException
+    LayerWalk(Dataset& dataset, OGRLayer& layer) : moReader(dataset, layer) {}
+
+    /// Goes back to the position in front of the first facet.
+    void Restart();
+    /// Moves to the next facet. @return false behind the last one
+    /// @throw kelm::DataException if the layer cannot be read on; Restart must come next
+    bool Advance();
+
+    // Questions about the facet that the last Advance has found.
+    const Facet& GetFacet() const { return moFacets.Get(mnFacet); }
+    /// @return the number of the facet in its feature, from 0
+    std::size_t GetFacetNumber() const { return mnFacet; }
+    /// @return the number of facets of its feature
+    std::size_t GetFacetCount() const { return moFacets.GetCount(); }
+    /// @return the id of its feature
+    std::int64_t GetFeature() const { return mnFeature; }
+
+    /// @return the number of facets met since the start, the present one included
+    std::int64_t GetShapes() const { return mnShapes; }
+    FeatureReader& GetReader() { return moReader; }
+    const FeatureReader& GetReader() const { return moReader; }
+
+  private:
+    bool ReadFeature();
+
+    FeatureReader moReader;
+    FacetList moFacets;
+    std::size_t mnFacet = 0;
+    std::int64_t mnFeature = 0;
+    std::int64_t mnShapes = 0;
+};
+
+} // namespace kelm::store

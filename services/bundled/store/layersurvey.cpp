@@ -1,0 +1,181 @@
+#include "services/bundled/store/layersurvey.h"
+
+#include "services/bundled/store/facets/refusallog.h"
+#include "services/bundled/store/layertype.h"
+#include "services/exception.h"
+#include "services/reporting.h"
+
+#include <algorithm>
+#include <cmath>
+#include <limits>
+
+namespace kelm::store {
+
+namespace {
+
+constexpr const char* SOURCE = "services/bundled/store/layersurvey";
+
+/// Extents that grow with each shape.
+struct Extents {
+    static constexpr double MOST = std::numeric_limits<double>::max();
+    ZARVertex moLow{MOST, MOST, MOST};
+    ZARVertex moHigh{-MOST, -MOST, -MOST};
+
+    void Add(const ZARVertex& vertex) {
+        moLow = {std::min(moLow.x, vertex.x), std::min(moLow.y, vertex.y),
+                 std::min(moLow.z, vertex.z)};
+        moHigh = {std::max(moHigh.x, vertex.x), std::max(moHigh.y, vertex.y),
+                  std::max(moHigh.z, vertex.z)};
+    }
+};
+
+/// One survey under way.
+class Survey {
+  public:
+    explicit Survey(LayerWalk& walk) : moWalk(walk), moRefusals(walk.GetReader().GetSubject()) {}
+    LayerSurvey Run();
+
+  private:
+    void Walk();
+    void AddShape();
+    void TestCount() const;
+    void TakeWarnings();
+    void FinishWarnings();
+    void AddRing(bool flat);
+    double ComputeArea() const;
+    LayerSurvey GetResult() const;
+    void WarnOfHeights() const;
+    void WarnOfColumns() const;
+    void ReportIds() const;
+    const char* GetSubject() const { return moWalk.GetReader().GetSubject().c_str(); }
+    OGRLayer& GetLayer() const { return moWalk.GetReader().GetLayer(); }
+
+    LayerWalk& moWalk;
+    Warnings moWarnings;
+    RefusalLog moRefusals;
+    LayerType moType;
+    ShapeIds moIds;
+    Extents moExtents;
+    std::vector<ZARVertex> moVertices;
+    std::int64_t mnDeliverable = 0;
+    std::int64_t mnFlat = 0;
+};
+
+LayerSurvey Survey::Run() {
+    Walk();
+    moIds.Choose();
+    WarnOfHeights();
+    WarnOfColumns();
+    ReportIds();
+    return GetResult();
+}
+
+/// If the layer cannot be read to its end, the warnings up to there are given all the same.
+void Survey::Walk() {
+    moWalk.Restart();
+    try {
+        while (moWalk.Advance())
+            AddShape();
+    } catch (...) {
+        FinishWarnings();
+        throw;
+    }
+    FinishWarnings();
+}
+
+void Survey::TakeWarnings() {
+    for (const auto& [text, times] : moWalk.GetReader().TakeWarnings())
+        AddWarning(moWarnings, text, times);
+}
+
+void Survey::FinishWarnings() {
+    TakeWarnings();
+    PassOn(moWarnings, "The " + moWalk.GetReader().GetSubject());
+    moRefusals.Finish();
+}
+
+void Survey::AddShape() {
+    TakeWarnings();
+    TestCount();
+    if (moWalk.GetFacetNumber() == 0)
+        moIds.AddFeature(moWalk.GetFeature(), moWalk.GetFacetCount());
+    const Facet& facet = moWalk.GetFacet();
+    const FacetFault fault = ReadFacet(facet, moVertices);
+    if (fault == FacetFault::None)
+        AddRing(!facet.mpoRing->Is3D());
+    const FacetFault reason = fault == FacetFault::None ? facet.meFault : fault;
+    moRefusals.Add(moWalk.GetFeature(), reason,
+                   reason == FacetFault::None ? ComputeArea() : facet.mdfRefusedArea);
+    moType.Add(fault);
+}
+
+void Survey::TestCount() const {
+    constexpr int MOST = std::numeric_limits<int>::max();
+    if (moWalk.GetShapes() > MOST)
+        throw DataException(FormatString("The %s has more than %d shapes", GetSubject(), MOST),
+                            SOURCE, __PRETTY_FUNCTION__, __LINE__);
+}
+
+void Survey::AddRing(bool flat) {
+    for (const ZARVertex& vertex : moVertices)
+        moExtents.Add(vertex);
+    ++mnDeliverable;
+    mnFlat += flat;
+}
+
+/// @return the area of the ring in plan. Products of map coordinates would lose what is small
+double Survey::ComputeArea() const {
+    const ZARVertex& from = moVertices.front();
+    double sum = 0.0;
+    for (std::size_t i = 1; i + 1 < moVertices.size(); ++i)
+        sum += (moVertices[i].x - from.x) * (moVertices[i + 1].y - from.y) -
+               (moVertices[i].y - from.y) * (moVertices[i + 1].x - from.x);
+    return std::fabs(sum) / 2;
+}
+
+LayerSurvey Survey::GetResult() const {
+    LayerSurvey result;
+    result.mnShapes = static_cast<int>(moWalk.GetShapes());
+    result.mnType = moType.Get(GetLayer());
+    result.moIds = moIds;
+    if (mnDeliverable > 0) {
+        result.moLow = moExtents.moLow;
+        result.moHigh = moExtents.moHigh;
+    }
+    return result;
+}
+
+void Survey::WarnOfHeights() const {
+    if (mnFlat > 0)
+        tellus::Warning::Warn(FormatString("The %s: %lld of %lld shapes have no heights and are "
+                                           "read with height 0",
+                                           GetSubject(), static_cast<long long>(mnFlat),
+                                           static_cast<long long>(mnDeliverable)),
+                              SOURCE, __LINE__);
+}
+
+void Survey::WarnOfColumns() const {
+    if (GetLayer().GetLayerDefn()->GetGeomFieldCount() > 1)
+        tellus::Warning::Warn(
+            FormatString("The %s: only the first of its geometry columns is read", GetSubject()),
+            SOURCE, __LINE__);
+}
+
+void Survey::ReportIds() const {
+    if (moIds.GetFactor() == 0)
+        tellus::Report::AddInfo(FormatString(
+            "The %s: shape ids count the shapes in reading order, from 1", GetSubject()));
+    else if (moIds.GetFactor() > 1)
+        tellus::Report::AddInfo(FormatString("The %s: shape id = feature id x %lld + number of the "
+                                             "facet in the feature, from 0",
+                                             GetSubject(),
+                                             static_cast<long long>(moIds.GetFactor())));
+}
+
+} // namespace
+
+LayerSurvey SurveyLayer(LayerWalk& walk) {
+    return Survey(walk).Run();
+}
+
+} // namespace kelm::store

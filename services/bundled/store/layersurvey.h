@@ -1,0 +1,24 @@
+#pragma once
+
+#include "services/bundled/store/facets/layerwalk.h"
+#include "services/bundled/store/shapeids.h"
+#include "services/vectorlayer.h"
+
+namespace kelm::store {
+
+/// What the store knows of a layer before its shapes are asked for.
+struct LayerSurvey {
+    int mnShapes = 0; ///< facets, those included that cannot be delivered
+    int mnType = 2;   ///< 2 if the layer holds any facets, else 3 for lines, 1 for points
+    ShapeIds moIds;
+    /// Corners of the extents of the deliverable shapes, heights as stored; zero if there is none.
+    ZARVertex moLow{};
+    ZARVertex moHigh{};
+};
+
+/// Walks a layer once from its first facet to its last. Warns of the facets that cannot
+/// be used, once a reason, of missing heights and of what GDAL warned of.
+/// @throw kelm::DataException if the layer cannot be read or holds more shapes than an int counts
+LayerSurvey SurveyLayer(LayerWalk& walk);
+
+} // namespace kelm::store
