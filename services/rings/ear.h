@@ -1,7 +1,6 @@
 #pragma once
 
-#include "services/rings/box.h"
-#include "services/rings/ring.h"
+#include "services/rings/orientedbox.h"
 
 namespace kelm::rings {
 
@@ -33,6 +32,12 @@ class EarTriangle {
                moRP.TestOutside(low, high);
     }
 
+    /// The same for a box relative to an origin. It may tell of too few boxes.
+    bool TestOutside(const OrientedBox& box, const Point& origin) const {
+        return moPQ.TestOutside(box, origin) || moQR.TestOutside(box, origin) ||
+               moRP.TestOutside(box, origin);
+    }
+
     /// @return a box that holds all places inside. It is larger than the triangle, since far beyond
     /// the tip of a needle rounding moves places inside; docs/guide/rings.md has the proof.
     Box GetReach() const {
@@ -58,6 +63,17 @@ class EarTriangle {
         /// as the exact one does, and no place of the box has a larger one than this corner.
         bool TestOutside(const Point& low, const Point& high) const {
             return GetTurn(dy > 0.0 ? low.x : high.x, dx > 0.0 ? high.y : low.y) < 0.0;
+        }
+
+        /// Is the largest turn negative, by more than rounding changes it?
+        bool TestOutside(const OrientedBox& box, const Point& origin) const {
+            const Point direction{dx, dy};
+            const Point to{origin.x - from.x + box.center.x, origin.y - from.y + box.center.y};
+            const double largest = Cross(direction, to) +
+                                   std::fabs(Cross(direction, box.axis)) * box.halfAlong +
+                                   std::fabs(Dot(direction, box.axis)) * box.halfAcross;
+            const double reach = std::fabs(to.x) + std::fabs(to.y) + box.halfAlong + box.halfAcross;
+            return largest < -0x1p-48 * (std::fabs(dx) + std::fabs(dy)) * reach;
         }
     };
 

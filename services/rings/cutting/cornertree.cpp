@@ -1,6 +1,7 @@
 #include "services/rings/cutting/cornertree.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace kelm::rings {
 
@@ -14,11 +15,14 @@ struct CornerTree::Query {
     const EarTriangle& triangle;
     Box reach;
     const Three& own;
-    StepLimit& rLimit;
+    const Point& origin;
+    StepLimit& limit;
 
-    bool TestOutside(const Point& low, const Point& high) const {
+    bool TestOutside(const Node& node) const {
+        const auto& [low, high] = node.box;
         return low.x > reach.high.x || reach.low.x > high.x || low.y > reach.high.y ||
-               reach.low.y > high.y || triangle.TestOutside(low, high);
+               reach.low.y > high.y || triangle.TestOutside(low, high) ||
+               triangle.TestOutside(node.slanted, origin);
     }
     bool TestInside(const Item& item) const {
         return triangle.TestInside(item.at.x, item.at.y) && item.corner != own[0] &&
@@ -32,15 +36,17 @@ void CornerTree::Build(std::vector<Item> oItems) {
     mnFirstLeaf = 1;
     while (mnFirstLeaf * LEAF_CORNERS < count)
         mnFirstLeaf *= 2;
-    moNodes.resize(2 * std::size_t{mnFirstLeaf});
+    Box box;
+    for (const Item& item : moItems)
+        box.Add(item.at);
+    moOrigin = moItems[0].at;
+    mdfSlack = 0x1p-44 * std::max(box.GetSize().x, box.GetSize().y);
+    moNodes.assign(2 * std::size_t{mnFirstLeaf}, Node{box, {{1.0, 0.0}, box, 0.0}, 0, 0});
     Fill(1, 0, count);
 }
 
 void CornerTree::Fill(unsigned node, unsigned first, unsigned last) {
-    Box box;
-    for (unsigned i = first; i < last; ++i)
-        box.Add(moItems[i].at);
-    moNodes[node] = {box.low, box.high, first, last - first};
+    moNodes[node] = Fit(first, last);
     if (node >= mnFirstLeaf) {
         for (unsigned i = first; i < last; ++i)
             moLeaves[moItems[i].corner] = node;
@@ -52,10 +58,42 @@ void CornerTree::Fill(unsigned node, unsigned first, unsigned last) {
     Fill(2 * node + 1, middle, last);
 }
 
+CornerTree::Node CornerTree::Fit(unsigned first, unsigned last) const {
+    Box box;
+    for (unsigned i = first; i < last; ++i)
+        box.Add(moItems[i].at);
+    return {box, FitSlanted(first, last), first, last - first};
+}
+
+OrientedBox CornerTree::FitSlanted(unsigned first, unsigned last) const {
+    const Point axis = FindAxis(first, last);
+    Box extent;
+    for (unsigned i = first; i < last; ++i) {
+        const Point p = Subtract(moItems[i].at, moOrigin);
+        extent.Add(Point{Dot(axis, p), Cross(axis, p)});
+    }
+    return {axis, extent, mdfSlack};
+}
+
+/// @return direction from the first item to the one farthest from it
+Point CornerTree::FindAxis(unsigned first, unsigned last) const {
+    Point axis{1.0, 0.0};
+    double square = 0x1p-900; // below, its root has few digits
+    for (unsigned i = first + 1; i < last; ++i) {
+        const Point r = Subtract(moItems[i].at, moItems[first].at);
+        if (const double other = Dot(r, r); other > square) {
+            square = other;
+            axis = r;
+        }
+    }
+    const double length = std::sqrt(square);
+    return square > 0x1p-900 ? Point{axis.x / length, axis.y / length} : axis;
+}
+
 /// Puts the lower items first, on the longer axis of the node.
 void CornerTree::Halve(const Node& node, unsigned middle, unsigned last) {
     const auto at = [&](unsigned i) { return moItems.begin() + static_cast<std::ptrdiff_t>(i); };
-    if (node.high.x - node.low.x > node.high.y - node.low.y)
+    if (node.box.GetSize().x > node.box.GetSize().y)
         std::nth_element(at(node.first), at(middle), at(last),
                          [](const Item& a, const Item& b) { return a.at.x < b.at.x; });
     else
@@ -75,19 +113,18 @@ void CornerTree::Remove(unsigned corner) {
 
 unsigned CornerTree::FindInside(const EarTriangle& triangle, const Three& own,
                                 StepLimit& rLimit) const {
-    Query query{triangle, triangle.GetReach(), own, rLimit};
-    return FindBelow(1, query);
+    return FindBelow(1, {triangle, triangle.GetReach(), own, moOrigin, rLimit});
 }
 
-unsigned CornerTree::FindBelow(unsigned node, Query& rQuery) const {
+unsigned CornerTree::FindBelow(unsigned node, const Query& query) const {
     const Node& at = moNodes[node];
-    rQuery.rLimit.Count(1);
-    if (at.count == 0 || rQuery.TestOutside(at.low, at.high))
+    query.limit.Count(1);
+    if (at.count == 0 || query.TestOutside(at))
         return NONE;
     if (node >= mnFirstLeaf)
-        return FindInLeaf(at, rQuery);
-    const unsigned corner = FindBelow(2 * node, rQuery);
-    return corner != NONE ? corner : FindBelow(2 * node + 1, rQuery);
+        return FindInLeaf(at, query);
+    const unsigned corner = FindBelow(2 * node, query);
+    return corner != NONE ? corner : FindBelow(2 * node + 1, query);
 }
 
 unsigned CornerTree::FindInLeaf(const Node& node, const Query& query) const {

@@ -35,21 +35,26 @@ class CornerTree {
   private:
     struct Query;
     struct Node {
-        Point low;
-        Point high;
-        unsigned first; ///< items from here
-        unsigned count; ///< that are left, below the node
+        Box box;
+        OrientedBox slanted; ///< for corners that are nearly on one line
+        unsigned first;      ///< items from here
+        unsigned count;      ///< that are left, below the node
     };
 
+    Node Fit(unsigned first, unsigned last) const;
+    OrientedBox FitSlanted(unsigned first, unsigned last) const;
+    Point FindAxis(unsigned first, unsigned last) const;
     void Fill(unsigned node, unsigned first, unsigned last);
     void Halve(const Node& node, unsigned middle, unsigned last);
-    unsigned FindBelow(unsigned node, Query& rQuery) const;
+    unsigned FindBelow(unsigned node, const Query& query) const;
     unsigned FindInLeaf(const Node& node, const Query& query) const;
 
     std::vector<Item> moItems;      ///< of a leaf side by side, those that are left first
     std::vector<Node> moNodes;      ///< the children of k are 2 k and 2 k + 1, the root is 1
     std::vector<unsigned> moLeaves; ///< by corner
     unsigned mnFirstLeaf = 1;
+    Point moOrigin{};      ///< of slanted boxes
+    double mdfSlack = 0.0; ///< of slanted boxes
 };
 
 } // namespace kelm::rings

@@ -7,8 +7,8 @@ namespace kelm::rings {
 
 EarCutter::EarCutter(const std::vector<Point>& points, StepLimit limit)
     : mnLeft(static_cast<unsigned>(points.size())),
-      mbIndexed(std::all_of(points.begin(), points.end(), TestBounded)), moCandidates(mnLeft),
-      moTree(mnLeft), moLimit(limit) {
+      mbIndexed(!limit.IsReached() && std::all_of(points.begin(), points.end(), TestBounded)),
+      moCandidates(mnLeft), moTree(mnLeft), moLimit(limit) {
     moCorners.reserve(mnLeft);
     for (unsigned i = 0; i < mnLeft; ++i)
         moCorners.push_back({points[i], (i == 0 ? mnLeft : i) - 1, i + 1 == mnLeft ? 0 : i + 1});

@@ -28,9 +28,6 @@ void EarScan::Remove(unsigned position) {
 /// As long as the three are neighbours, corners only go. So one that was found inside forbids the
 /// ear until it goes itself, and those passed over on the way to it need no second look.
 bool EarScan::TestEar(unsigned u, unsigned v, unsigned w) {
-    const EarTriangle triangle(At(u), At(v), At(w));
-    if (!triangle.TestConvex())
-        return false;
     unsigned& blocker = moMemory.blockers[moMemory.ranks[v]];
     unsigned at = w + 1;
     if (blocker != NONE) {
@@ -38,6 +35,9 @@ bool EarScan::TestEar(unsigned u, unsigned v, unsigned w) {
         if (at < mnLeft && moMemory.ranks[at] == blocker)
             return false;
     }
+    const EarTriangle triangle(At(u), At(v), At(w));
+    if (!triangle.TestConvex())
+        return false;
     at = FindBlocker(triangle, at, u);
     if (at == u)
         return true;

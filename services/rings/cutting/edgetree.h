@@ -2,6 +2,7 @@
 
 #include "services/rings/cutting/steplimit.h"
 #include "services/rings/meeting.h"
+#include "services/rings/orientedbox.h"
 
 #include <vector>
 
@@ -32,10 +33,7 @@ class EdgeTree {
 
   private:
     struct Node {
-        Point center;       ///< from the first point of the chain on, as all coordinates of boxes
-        Point axis;         ///< direction of the longest edge, of length 1
-        double halfAlong;   ///< extent along the axis, to both sides
-        double halfAcross;  ///< extent across it
+        OrientedBox box;    ///< from the first point of the chain on, along the longest edge
         double lean;        ///< twice the largest sine between an edge and the axis
         unsigned first;     ///< edges from here
         unsigned last;      ///< to before here
@@ -49,14 +47,15 @@ class EdgeTree {
     void Halve(unsigned first, unsigned middle, unsigned last);
     bool TestWithin(unsigned node);
     bool TestBetween(unsigned node, unsigned other);
-    bool TestEdges(const Node& node, const Node& other) const;
+    bool TestEdges(const Node& node, const Node& other);
+    bool TestMeetsStranger(const Edge& edge, const Node& leaf) const;
     static bool TestApart(const Node& node, const Node& other);
 
     StepLimit& moLimit;
     std::vector<Edge> moEdges;
     std::vector<Node> moNodes;
     Point moOrigin;
-    double mdfSlack; ///< more than rounding moves the side of a box
+    double mdfSlack; ///< of boxes
 };
 
 } // namespace kelm::rings

@@ -7,9 +7,6 @@
 
 namespace kelm::rings {
 
-/// Least corners for which the index is faster.
-constexpr unsigned LEAST_INDEXED = 257;
-
 /// Is a ring simple, by all pairs of its edges?
 template <typename V>
 bool IsSimpleByPairs(const V* points, unsigned count) {
@@ -36,13 +33,14 @@ bool IsSimpleByIndex(const Point* points, unsigned count, StepLimit limit);
 /// never meet, however much they overlap. @throw std::bad_alloc for a large ring
 template <typename V>
 bool IsSimple(const V* points, unsigned count) {
-    if (count < LEAST_INDEXED)
+    const StepLimit limit = StepLimit::OfRing(count);
+    if (limit.IsReached())
         return IsSimpleByPairs(points, count);
     std::vector<Point> corners;
     corners.reserve(count);
     for (unsigned i = 0; i < count; ++i)
         corners.push_back({points[i].x, points[i].y});
-    return IsSimpleByIndex(corners.data(), count, StepLimit::OfRing(count));
+    return IsSimpleByIndex(corners.data(), count, limit);
 }
 
 } // namespace kelm::rings

@@ -1,5 +1,6 @@
 #pragma once
 
+#include <algorithm>
 #include <cstdint>
 
 namespace kelm::rings {
@@ -10,15 +11,19 @@ class StepLimit {
   public:
     explicit StepLimit(std::uint64_t steps) : mnLeft(steps) {}
 
-    /// @return a small part of the steps that are possible without an index
+    /// @return for large rings so many steps that they take less time than the way without an
+    /// index; none for rings of which most are cut faster without one
     static StepLimit OfRing(std::uint64_t corners) {
-        return StepLimit(corners * (64 + corners / 64));
+        return StepLimit(
+            corners < LEAST_INDEXED ? 0 : corners * std::min(corners / 32, 256 + corners / 128));
     }
 
     void Count(std::uint64_t steps) { mnLeft -= steps < mnLeft ? steps : mnLeft; }
     bool IsReached() const { return mnLeft == 0; }
 
   private:
+    static constexpr std::uint64_t LEAST_INDEXED = 2048;
+
     std::uint64_t mnLeft;
 };
 
