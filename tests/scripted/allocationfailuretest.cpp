@@ -56,7 +56,7 @@ TEST_F(AllocationFailureTest, OpeningAndLoadingWithPolygonsAndADatumChange) {
 
 TEST_F(AllocationFailureTest, ARingThatIsLargeEnoughForAnIndex) {
     std::vector<ZARVertex> arc;
-    for (int i = -150; i <= 150; ++i)
+    for (int i = -1030; i <= 1030; ++i)
         arc.push_back({1.0 * i, 1.0 * i * i, 0});
     const ZARShape shape{arc.data(), static_cast<int>(arc.size())};
     FailEach([&] {
