@@ -108,8 +108,10 @@ struct RingTest : testing::Test {
         };
         addArc(b, c, 0.3);
         addArc(e, a, -0.3);
-        std::rotate(ring.begin(), ring.begin() + 10,
-                    ring.end()); // the closing edge is none of them
+        // A third edge is so little steeper that the two may fall apart into two sets of parallels.
+        ring[31].y =
+            ring[30].y + (ring[31].x - ring[30].x) * (slope - 0x1p-42 * (1 + Draw(-1, 1) * 0x1p-6));
+        std::rotate(ring.begin(), ring.begin() + 10, ring.end()); // none is the closing edge
         return ring;
     }
 
@@ -131,8 +133,12 @@ struct RingTest : testing::Test {
     }
 
     Ring Make(unsigned kind, unsigned corners) {
-        if (kind == 0)
-            return OnLine();
+        if (kind == 0) {
+            Ring ring = OnLine();
+            for (int i = 0; i < 20 && TestSimple(ring); ++i)
+                ring = OnLine();
+            return ring;
+        }
         if (kind == 1)
             return Wild(corners);
         if (kind == 2)
@@ -176,7 +182,7 @@ TEST_F(RingTest, AnIndexChangesNoVerdictAndNoTriangle) {
         EXPECT_GT(simple[kind], 100U) << kind;
         EXPECT_GT(cut[kind], 100U) << kind;
     }
-    EXPECT_LT(simple[0], 3990U) << "no edges met far apart";
+    EXPECT_LT(simple[0], 3600U) << "too few edges met far apart";
 }
 
 TEST_F(RingTest, ASmallRingIsSetUpAndCutWithoutMemory) {
