@@ -21,8 +21,10 @@ class EarTriangle {
 
     /// Edges and corners are inside, without tolerance.
     bool TestInside(double x, double y) const {
-        return !(moPQ.GetTurn(x, y) < 0.0) & !(moQR.GetTurn(x, y) < 0.0) &
-               !(moRP.GetTurn(x, y) < 0.0);
+        const double pq = moPQ.GetTurn(x, y);
+        const double qr = moQR.GetTurn(x, y);
+        const double rp = moRP.GetTurn(x, y);
+        return !(pq < 0.0) & !(qr < 0.0) & !(rp < 0.0);
     }
 
     /// Is no place of a box inside, for that of one side all are outside? For coordinates whose

@@ -62,15 +62,19 @@ bool Cut(const Ring& p, bool isForward, Corners& rCorners) {
     return true;
 }
 
-/// By one of the library's ways. @param steps of the index before it gives way; -1 for no index
-bool CutBy(int steps, const Ring& ring, bool isForward, Corners& rCorners) {
+constexpr std::uint64_t SMALL = ~std::uint64_t{0};
+constexpr std::uint64_t ENDLESS = SMALL - 1;
+
+/// By one of the library's ways. @param steps of the index before it gives way, or SMALL for the
+/// way of small rings
+bool CutBy(std::uint64_t steps, const Ring& ring, bool isForward, Corners& rCorners) {
     const auto count = static_cast<unsigned>(ring.size());
     const kelm::rings::CounterClockwise<Point> corners{ring.data(), count, isForward};
     const auto clip = [&](unsigned u, unsigned v, unsigned w) {
         rCorners.push_back({corners.GetPoint(u), corners.GetPoint(v), corners.GetPoint(w)});
     };
-    return steps < 0 ? ClipSmallRing(corners, clip)
-                     : ClipLargeRing(corners, kelm::rings::StepLimit(steps), clip);
+    return steps == SMALL ? ClipSmallRing(corners, clip)
+                          : ClipLargeRing(corners, kelm::rings::StepLimit(steps), clip);
 }
 
 struct RingTest : testing::Test {
@@ -164,14 +168,14 @@ TEST_F(RingTest, AnIndexChangesNoVerdictAndNoTriangle) {
         const bool isSimple = TestSimple(ring);
         simple[kind] += isSimple;
         ASSERT_EQ(kelm::rings::IsSimpleByPairs(ring.data(), count), isSimple) << i;
-        for (const int steps : {0, 1 << 30})
+        for (const std::uint64_t steps : {std::uint64_t{0}, ENDLESS})
             ASSERT_EQ(IsSimpleByIndex(ring.data(), count, kelm::rings::StepLimit(steps)), isSimple)
                 << i;
         for (const bool isForward : {false, true}) {
             Corners expected;
             const bool isCut = Cut(ring, isForward, expected);
             cut[kind] += isCut;
-            for (const int steps : {-1, int(Below(200)), 1 << 30}) {
+            for (const std::uint64_t steps : {SMALL, std::uint64_t{Below(200)}, ENDLESS}) {
                 Corners corners;
                 ASSERT_EQ(CutBy(steps, ring, isForward, corners), isCut) << i << ' ' << steps;
                 ASSERT_EQ(corners, expected) << i << ' ' << steps;
