@@ -88,6 +88,82 @@ Ring MakeWiggle(unsigned corners, Random& rRandom) {
     return ring;
 }
 
+constexpr unsigned LARGE = 100000;
+
+/// Corners far apart on a circle of 10 km.
+Ring MakeCircle(unsigned corners) {
+    Ring ring;
+    for (unsigned i = 0; i < corners; ++i) {
+        const double turn = 6.283185307179586 * i / corners;
+        ring.push_back({CENTER_X + 10000.0 * std::cos(turn), CENTER_Y + 10000.0 * std::sin(turn)});
+    }
+    return ring;
+}
+
+/// Teeth beside each other on one side of a band, up to so high, turned so that no edge runs along
+/// an axis.
+Ring MakeTeeth(unsigned corners, double height, Random& rRandom) {
+    Ring ring{{-1.0, -10.0}, {1.0 * corners, -10.0}};
+    for (unsigned i = corners - 2; i-- > 0;)
+        ring.push_back({1.0 * i, i % 2 == 0 ? 0.0 : height * (1 + rRandom.Below(1000)) / 1000.0});
+    for (point2_t<double>& p : ring)
+        p = {CENTER_X + 0.8 * p.x - 0.6 * p.y, CENTER_Y + 0.6 * p.x + 0.8 * p.y};
+    return ring;
+}
+
+/// A path 20 m wide that turns 40 times around a centre, there and back.
+Ring MakeSpiral(unsigned corners) {
+    const unsigned half = corners / 2;
+    Ring ring;
+    const auto add = [&](unsigned i, double beside) {
+        const double turn = 251.3 * i / half;
+        const double radius = 100.0 + 10.0 * turn + beside;
+        ring.push_back({CENTER_X + radius * std::cos(turn), CENTER_Y + radius * std::sin(turn)});
+    };
+    for (unsigned i = 0; i < half; ++i)
+        add(i, 20.0);
+    for (unsigned i = half; i-- > 0;)
+        add(i, 0.0);
+    return ring;
+}
+
+/// A square whose sides are broken in the middle, again and again, until it has enough corners.
+Ring MakeCoast(unsigned corners, Random& rRandom) {
+    Ring ring{{0.0, 0.0}, {1e5, 0.0}, {1e5, 1e5}, {0.0, 1e5}};
+    while (ring.size() < corners) {
+        Ring finer;
+        for (std::size_t i = 0; i < ring.size(); ++i) {
+            const auto [x, y] = ring[i];
+            const auto [nextX, nextY] = ring[(i + 1) % ring.size()];
+            const double out = (rRandom.Below(32000) - 16000.0) / 100000.0;
+            finer.push_back({x, y});
+            finer.push_back(
+                {(x + nextX) / 2.0 + (nextY - y) * out, (y + nextY) / 2.0 - (nextX - x) * out});
+        }
+        ring.swap(finer);
+    }
+    return ring;
+}
+
+Ring MakeLarge(const std::string& sShape, Random& rRandom) {
+    if (sShape == "circle")
+        return MakeCircle(LARGE);
+    if (sShape == "star")
+        return MakeStar(LARGE, rRandom);
+    if (sShape == "spiral")
+        return MakeSpiral(LARGE);
+    if (sShape == "coast")
+        return MakeCoast(LARGE, rRandom);
+    return MakeTeeth(LARGE, sShape == "comb" ? 1000.0 : 1.0, rRandom);
+}
+
+std::shared_ptr<const std::vector<Ring>> GetLargeRing(const std::string& sShape) {
+    return Recall<std::vector<Ring>>("large" + sShape, [&] {
+        Random random(11);
+        return std::make_shared<std::vector<Ring>>(1, MakeLarge(sShape, random));
+    });
+}
+
 std::shared_ptr<const std::vector<Ring>> GetRings(const std::string& sShape, unsigned corners) {
     return Recall<std::vector<Ring>>(sShape + std::to_string(corners), [&] {
         Random random(11);
@@ -122,8 +198,7 @@ std::size_t CountFailures(RingCutter<Peer>& rCutter, const std::vector<Ring>& oR
 }
 
 template <typename Peer>
-void CutRings(benchmark::State& rState, const std::string& sShape, unsigned corners) {
-    const auto rings = GetRings(sShape, corners);
+void CutRings(benchmark::State& rState, const std::shared_ptr<const std::vector<Ring>>& rings) {
     RingCutter<Peer> cutter(*rings);
     for (auto _ : rState)
         for (std::size_t i = 0; i < rings->size(); ++i)
@@ -138,8 +213,15 @@ void CutRings(benchmark::State& rState, const std::string& sShape, unsigned corn
 template <typename Peer>
 void AddCutter(const std::string& sShape, unsigned corners) {
     Add({"ring", sShape, std::to_string(corners), RingCutter<Peer>::GetName()},
-        [=](benchmark::State& state) { CutRings<Peer>(state, sShape, corners); })
+        [=](benchmark::State& state) { CutRings<Peer>(state, GetRings(sShape, corners)); })
         ->Iterations(3);
+}
+
+template <typename Peer>
+void AddLargeCutter(const std::string& sShape) {
+    Add({"ring", "large", sShape, RingCutter<Peer>::GetName()}, [=](benchmark::State& state) {
+        CutRings<Peer>(state, GetLargeRing(sShape));
+    })->Iterations(1);
 }
 
 } // namespace
@@ -155,6 +237,12 @@ void AddRing(const Plan&) {
             AddCutter<CgalRings>(shape, corners);
 #endif
         }
+    for (const std::string shape : {"circle", "star", "comb", "sawtooth", "spiral", "coast"}) {
+        AddLargeCutter<OurRings>(shape);
+#ifdef KELM_BENCH_CGAL
+        AddLargeCutter<CgalRings>(shape);
+#endif
+    }
 }
 
 } // namespace kelm::bench

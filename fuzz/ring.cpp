@@ -1,14 +1,19 @@
-// A polygon ring: refused, or cut into triangles that cover it exactly.
+// A polygon ring: refused, or cut into triangles that cover it exactly; alike with an index and
+// without.
 
 #include "fuzz/bytes.h"
 #include "services/exception.h"
+#include "services/rings/cutting/earclipping.h"
+#include "services/rings/cutting/simplering.h"
 #include "tin/triangulate.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 
 using fuzz::Require;
 using kelm::tin::Polygon;
+namespace rings = kelm::rings;
 
 namespace {
 
@@ -41,6 +46,26 @@ void TestAreas(const Polygon<double>& oPolygon, const std::vector<Triangle_Id>& 
     Require(sum == std::abs(ring));
 }
 
+using Corners = std::vector<std::array<unsigned, 3>>;
+
+/// Also for rings that cross themselves. @param steps after which the index gives way
+void TestIndex(const std::vector<rings::Point>& points, rings::StepLimit steps) {
+    const auto count = static_cast<unsigned>(points.size());
+    Require(rings::IsSimpleByIndex(points.data(), count, steps) ==
+            rings::IsSimpleByPairs(points.data(), count));
+    if (count < 3)
+        return;
+    const rings::CounterClockwise<rings::Point> corners{points.data(), count, true};
+    Corners scanned;
+    Corners indexed;
+    const auto addTo = [](Corners& list) {
+        return [&](unsigned u, unsigned v, unsigned w) { list.push_back({u, v, w}); };
+    };
+    const bool isCut = rings::ClipSmallRing(corners, addTo(scanned));
+    Require(rings::ClipLargeRing(corners, steps, addTo(indexed)) == isCut);
+    Require(scanned == indexed);
+}
+
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
@@ -55,8 +80,14 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     shape.vertexCount = static_cast<int>(ring.size());
     try {
         const Polygon<double> polygon(&shape, orient);
-        if (orient == PO_Undefined)
-            Require(kelm::tin::detail::FindRingVertices(shape).size() == polygon.GetPointCount());
+        std::vector<unsigned> vertices;
+        kelm::tin::detail::FindRingVertices(shape, vertices);
+        Require(orient != PO_Undefined || vertices.size() == polygon.GetPointCount());
+        std::vector<rings::Point> points;
+        for (unsigned i = 0; i < polygon.GetPointCount(); ++i)
+            points.push_back({polygon.GetPoints()[i].x, polygon.GetPoints()[i].y});
+        for (const std::size_t steps : {size % 64, ~std::size_t{0}})
+            TestIndex(points, rings::StepLimit(steps));
         std::vector<Triangle_Id> triangles;
         if (Triangulate(polygon, triangles) == 0) {
             Require(triangles.size() + 2 == polygon.GetPointCount());

@@ -131,14 +131,15 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
         rCorners.AddTriangle(*shape);
         return;
     }
-    std::vector<Triangle_Id> triangles;
-    if (Triangulate(polygon, triangles) != 0) {
+    load::CornerList::Ring& ring = rCorners.GetEmptyRing();
+    if (Triangulate(polygon, ring.triangles) != 0) {
         tellus::Warning::Warn(
             FormatString("Triangulate(): Polygon# %d is ignored becasue it is not simple.\n", id),
             "tin/tinreader", __LINE__);
         return;
     }
-    rCorners.AddTriangles(*shape, triangles, detail::FindRingVertices(*shape));
+    detail::FindRingVertices(*shape, ring.vertices);
+    rCorners.AddRing(*shape, ring);
 }
 
 Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds) {

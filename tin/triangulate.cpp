@@ -1,6 +1,6 @@
 #include "tin/triangulate.h"
 
-#include "services/rings/earclipping.h"
+#include "services/rings/cutting/earclipping.h"
 
 int Triangulate(const kelm::tin::Polygon<double>& oPolygon, std::vector<Triangle_Id>& oTriangles) {
     if (!oPolygon.IsSimple() || oPolygon.GetPointCount() < 3)

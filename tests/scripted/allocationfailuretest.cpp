@@ -4,6 +4,7 @@
 #include "tin/crossingtree.h"
 #include "tin/heightgrid.h"
 #include "tin/raster.h"
+#include "tin/triangulate.h"
 
 #include <omp.h>
 
@@ -54,6 +55,18 @@ TEST_F(AllocationFailureTest, OpeningAndLoadingWithPolygonsAndADatumChange) {
             return Summarise(Load(*reader));
         });
     }
+}
+
+TEST_F(AllocationFailureTest, ARingThatIsLargeEnoughForAnIndex) {
+    std::vector<ZARVertex> arc;
+    for (int i = -1030; i <= 1030; ++i)
+        arc.push_back({1.0 * i, 1.0 * i * i, 0});
+    const ZARShape shape{arc.data(), static_cast<int>(arc.size())};
+    FailEach([&] {
+        std::vector<Triangle_Id> ids;
+        return Triangulate(kelm::tin::Polygon<double>(&shape, PO_Undefined), ids) +
+               static_cast<int>(ids.size());
+    });
 }
 
 TEST_F(AllocationFailureTest, AReaderConvertsToTheDatumThatItTells) {

@@ -2,11 +2,12 @@
 
 #include "services/exception.h"
 #include "services/reporting.h"
-#include "services/rings/ring.h"
+#include "services/rings/cutting/simplering.h"
 #include "tin/ray2.h"
 #include "tin/rules/extent.h"
 
 #include <algorithm>
+#include <iterator>
 
 namespace kelm::tin {
 
@@ -17,7 +18,7 @@ Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
         throw DataException(FormatString("%d points could not forma polygon", vertices),
                             "tin/detail/polygon", __PRETTY_FUNCTION__, __LINE__);
     mnPoints = static_cast<unsigned>(vertices) - 1U;
-    mpoPoints = new point2_t<T>[mnPoints];
+    mpoPoints = mnPoints <= std::size(moNearPoints) ? moNearPoints : new point2_t<T>[mnPoints];
     for (unsigned i = 0; i < mnPoints; ++i)
         mpoPoints[i] = {poShape->vertices[i].x, poShape->vertices[i].y};
     ComputeBBox();
@@ -28,7 +29,7 @@ Polygon<T>::Polygon(const ZARShape* poShape, const PolygonOrient eOrient) {
 
 template <typename T>
 Polygon<T>::~Polygon() {
-    if (mpoPoints != nullptr && mbOwnsPoints)
+    if (mpoPoints != moNearPoints && mbOwnsPoints)
         delete[] mpoPoints;
 }
 
@@ -66,7 +67,7 @@ T Polygon<T>::GetSignedArea() const {
 
 template <typename T>
 bool Polygon<T>::IsSimple() const {
-    return rings::IsSimple<T>(mpoPoints, mnPoints);
+    return rings::IsSimple(mpoPoints, mnPoints);
 }
 
 template <typename T>
@@ -103,12 +104,9 @@ bool Polygon<T>::IsIntersected(const BBox<T, point2_t<T>>& oWindow) const {
 
 template class Polygon<double>;
 
-std::vector<unsigned> detail::FindRingVertices(const ZARShape& oShape) {
-    std::vector<unsigned> kept;
-    kept.reserve(static_cast<std::size_t>(oShape.vertexCount));
+void detail::FindRingVertices(const ZARShape& oShape, std::vector<unsigned>& rVertices) {
     rings::VisitKept(oShape.vertices, static_cast<unsigned>(oShape.vertexCount) - 1U,
-                     [&](unsigned i) { kept.push_back(i); });
-    return kept;
+                     [&](unsigned i) { rVertices.push_back(i); });
 }
 
 } // namespace kelm::tin

@@ -37,7 +37,7 @@ class Polygon {
 
     T GetSignedArea() const;
     /// @return true if no two edges meet that are not neighbours. Touching is meeting; parallel
-    /// edges never meet, however much they overlap. The time is quadratic in the points.
+    /// edges never meet, however much they overlap. @throw std::bad_alloc for a large ring
     bool IsSimple() const;
     /// Crossing test. Of an edge its upper end is part, its lower end is not; a point on an edge
     /// counts as left of it.
@@ -61,15 +61,16 @@ class Polygon {
     PolygonOrient meOrient = PO_Undefined;
     point2_t<T>* mpoPoints = nullptr;
     unsigned mnPoints = 0;
+    point2_t<T> moNearPoints[16]; ///< the array of a ring that fits into it
 };
 
 extern template class KELM_TIN_EXPORT Polygon<double>;
 
 namespace detail {
 
-/// @return for each point of the polygon that a shape gives with PO_Undefined, the shape vertex it
-/// came from @throw std::bad_alloc
-std::vector<unsigned> FindRingVertices(const ZARShape& oShape);
+/// Lists the shape vertex of each point of the polygon that a shape gives with PO_Undefined.
+/// @param rVertices is appended to @throw std::bad_alloc
+void FindRingVertices(const ZARShape& oShape, std::vector<unsigned>& rVertices);
 
 } // namespace detail
 

@@ -31,14 +31,25 @@ class CornerList {
         Add(shape.vertices[0], shape.vertices[1], shape.vertices[2]);
     }
 
-    /// Adds triangles over the ring of a shape. Their point numbers lead to shape vertices by
-    /// `vertices`. Throws as AddTriangle does.
-    void AddTriangles(const ZARShape& shape, const std::vector<Triangle_Id>& triangles,
-                      const std::vector<unsigned>& vertices) {
-        Reserve(triangles.size());
-        for (const Triangle_Id& id : triangles)
-            Add(shape.vertices[vertices[id.id0]], shape.vertices[vertices[id.id1]],
-                shape.vertices[vertices[id.id2]]);
+    /// How the ring of one shape is cut.
+    struct Ring {
+        std::vector<Triangle_Id> triangles; ///< point numbers
+        std::vector<unsigned> vertices;     ///< of the shape, by point number
+    };
+
+    /// @return an empty ring, the same one each time: its lists keep their memory
+    Ring& GetEmptyRing() {
+        moRing.triangles.clear();
+        moRing.vertices.clear();
+        return moRing;
+    }
+
+    /// Adds the triangles of the ring of a shape. Throws as AddTriangle does.
+    void AddRing(const ZARShape& shape, const Ring& ring) {
+        Reserve(ring.triangles.size());
+        const auto get = [&](unsigned point) { return shape.vertices[ring.vertices[point]]; };
+        for (const Triangle_Id& id : ring.triangles)
+            Add(get(id.id0), get(id.id1), get(id.id2));
     }
 
     std::vector<containers::KeyPoint<double>>& GetPoints() { return moPoints; }
@@ -67,6 +78,7 @@ class CornerList {
 
     std::vector<containers::KeyPoint<double>> moPoints;
     std::vector<Triangle_Id> moIds;
+    Ring moRing;
 };
 
 } // namespace kelm::tin::load

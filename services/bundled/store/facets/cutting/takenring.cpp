@@ -1,6 +1,7 @@
 #include "services/bundled/store/facets/cutting/takenring.h"
 
-#include "services/rings/earclipping.h"
+#include "services/rings/cutting/earclipping.h"
+#include "services/rings/cutting/simplering.h"
 
 #include <algorithm>
 #include <cmath>
@@ -54,7 +55,7 @@ bool IsClearlyConvex(const std::vector<ZARVertex>& corners) {
 bool IsCuttable(const std::vector<ZARVertex>& corners) {
     const auto count = static_cast<unsigned>(corners.size());
     const auto ignore = [](unsigned, unsigned, unsigned) {};
-    return IsClearlyConvex(corners) || (rings::IsSimple<double>(corners.data(), count) &&
+    return IsClearlyConvex(corners) || (rings::IsSimple(corners.data(), count) &&
                                         rings::ClipEars(corners.data(), count, ignore));
 }
 
