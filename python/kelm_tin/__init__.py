@@ -14,16 +14,19 @@ with "fork"): the child would wait for threads that it does not have. Start it w
 """
 
 from ._native import DataError
-from ._reading import DataWarning, Layer, layers, read
+from ._reading import DataWarning, Layer, NothingRead, Survey, layers, read, survey
 from ._surface import Profile, Raster, Surface
 
 __all__ = [
     "DataError",
     "DataWarning",
     "Layer",
+    "NothingRead",
     "Profile",
     "Raster",
     "Surface",
+    "Survey",
     "layers",
     "read",
+    "survey",
 ]

@@ -1,4 +1,4 @@
-from typing import Optional
+from typing import Callable, Optional
 
 import numpy as np
 from numpy.typing import NDArray
@@ -53,8 +53,14 @@ def read(
     source: Datum,
     output: Datum,
     window: Optional[tuple[float, float, float, float]],
+    base: Optional[tuple[float, float]],
     offset: float,
     scale: float,
+    survey: bytes,
+    progress: Optional[Callable[[int, int], object]],
     warnings: list[str],
 ) -> tuple[Optional[Surface], Optional[str]]: ...
+def survey(
+    file: str, layer: int, progress: Optional[Callable[[int, int], object]], warnings: list[str]
+) -> tuple[LayerFacts, bytes]: ...
 def layers(file: str, warnings: list[str]) -> list[LayerFacts]: ...

@@ -37,7 +37,8 @@ bool IsNested(const std::exception& failure) {
 std::unique_ptr<TinReader> OpenReader(const std::string& file, const ReadOptions& options) {
     try {
         return std::unique_ptr<TinReader>(tin::TinReaderFactory::CreateTinReader(
-            file.c_str(), options.mnLayer, options.mdfOffset, options.mdfScale, options.meSource));
+            file.c_str(), options.mnLayer, options.mdfOffset, options.mdfScale, options.meSource,
+            {options.moSurvey, options.moOpening}));
     } catch (const kelm::Exception& failure) {
         if (IsNested(failure))
             throw FileError(GetText(failure));
@@ -61,22 +62,27 @@ std::optional<std::string> GetWkt(const std::string& definition) {
     return wkt;
 }
 
-LayerFacts GetFacts(const std::string& file, int number) {
+LayerFacts GetFacts(const TinReader& reader) {
+    LayerFacts facts;
+    const auto& box = reader.GetBBox();
+    facts.mnShapes = reader.GetShapeCount();
+    facts.moBox = {box.min.x, box.min.y, box.min.z, box.max.x, box.max.y, box.max.z};
+    facts.moCrs = GetWkt(reader.GetCRSText());
+    facts.mnLoadBytes = reader.EstimateLoadBytes();
+    facts.mnSurfaceBytes = reader.EstimateObjBytes_Tin();
+    return facts;
+}
+
+LayerFacts FindFacts(const std::string& file, int number) {
     ReadOptions options;
     options.mnLayer = number;
     LayerFacts facts;
-    facts.mnNumber = number;
     try {
-        const std::unique_ptr<TinReader> reader = OpenReader(file, options);
-        const auto& box = reader->GetBBox();
-        facts.mnShapes = reader->GetShapeCount();
-        facts.moBox = {box.min.x, box.min.y, box.min.z, box.max.x, box.max.y, box.max.z};
-        facts.moCrs = GetWkt(reader->GetCRSText());
-        facts.mnLoadBytes = reader->EstimateLoadBytes();
-        facts.mnSurfaceBytes = reader->EstimateObjBytes_Tin();
+        facts = GetFacts(*OpenReader(file, options));
     } catch (const kelm::Exception& failure) {
         facts.moRefusal = GetText(failure);
     }
+    facts.mnNumber = number;
     return facts;
 }
 
@@ -102,10 +108,22 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
         window.min = {(*options.moWindow)[0], (*options.moWindow)[1]};
         window.max = {(*options.moWindow)[2], (*options.moWindow)[3]};
     }
-    std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr));
+    tin::LoadOptions load;
+    load.progress = options.moLoading;
+    if (options.moBase)
+        load.base = {(*options.moBase)[0], (*options.moBase)[1]};
+    std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr, load));
     if (!surface)
         return {nullptr, std::nullopt};
     return {std::make_unique<Surface>(std::move(surface)), GetWkt(reader->GetCRSText())};
+}
+
+std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,
+                                               const ReadOptions& options) {
+    const std::unique_ptr<TinReader> reader = OpenReader(file, options);
+    LayerFacts facts = GetFacts(*reader);
+    facts.mnNumber = options.mnLayer;
+    return {std::move(facts), reader->GetSurvey()};
 }
 
 std::vector<LayerFacts> ListLayers(const std::string& file) {
@@ -113,7 +131,7 @@ std::vector<LayerFacts> ListLayers(const std::string& file) {
     std::vector<LayerFacts> layers;
     const int count = ZARSegCount(open.get(), ZAR_SEGMENT_VECTOR);
     for (int number = 1; number <= count; ++number)
-        layers.push_back(GetFacts(file, number));
+        layers.push_back(FindFacts(file, number));
     return layers;
 }
 
