@@ -1,6 +1,7 @@
 #include "tin/tinreader.h"
 
 #include "services/exception.h"
+#include "services/memory/largepages.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
 #include "tin/detail/polygon.h"
@@ -150,7 +151,7 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
                           const LoadOptions& oOptions) {
     if (oPoints.empty() || oIds.empty())
         return nullptr;
-    std::vector<unsigned> oKeys(oPoints.size());
+    auto oKeys = memory::CreateLargeList<unsigned>(oPoints.size());
     unsigned nVertices;
     try {
         nVertices = load::Weld(oPoints, oIds, oKeys);

@@ -1,6 +1,7 @@
 #include "tin/triangle.h"
 
 #include "services/exception.h"
+#include "services/memory/largepages.h"
 #include "tin/ray2.h"
 #include "tin/rules/barycentric.h"
 #include "tin/vector3.h"
@@ -46,6 +47,12 @@ inline bool IsIntersectedSegment(const float& ax, const float& ay, const float& 
 }
 
 } // namespace
+
+void* Triangle::operator new[](std::size_t bytes) {
+    void* const array = ::operator new[](bytes);
+    memory::AdviseLargePages(array, bytes);
+    return array;
+}
 
 Triangle::Triangle() : vertices{nullptr, nullptr, nullptr} {}
 

@@ -4,6 +4,8 @@
 #include "tin/point.h"
 #include "tin/tinexport.h"
 
+#include <cstddef>
+#include <new>
 #include <vector>
 
 /// Result of crossing a triangle with a segment in space.
@@ -43,6 +45,13 @@ class KELM_TIN_EXPORT Triangle {
     Triangle(const Triangle&) = default;
     Triangle& operator=(const Triangle&) = default;
     ~Triangle() = default;
+    /// Arrays of a surface are large, and come on large pages where the system has such.
+    static void* operator new[](std::size_t bytes);
+    static void* operator new[](std::size_t bytes, const std::nothrow_t&) noexcept {
+        return ::operator new[](bytes, std::nothrow);
+    }
+    static void* operator new[](std::size_t, void* place) noexcept { return place; }
+    static void operator delete[](void* array) noexcept { ::operator delete[](array); }
 
     /// Sets the three vertices and computes the box. @throw kelm::DataException if one is null; the
     /// triangle then stays as it was

@@ -1,5 +1,6 @@
 #include "tin/load/weld.h"
 
+#include "services/memory/largepages.h"
 #include "tin/load/cornerhash.h"
 #include "tin/octree2.h"
 #include "tin/parallel/parallelblocks.h"
@@ -39,7 +40,7 @@ void Renumber(std::vector<Triangle_Id>& ids, const StandIn& getStandIn) {
 /// Welds where no octree is needed. @return the number of kept corners, 0 if one is
 unsigned WeldByHash(const Points& points, std::vector<Triangle_Id>& ids,
                     std::vector<unsigned>& keys) {
-    std::vector<unsigned> standIns(points.size());
+    auto standIns = memory::CreateLargeList<unsigned>(points.size());
     if (!CornerHash::FindStandIns(points, standIns))
         return 0;
     unsigned kept = 0;

@@ -58,6 +58,7 @@ class Survey {
     LayerType moType;
     ShapeIds moIds;
     FeatureBlocks moBlocks;
+    KeptFacets moKept;
     Extents moExtents;
     std::vector<ZARVertex> moVertices;
     std::int64_t mnDeliverable = 0;
@@ -104,6 +105,7 @@ void Survey::AddShape() {
         AddFeature();
     const Facet& facet = moWalk.GetFacet();
     const FacetFault fault = ReadFacet(facet, moVertices);
+    moKept.Add(moWalk.GetFeature(), moWalk.GetFacetNumber(), fault, moVertices);
     if (fault == FacetFault::None)
         AddRing(!facet.mpoRing->Is3D());
     const FacetFault reason = fault == FacetFault::None ? facet.meFault : fault;
@@ -148,6 +150,7 @@ LayerSurvey Survey::GetResult() {
     result.mnType = moType.Get(GetLayer());
     result.moIds = moIds;
     result.moBlocks = std::move(moBlocks);
+    result.moKept = std::move(moKept);
     if (mnDeliverable > 0) {
         result.moLow = moExtents.moLow;
         result.moHigh = moExtents.moHigh;

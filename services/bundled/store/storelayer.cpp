@@ -3,6 +3,7 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 
+#include <chrono>
 #include <utility>
 
 namespace kelm::store {
@@ -11,11 +12,16 @@ namespace {
 
 constexpr const char* SOURCE = "services/bundled/store/storelayer";
 
+std::int64_t GetNow() {
+    const auto now = std::chrono::system_clock::now().time_since_epoch();
+    return std::chrono::duration_cast<std::chrono::nanoseconds>(now).count();
+}
+
 } // namespace
 
 StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, OGRLayer& layer)
-    : moFile(file), moDataset(dataset), moWalk(dataset, layer), moStamp(dataset.GetStamp()),
-      moSurvey(SurveyLayer(moWalk)) {
+    : moFile(file), moDataset(dataset), moWalk(dataset, layer), mnOpened(GetNow()),
+      moStamp(dataset.GetStamp()), moSurvey(SurveyLayer(moWalk)) {
     shapeCount = moSurvey.mnShapes;
     shapeCountValid = 1;
 }
@@ -41,10 +47,21 @@ int StoreLayer::GetFirst() {
 
 void StoreLayer::Restart() {
     mnRun = 0;
+    mbKept = !moRuns && moSurvey.moKept.AreWhole() && IsUntouched();
+    if (mbKept)
+        return moSurvey.moKept.Restart();
+    moSurvey.moKept.Drop();
     moWalk.Restart();
 }
 
+bool StoreLayer::IsUntouched() const {
+    const FileStamp stamp = moDataset.GetStamp();
+    return stamp == moStamp && stamp.AreOlderThan(mnOpened);
+}
+
 bool StoreLayer::Advance() {
+    if (mbKept)
+        return moSurvey.moKept.Advance();
     if (!moRuns)
         return moWalk.Advance();
     while (mnRun == 0 || !moWalk.Advance()) {
@@ -62,22 +79,26 @@ int StoreLayer::GetBehind(int id) {
 
 ZARShape& StoreLayer::GetShape(int id) {
     Seek(id);
-    const FacetFault fault = ReadFacet(moWalk.GetFacet(), moVertices);
+    const FacetFault fault = ReadShape();
     if (fault != FacetFault::None)
         throw DataException(FormatString("Shape %d (feature %lld) of %s cannot be used: %s", id,
-                                         static_cast<long long>(moWalk.GetFeature()),
+                                         static_cast<long long>(GetFeature()),
                                          GetSubject().c_str(), GetFaultText(fault)),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
     moShape = {moVertices.data(), static_cast<int>(moVertices.size())};
     return moShape;
 }
 
+FacetFault StoreLayer::ReadShape() {
+    return mbKept ? moSurvey.moKept.Read(moVertices) : ReadFacet(moWalk.GetFacet(), moVertices);
+}
+
 int StoreLayer::Step() {
     mnId = -1;
     const bool more = Advance();
-    const int id = more ? moSurvey.moIds.GetId(moWalk.GetFeature(), moWalk.GetFacetNumber(),
-                                               moWalk.GetShapes())
-                        : -1;
+    const std::size_t number =
+        mbKept ? moSurvey.moKept.GetFacetNumber() : moWalk.GetFacetNumber();
+    const int id = more ? moSurvey.moIds.GetId(GetFeature(), number, GetShapes()) : -1;
     TestUnchanged(more, id);
     mnId = id;
     return id;
@@ -85,7 +106,7 @@ int StoreLayer::Step() {
 
 /// Some formats end early without an error; that would pass for a smaller surface.
 void StoreLayer::TestUnchanged(bool more, int id) const {
-    if (more ? id < 0 : !moRuns && moWalk.GetShapes() != moSurvey.mnShapes)
+    if (more ? id < 0 : !moRuns && GetShapes() != moSurvey.mnShapes)
         throw DataException(FormatString("The %s has changed since it was opened: there were %d "
                                          "shapes",
                                          GetSubject().c_str(), moSurvey.mnShapes),
