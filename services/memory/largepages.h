@@ -3,6 +3,7 @@
 #include <cerrno>
 #include <cstddef>
 #include <cstdint>
+#include <cstdlib>
 #include <memory>
 #include <new>
 #include <type_traits>
@@ -12,26 +13,40 @@
 
 namespace kelm::memory {
 
+constexpr std::size_t LARGE_PAGE = std::size_t{2} << 20;
+
 /// Asks the system for large pages for an array that is about to be filled. To fetch a page costs
 /// more than to fill it, and a load fills a hundred bytes a triangle and more. Only the speed
 /// changes, if anything; small arrays are left alone.
 /// @param first,bytes memory that is allocated and not touched yet
 inline void AdviseLargePages(void* first, std::size_t bytes) noexcept {
 #ifdef MADV_HUGEPAGE
-    constexpr std::size_t LARGE_PAGE = std::size_t{2} << 20;
     constexpr std::uintptr_t PAGE = 4096;
     if (bytes < 2 * LARGE_PAGE)
         return;
-    const auto address = reinterpret_cast<std::uintptr_t>(first);
-    const std::size_t skipped = (PAGE - address % PAGE) % PAGE;
+    const std::size_t behind = reinterpret_cast<std::uintptr_t>(first) % PAGE;
     const int error = errno;
-    static_cast<void>(madvise(static_cast<char*>(first) + skipped,
-                              (bytes - skipped) / PAGE * PAGE, MADV_HUGEPAGE));
+    static_cast<void>(madvise(static_cast<char*>(first) - behind, bytes + behind, MADV_HUGEPAGE));
     errno = error;
 #else
     static_cast<void>(first);
     static_cast<void>(bytes);
 #endif
+}
+
+struct BlockRelease {
+    void operator()(unsigned char* block) const { std::free(block); }
+};
+using LargeBlock = std::unique_ptr<unsigned char[], BlockRelease>;
+
+/// @param bytes a multiple of LARGE_PAGE @return that many bytes, from the start of a large page on
+/// @throw std::bad_alloc
+inline LargeBlock CreateLargeBlock(std::size_t bytes) {
+    LargeBlock block(static_cast<unsigned char*>(std::aligned_alloc(LARGE_PAGE, bytes)));
+    if (!block)
+        throw std::bad_alloc();
+    AdviseLargePages(block.get(), bytes);
+    return block;
 }
 
 /// Reserves room in a list, on large pages. @throw as std::vector::reserve

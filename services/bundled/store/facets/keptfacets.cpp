@@ -1,7 +1,5 @@
 #include "services/bundled/store/facets/keptfacets.h"
 
-#include "services/memory/largepages.h"
-
 #include <algorithm>
 #include <cstring>
 #include <limits>
@@ -11,8 +9,7 @@ namespace kelm::store {
 
 namespace {
 
-/// Twice the size of a large page.
-constexpr std::size_t BLOCK_BYTES = std::size_t{4} << 20;
+constexpr std::size_t BLOCK_BYTES = 2 * memory::LARGE_PAGE;
 
 bool IsTriangle(const std::vector<ZARVertex>& vertices) {
     return vertices.size() == 4 &&
@@ -53,10 +50,10 @@ void KeptFacets::Append(const Head& head, const ZARVertex* vertices) {
 /// @return null if there is none. A layer that is not kept is read again, so that is no failure
 unsigned char* KeptFacets::GetRoom(std::size_t bytes) try {
     if (moBlocks.empty() || moBlocks.back().mnSize - moBlocks.back().mnUsed < bytes) {
-        const std::size_t size = std::max(bytes, BLOCK_BYTES);
+        const std::size_t size = (bytes / BLOCK_BYTES + 1) * BLOCK_BYTES;
         if (size > MOST_BYTES - mnBytes)
             return nullptr;
-        moBlocks.push_back({memory::CreateLargeArray<unsigned char>(size), size, 0});
+        moBlocks.push_back({memory::CreateLargeBlock(size), size, 0});
         mnBytes += size;
     }
     Block& block = moBlocks.back();

@@ -1,12 +1,12 @@
 #pragma once
 
 #include "services/bundled/store/facets/facetfault.h"
+#include "services/memory/largepages.h"
 #include "services/vectorlayer.h"
 
 #include <cstddef>
 #include <cstdint>
 #include <deque>
-#include <memory>
 #include <vector>
 
 namespace kelm::store {
@@ -54,7 +54,7 @@ class KeptFacets {
     static constexpr std::int32_t TRIANGLE = 3;
 
     struct Block {
-        std::unique_ptr<unsigned char[]> mpBytes;
+        memory::LargeBlock mpBytes;
         std::size_t mnSize = 0;
         std::size_t mnUsed = 0;
     };
