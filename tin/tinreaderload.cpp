@@ -125,6 +125,10 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
     const ZARShape* shape = FindShape(mpLayer, id);
     if (shape == nullptr)
         return;
+    if (poWindow == nullptr && shape->vertexCount == 4) {
+        rCorners.AddTriangle(*shape);
+        return;
+    }
     const Polygon<double> polygon(shape, PO_Undefined);
     if (poWindow != nullptr && !polygon.IsIntersected(*poWindow))
         return;

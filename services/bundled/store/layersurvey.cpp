@@ -150,7 +150,8 @@ LayerSurvey Survey::GetResult() {
     result.mnType = moType.Get(GetLayer());
     result.moIds = moIds;
     result.moBlocks = std::move(moBlocks);
-    result.moKept = std::move(moKept);
+    if (result.mnType == 2)
+        result.moKept = std::move(moKept);
     if (mnDeliverable > 0) {
         result.moLow = moExtents.moLow;
         result.moHigh = moExtents.moHigh;

@@ -51,7 +51,7 @@ void KeptFacets::Append(const Head& head, const ZARVertex* vertices) {
 unsigned char* KeptFacets::GetRoom(std::size_t bytes) try {
     if (moBlocks.empty() || moBlocks.back().mnSize - moBlocks.back().mnUsed < bytes) {
         const std::size_t size = (bytes / BLOCK_BYTES + 1) * BLOCK_BYTES;
-        if (size > MOST_BYTES - mnBytes)
+        if (size > mnMostBytes - mnBytes)
             return nullptr;
         moBlocks.push_back({memory::CreateLargeBlock(size), size, 0});
         mnBytes += size;

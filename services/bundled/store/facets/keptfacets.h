@@ -14,11 +14,13 @@ namespace kelm::store {
 /// The facets of a layer as one walk has found them, kept in memory for one more walk.
 ///
 /// They are given in their order, and their memory goes back block by block behind the walk. What
-/// would take more than MOST_BYTES is not kept.
+/// would take more than MOST_BYTES is not kept at all.
 class KeptFacets {
   public:
     /// Most bytes that a layer keeps: three million triangles.
     static constexpr std::size_t MOST_BYTES = std::size_t{256} << 20;
+
+    explicit KeptFacets(std::size_t mostBytes = MOST_BYTES) : mnMostBytes(mostBytes) {}
 
     /// Takes the next facet in reading order. Does nothing once something was dropped.
     /// @param number of the facet in its feature, from 0
@@ -63,6 +65,7 @@ class KeptFacets {
     unsigned char* GetRoom(std::size_t bytes);
     static std::size_t CountBytes(const Head& head);
 
+    std::size_t mnMostBytes;
     std::deque<Block> moBlocks;
     std::size_t mnBytes = 0; ///< of all blocks, given away or not
     std::size_t mnGone = 0;  ///< blocks that were given away
