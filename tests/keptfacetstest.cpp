@@ -46,10 +46,14 @@ struct KeptFacetsTest : FileTest {
     /// Features of all kinds, so many times.
     static LayerText MakeLayer(int nTimes, bool bMixed) {
         const std::vector<std::string> oMixed = {
-            "POLYGON Z ((0 0 1,2 0 2,2 2 3,0 2 4,0 0 1),(0.5 0.5 1,1 0.5 1,1 1 1,0.5 0.5 1))", "",
+            "POLYGON Z ((0 0 1,2 0 2,2 2 3,0 2 4,0 0 1),(0.5 0.5 1,1 0.5 1,1 1 1,0.5 0.5 1))",
+            "",
             "MULTIPOLYGON Z (((0 0 1,2 0 2,2 2 3,0 0 1)),((5 0 1,7 0 2,7 2 3,6 3 4,5 0 1)))",
-            "POINT Z (1 1 1)", "LINESTRING Z (0 0 1,1 1 1)", "POLYGON Z EMPTY",
-            "POLYGON Z ((0 0 0,4 0 0,4 0 3,0 0 3,0 0 0))", "POLYGON ((0 0,0 1,1 0,0 0))"};
+            "POINT Z (1 1 1)",
+            "LINESTRING Z (0 0 1,1 1 1)",
+            "POLYGON Z EMPTY",
+            "POLYGON Z ((0 0 0,4 0 0,4 0 3,0 0 3,0 0 0))",
+            "POLYGON ((0 0,0 1,1 0,0 0))"};
         LayerText oText{{}, bMixed ? OGR_GT_SetZ(wkbUnknown) : wkbPolygon25D};
         for (int n = 0; n < nTimes; ++n) {
             oText.moGeometries.push_back(MakeTriangle(n, 0, n));

@@ -82,8 +82,8 @@ ZARShape& StoreLayer::GetShape(int id) {
     const FacetFault fault = ReadShape();
     if (fault != FacetFault::None)
         throw DataException(FormatString("Shape %d (feature %lld) of %s cannot be used: %s", id,
-                                         static_cast<long long>(GetFeature()),
-                                         GetSubject().c_str(), GetFaultText(fault)),
+                                         static_cast<long long>(GetFeature()), GetSubject().c_str(),
+                                         GetFaultText(fault)),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
     moShape = {moVertices.data(), static_cast<int>(moVertices.size())};
     return moShape;
@@ -96,8 +96,7 @@ FacetFault StoreLayer::ReadShape() {
 int StoreLayer::Step() {
     mnId = -1;
     const bool more = Advance();
-    const std::size_t number =
-        mbKept ? moSurvey.moKept.GetFacetNumber() : moWalk.GetFacetNumber();
+    const std::size_t number = mbKept ? moSurvey.moKept.GetFacetNumber() : moWalk.GetFacetNumber();
     const int id = more ? moSurvey.moIds.GetId(GetFeature(), number, GetShapes()) : -1;
     TestUnchanged(more, id);
     mnId = id;

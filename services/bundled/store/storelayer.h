@@ -62,7 +62,7 @@ class StoreLayer final : public OpenLayer {
     std::optional<std::vector<FeatureRun>> moRuns; ///< those of the window; none: the whole layer
     std::size_t mnRun = 0;                         ///< the next one
     bool mbKept = false; ///< does the walk take what the survey kept, and not the file?
-    int mnId = -1;                                 ///< of the facet that the walk is at, or -1
+    int mnId = -1;       ///< of the facet that the walk is at, or -1
     std::vector<ZARVertex> moVertices;
     ZARShape moShape{};
 };
