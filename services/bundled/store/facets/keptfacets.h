@@ -30,8 +30,8 @@ class KeptFacets {
     /// Gives the memory back. Nothing is kept from then on.
     void Drop();
 
-    /// @return true if there is every facet from the first one on
-    bool AreWhole() const { return !mbDropped && mnGone == 0; }
+    /// @return true if there are facets, and none was given away or dropped
+    bool AreWhole() const { return !moBlocks.empty() && mnGone == 0; }
     /// Goes back to the position in front of the first facet. They must be whole.
     void Restart();
     /// Moves to the next facet. @return false behind the last one; all memory is then given back
