@@ -19,8 +19,12 @@ CAUSES = {
     "raster": "The walk gives column, row and height of every cell, with two divisions in double "
               "for each cell by the inside rule. The plain walk trusts the ends of a row, "
               "divides once for each row and writes to the raster directly",
-    "load": "The loop makes nothing. A load also carries each corner through the list, welds it, "
-            "and makes vertices and triangles",
+    "load": "The loop makes nothing. Opening reads as the loop does, and keeps what it reads. The "
+            "load then welds the corners and makes vertices and triangles",
+    "load-again": "The loop makes nothing. A second load reads as the loop does, since the file may "
+                  "have changed, and then welds. GDAL's columns would read a GeoPackage in half "
+                  "the time, but GDAL 3.6 fills them on threads that open the file anew, and a "
+                  "damaged page makes it try without end",
     "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing "
               "is. At equal density of the positions, in the row `fine`, a height grows less",
 }
@@ -104,19 +108,24 @@ def get_goals(results):
         compare(Goal("raster", "Raster at 100k: 5 x Embree's ray a cell, 1.8 x a plain row walk"),
                 "raster", ("100k",), (("Embree, a ray a cell", 5.0), ("plain row walk", 1.8))),
     ]
-    load = Goal("load", "Loading: at most 1.3 x the bare OGR loop (FlatGeobuf), 1.2 x (GeoPackage, "
-                "Shapefile)")
-    for driver, bound in (("FlatGeobuf", 1.3), ("GPKG", 1.2), ("ESRI Shapefile", 1.2)):
-        for row in results.get_rows("load/" + driver):
-            load.at_most(f"{driver} {row}", invert(ratio("load/" + driver, row, "bare OGR loop")),
-                         bound)
+    load = Goal("load", "Opening and first load: at most 1.3 x one bare OGR loop (FlatGeobuf, "
+                "Shapefile), 1.0 x (GeoPackage)")
+    again = Goal("load-again", "Second load: at most 1.3 x one bare OGR loop (FlatGeobuf, "
+                 "Shapefile), 0.8 x (GeoPackage)")
+    for driver, first, second in (("FlatGeobuf", 1.3, 1.3), ("GPKG", 1.0, 0.8),
+                                  ("ESRI Shapefile", 1.3, 1.3)):
+        key = "load/" + driver
+        for row in results.get_rows(key):
+            load.at_most(f"{driver} {row}", invert(ratio(key, row, "bare OGR loop")), first)
+            times = [results.get(key, row, who, "again") for who in ("ours", "bare OGR loop")]
+            again.at_most(f"{driver} {row}", times[0] / times[1] if all(times) else None, second)
     window = Goal("window", "A window of 1 %: at most 3 % of a whole load (GeoPackage, FlatGeobuf), "
                   "30 % (Shapefile)")
     for driver, bound in (("FlatGeobuf", 0.03), ("GPKG", 0.03), ("ESRI Shapefile", 0.3)):
         for row in results.get_rows("window/" + driver):
             window.at_most(f"{driver} {row}",
                            invert(ratio("window/" + driver, row, "whole layer")), bound)
-    return (goals + [load, window, get_growth_goal(results)] + get_height_goals(results)
+    return (goals + [load, again, window, get_growth_goal(results)] + get_height_goals(results)
             + get_line_goals(results) + get_thread_goals(results) + get_python_goals(results))
 
 

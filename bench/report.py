@@ -88,10 +88,15 @@ def format_load(results, subject):
     rows = []
     for row in results.get_rows(subject):
         for who in results.get_columns(subject):
+            again = results.get(subject, row, who, "again")
+            share = again / results.get(subject, row, "bare OGR loop", "again")
             rows.append([row, who, format_cell(results, subject, row, who, 1e-9 * get_count(row)),
                          format_figure(results.get(subject, row, who, "open")),
+                         format_figure(results.get(subject, row, who, "load")),
+                         f"{format_figure(again)} ({share:.2f} loops)",
                          format_figure(results.get(subject, row, who, "peak") / 1e6)])
-    return format_table(["Triangles", "", "time, s (ratio)", "opening, s", "peak memory, MB"], rows)
+    return format_table(["Triangles", "", "opening and first load, s (ratio)", "opening, s",
+                         "first load, s", "second load, s", "peak memory, MB"], rows)
 
 
 def format_subject(results, title, subject, factor, unit, words):

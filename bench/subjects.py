@@ -89,9 +89,10 @@ SUBJECTS = [
      "of a row. The other takes the cells for inside and steps along the plane. GDAL "
      "triangulates the vertices anew."),
     ("Loading, GeoPackage", "load/GPKG", (1e-9, "s"),
-     "Triangles as polygons with heights, each load in a process of its own. The time is the "
-     "processor time of `Load`, beside a loop over all features that reads each corner and keeps "
-     "nothing."),
+     "Triangles as polygons with heights, each file in a process of its own. The time is the "
+     "processor time of opening a reader and its first load, beside one loop over all features "
+     "that reads each corner and keeps nothing. The second load of the same reader reads the "
+     "file again."),
     ("Loading, FlatGeobuf", "load/FlatGeobuf", (1e-9, "s"), "The same."),
     ("Loading, Shapefile", "load/ESRI Shapefile", (1e-9, "s"), "The same."),
     ("Windows, GeoPackage", "window/GPKG", (1e-9, "s"),

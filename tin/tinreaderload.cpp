@@ -1,6 +1,7 @@
 #include "tin/tinreader.h"
 
 #include "services/exception.h"
+#include "services/memory/largepages.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
 #include "tin/detail/polygon.h"
@@ -159,6 +160,10 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
     const ZARShape* shape = FindShape(mpLayer, id);
     if (shape == nullptr)
         return;
+    if (poWindow == nullptr && shape->vertexCount == 4) {
+        rCorners.AddTriangle(*shape);
+        return;
+    }
     const Polygon<double> polygon(shape, PO_Undefined);
     if (poWindow != nullptr && !polygon.IsIntersected(*poWindow))
         return;
@@ -186,7 +191,7 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
     if (oPoints.empty() || oIds.empty())
         return nullptr;
     oOptions.progress.Report(READ, "welding corners");
-    std::vector<unsigned> oKeys(oPoints.size());
+    auto oKeys = memory::CreateLargeList<unsigned>(oPoints.size());
     unsigned nVertices;
     try {
         nVertices = load::Weld(oPoints, oIds, oKeys);

@@ -1,5 +1,6 @@
 #include "tin/load/assembly.h"
 
+#include "services/memory/largepages.h"
 #include "tin/parallel/parallelblocks.h"
 #include "tin/rules/extent.h"
 #include "tin/rules/frame.h"
@@ -25,7 +26,7 @@ void ReleaseMemory(std::vector<V>& list) {
 /// Indices of the kept corners, in rising order.
 std::vector<unsigned> FindKept(const std::vector<unsigned>& keys, unsigned count) {
     std::vector<unsigned> kept;
-    kept.reserve(count);
+    memory::ReserveLarge(kept, count);
     for (unsigned i = 0; i < keys.size(); ++i)
         if (keys[i] == 1)
             kept.push_back(i);
@@ -42,7 +43,7 @@ point2_t<double> FindBase(const Points& points, const std::vector<unsigned>& kep
 Vertices CreateVertices(const Points& points, const std::vector<unsigned>& kept,
                         const point2_t<double>& base) {
     const rules::Frame frame(base.x, base.y);
-    Vertices vertices(new point3_t<float>[kept.size()]);
+    Vertices vertices = memory::CreateLargeArray<point3_t<float>>(kept.size());
     for (std::size_t j = 0; j < kept.size(); ++j) {
         const auto& [x, y, z] = points[kept[j]];
         vertices[j] = frame.ToLocal(point3_t<double>{x, y, z});

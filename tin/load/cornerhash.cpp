@@ -1,5 +1,6 @@
 #include "tin/load/cornerhash.h"
 
+#include "services/memory/largepages.h"
 #include "tin/octree2.h"
 
 #include <algorithm>
@@ -76,7 +77,7 @@ CornerHash::CornerHash(const std::vector<Point>& rPoints) : mrPoints(rPoints) {
     std::size_t slots = 64;
     while (slots < rPoints.size() / 2)
         slots *= 2;
-    moSlots.assign(slots, Slot{NONE, 0});
+    moSlots = memory::CreateLargeList(slots, Slot{NONE, 0});
     mnMask = slots - 1;
 }
 
@@ -157,7 +158,7 @@ void CornerHash::Keep(unsigned corner, std::uint64_t hash) {
 }
 
 void CornerHash::Grow() {
-    std::vector<Slot> old(2 * moSlots.size(), Slot{NONE, 0});
+    auto old = memory::CreateLargeList(2 * moSlots.size(), Slot{NONE, 0});
     old.swap(moSlots);
     mnMask = moSlots.size() - 1;
     for (const Slot& slot : old)

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "containers/keypoint.h"
+#include "services/memory/largepages.h"
 #include "services/vectorlayer.h"
 #include "tin/triangleid.h"
 
@@ -20,8 +21,8 @@ class CornerList {
   public:
     /// @param shapeCount shapes of the layer, 0 or more
     explicit CornerList(int shapeCount) {
-        moIds.reserve(static_cast<std::size_t>(shapeCount));
-        moPoints.reserve(3 * static_cast<std::size_t>(shapeCount));
+        memory::ReserveLarge(moIds, static_cast<std::size_t>(shapeCount));
+        memory::ReserveLarge(moPoints, 3 * static_cast<std::size_t>(shapeCount));
     }
 
     /// Adds the triangle of a shape's first three vertices.
@@ -62,9 +63,10 @@ class CornerList {
 
     void Reserve(std::size_t triangles) {
         if (moPoints.size() + 3 * triangles > moPoints.capacity())
-            moPoints.reserve(moPoints.capacity() + std::max(3 * triangles, POINT_STEP));
+            memory::ReserveLarge(moPoints,
+                                 moPoints.capacity() + std::max(3 * triangles, POINT_STEP));
         if (moIds.size() + triangles > moIds.capacity())
-            moIds.reserve(moIds.capacity() + std::max(triangles, ID_STEP));
+            memory::ReserveLarge(moIds, moIds.capacity() + std::max(triangles, ID_STEP));
     }
 
     void Add(const ZARVertex& a, const ZARVertex& b, const ZARVertex& c) {

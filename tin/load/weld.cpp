@@ -39,15 +39,14 @@ void Renumber(std::vector<Triangle_Id>& ids, const StandIn& getStandIn) {
 /// Welds where no octree is needed. @return the number of kept corners, 0 if one is
 unsigned WeldByHash(const Points& points, std::vector<Triangle_Id>& ids,
                     std::vector<unsigned>& keys) {
-    std::vector<unsigned> standIns(points.size());
-    if (!CornerHash::FindStandIns(points, standIns))
+    if (!CornerHash::FindStandIns(points, keys))
         return 0;
+    Renumber(ids, [&](unsigned corner) { return keys[corner]; });
     unsigned kept = 0;
     for (unsigned i = 0; i < keys.size(); ++i) {
-        keys[i] = standIns[i] == i ? 1 : 0;
+        keys[i] = keys[i] == i ? 1 : 0;
         kept += keys[i];
     }
-    Renumber(ids, [&](unsigned corner) { return standIns[corner]; });
     return kept;
 }
 

@@ -37,10 +37,10 @@ ZARVertex ReadVertex(ByteReader& bytes) {
 
 /// @return false if the bytes tell of no layer
 bool Read(ByteReader& bytes, HandedSurvey& survey) {
-    survey.moFile = bytes.GetText();
-    survey.moLayer = bytes.GetText();
-    survey.mnSegment = bytes.Get<int>();
-    survey.moStamp.Read(bytes);
+    survey.moOrigin.moFile = bytes.GetText();
+    survey.moOrigin.moLayer = bytes.GetText();
+    survey.moOrigin.mnSegment = bytes.Get<int>();
+    survey.moOrigin.moStamp.Read(bytes);
     survey.moSurvey.mnShapes = bytes.Get<int>();
     survey.moSurvey.mnType = bytes.Get<int>();
     survey.moSurvey.moLow = ReadVertex(bytes);
@@ -53,19 +53,20 @@ bool Read(ByteReader& bytes, HandedSurvey& survey) {
 
 } // namespace
 
-std::string WriteSurvey(const HandedSurvey& survey) {
+std::string WriteSurvey(const SurveyOrigin& origin, const LayerSurvey& survey,
+                        const std::vector<bool>& whole) {
     ByteWriter bytes;
-    bytes.Put(survey.moFile);
-    bytes.Put(survey.moLayer);
-    bytes.Put(survey.mnSegment);
-    survey.moStamp.Write(bytes);
-    bytes.Put(survey.moSurvey.mnShapes);
-    bytes.Put(survey.moSurvey.mnType);
-    Write(survey.moSurvey.moLow, bytes);
-    Write(survey.moSurvey.moHigh, bytes);
-    survey.moSurvey.moIds.Write(bytes);
-    bytes.Put(survey.moWhole);
-    survey.moSurvey.moBlocks.Write(bytes);
+    bytes.Put(origin.moFile);
+    bytes.Put(origin.moLayer);
+    bytes.Put(origin.mnSegment);
+    origin.moStamp.Write(bytes);
+    bytes.Put(survey.mnShapes);
+    bytes.Put(survey.mnType);
+    Write(survey.moLow, bytes);
+    Write(survey.moHigh, bytes);
+    survey.moIds.Write(bytes);
+    bytes.Put(whole);
+    survey.moBlocks.Write(bytes);
 
     ByteWriter framed;
     framed.Put(GetWriter());

@@ -8,20 +8,25 @@
 
 namespace kelm::store {
 
-/// A survey, and all that tells whether it is that of a layer: what travels from one process to
-/// another.
-struct HandedSurvey {
+/// Which layer a survey is of.
+struct SurveyOrigin {
     std::string moFile; ///< name without folders
     std::string moLayer;
     int mnSegment = 0;
     FileStamp moStamp; ///< of the file that was surveyed, from before the survey
-    LayerSurvey moSurvey;
+};
+
+/// What travels from one process to another.
+struct HandedSurvey {
+    SurveyOrigin moOrigin;
+    LayerSurvey moSurvey;      ///< without what it kept
     std::vector<bool> moWhole; ///< see FacetList::GetWhole
 };
 
 /// The bytes are those of one machine and of one state of the libraries that read layers: the byte
 /// order, and the versions of GDAL and GEOS, must be the same where they are read.
-std::string WriteSurvey(const HandedSurvey& survey);
+std::string WriteSurvey(const SurveyOrigin& origin, const LayerSurvey& survey,
+                        const std::vector<bool>& whole);
 
 /// @param file name, for messages @throw kelm::DataException if the bytes are damaged, or were
 /// written by other versions

@@ -87,6 +87,7 @@ class Survey {
     LayerType moType;
     ShapeIds moIds;
     FeatureBlocks moBlocks;
+    KeptFacets moKept;
     Extents moExtents;
     std::vector<ZARVertex> moVertices;
     std::int64_t mnDeliverable = 0;
@@ -134,6 +135,7 @@ void Survey::AddShape() {
         AddFeature();
     const Facet& facet = moWalk.GetFacet();
     const FacetFault fault = ReadFacet(facet, moVertices);
+    moKept.Add(moWalk.GetFeature(), moWalk.GetFacetNumber(), fault, moVertices);
     if (fault == FacetFault::None)
         AddRing(!facet.mpoRing->Is3D());
     const FacetFault reason = fault == FacetFault::None ? facet.meFault : fault;
@@ -179,6 +181,8 @@ LayerSurvey Survey::GetResult() {
     result.mnType = moType.Get(GetLayer());
     result.moIds = moIds;
     result.moBlocks = std::move(moBlocks);
+    if (result.mnType == 2)
+        result.moKept = std::move(moKept);
     if (mnDeliverable > 0) {
         result.moLow = moExtents.moLow;
         result.moHigh = moExtents.moHigh;

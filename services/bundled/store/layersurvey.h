@@ -1,5 +1,6 @@
 #pragma once
 
+#include "services/bundled/store/facets/keptfacets.h"
 #include "services/bundled/store/facets/layerwalk.h"
 #include "services/bundled/store/handles/openfile.h"
 #include "services/bundled/store/runs/featureblocks.h"
@@ -14,6 +15,7 @@ struct LayerSurvey {
     int mnType = 2;   ///< 2 if the layer holds any facets, else 3 for lines, 1 for points
     ShapeIds moIds;
     FeatureBlocks moBlocks; ///< to be used only if feature ids rise
+    KeptFacets moKept;      ///< what the walk has found, for one more walk
     /// Corners of the extents of the deliverable shapes, heights as stored; zero if there is none.
     ZARVertex moLow{};
     ZARVertex moHigh{};

@@ -39,7 +39,7 @@ OpenLayer& StoreFile::GetLayer(int segment) {
 int StoreFile::TakeSurvey(const std::string& survey) {
     HandedSurvey handed = ReadSurvey(survey, mpoDataset->GetName());
     TestSurvey(handed);
-    const int segment = handed.mnSegment;
+    const int segment = handed.moOrigin.mnSegment;
     std::unique_ptr<StoreLayer>& layer = moLayers[static_cast<std::size_t>(segment) - 1];
     if (!layer)
         layer = std::make_unique<StoreLayer>(*this, *mpoDataset, std::move(handed));
@@ -48,15 +48,16 @@ int StoreFile::TakeSurvey(const std::string& survey) {
 
 void StoreFile::TestSurvey(const HandedSurvey& survey) const {
     const std::string file = CPLGetFilename(mpoDataset->GetName().c_str());
-    const bool exists = survey.mnSegment >= 1 && survey.mnSegment <= GetLayerCount() &&
-                        Get(survey.mnSegment).GetName() == survey.moLayer;
+    const bool exists = survey.moOrigin.mnSegment >= 1 &&
+                        survey.moOrigin.mnSegment <= GetLayerCount() &&
+                        Get(survey.moOrigin.mnSegment).GetName() == survey.moOrigin.moLayer;
     std::string reason;
-    if (survey.moFile != file)
-        reason = "it is of file " + survey.moFile;
-    else if (survey.moStamp != mpoDataset->GetStamp())
+    if (survey.moOrigin.moFile != file)
+        reason = "it is of file " + survey.moOrigin.moFile;
+    else if (survey.moOrigin.moStamp != mpoDataset->GetStamp())
         reason = "the file has been written to since";
     else if (!exists)
-        reason = "there is no layer " + survey.moLayer;
+        reason = "there is no layer " + survey.moOrigin.moLayer;
     if (!reason.empty())
         RefuseSurvey(mpoDataset->GetName(), reason);
 }

@@ -5,6 +5,7 @@
 
 #include <cpl_conv.h>
 
+#include <chrono>
 #include <utility>
 
 namespace kelm::store {
@@ -17,34 +18,34 @@ OGRLayer& FindLayer(const Dataset& dataset, int segment) {
     return *dataset.GetLayers()[static_cast<std::size_t>(segment) - 1];
 }
 
+std::int64_t GetNow() {
+    const auto now = std::chrono::system_clock::now().time_since_epoch();
+    return std::chrono::duration_cast<std::chrono::nanoseconds>(now).count();
+}
+
 } // namespace
 
 StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, int segment, const ProgressCall& progress)
     : moFile(file), moDataset(dataset), mnSegment(segment),
-      moWalk(dataset, FindLayer(dataset, segment)), moStamp(dataset.GetStamp()),
+      moWalk(dataset, FindLayer(dataset, segment)), mnOpened(GetNow()), moStamp(dataset.GetStamp()),
       moSurvey(SurveyLayer(moWalk, progress)) {
     shapeCount = moSurvey.mnShapes;
     shapeCountValid = 1;
 }
 
 StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, HandedSurvey survey)
-    : moFile(file), moDataset(dataset), mnSegment(survey.mnSegment),
-      moWalk(dataset, FindLayer(dataset, mnSegment)), moStamp(survey.moStamp),
-      moSurvey(std::move(survey.moSurvey)) {
+    : moFile(file), moDataset(dataset), mnSegment(survey.moOrigin.mnSegment),
+      moWalk(dataset, FindLayer(dataset, mnSegment)), mnOpened(GetNow()),
+      moStamp(survey.moOrigin.moStamp), moSurvey(std::move(survey.moSurvey)) {
     moWalk.GetFacets().SetWhole(std::move(survey.moWhole));
     shapeCount = moSurvey.mnShapes;
     shapeCountValid = 1;
 }
 
 std::string StoreLayer::GetSurvey() const {
-    HandedSurvey handed;
-    handed.moFile = CPLGetFilename(moDataset.GetName().c_str());
-    handed.moLayer = moWalk.GetReader().GetLayer().GetName();
-    handed.mnSegment = mnSegment;
-    handed.moStamp = moStamp;
-    handed.moSurvey = moSurvey;
-    handed.moWhole = moWalk.GetFacets().GetWhole();
-    return WriteSurvey(handed);
+    const SurveyOrigin origin{CPLGetFilename(moDataset.GetName().c_str()),
+                              moWalk.GetReader().GetLayer().GetName(), mnSegment, moStamp};
+    return WriteSurvey(origin, moSurvey, moWalk.GetFacets().GetWhole());
 }
 
 void StoreLayer::SetWindow(const ZARVertex* low, const ZARVertex* high) {
@@ -68,10 +69,21 @@ int StoreLayer::GetFirst() {
 
 void StoreLayer::Restart() {
     mnRun = 0;
+    mbKept = !moRuns && moSurvey.moKept.AreWhole() && IsUntouched();
+    if (mbKept)
+        return moSurvey.moKept.Restart();
+    moSurvey.moKept.Drop();
     moWalk.Restart();
 }
 
+bool StoreLayer::IsUntouched() const {
+    const FileStamp stamp = moDataset.GetStamp();
+    return stamp == moStamp && stamp.AreOlderThan(mnOpened);
+}
+
 bool StoreLayer::Advance() {
+    if (mbKept)
+        return moSurvey.moKept.Advance();
     if (!moRuns)
         return moWalk.Advance();
     while (mnRun == 0 || !moWalk.Advance()) {
@@ -89,22 +101,25 @@ int StoreLayer::GetBehind(int id) {
 
 ZARShape& StoreLayer::GetShape(int id) {
     Seek(id);
-    const FacetFault fault = ReadFacet(moWalk.GetFacet(), moVertices);
+    const FacetFault fault = ReadShape();
     if (fault != FacetFault::None)
         throw DataException(FormatString("Shape %d (feature %lld) of %s cannot be used: %s", id,
-                                         static_cast<long long>(moWalk.GetFeature()),
-                                         GetSubject().c_str(), GetFaultText(fault)),
+                                         static_cast<long long>(GetFeature()), GetSubject().c_str(),
+                                         GetFaultText(fault)),
                             SOURCE, __PRETTY_FUNCTION__, __LINE__);
     moShape = {moVertices.data(), static_cast<int>(moVertices.size())};
     return moShape;
 }
 
+FacetFault StoreLayer::ReadShape() {
+    return mbKept ? moSurvey.moKept.Read(moVertices) : ReadFacet(moWalk.GetFacet(), moVertices);
+}
+
 int StoreLayer::Step() {
     mnId = -1;
     const bool more = Advance();
-    const int id = more ? moSurvey.moIds.GetId(moWalk.GetFeature(), moWalk.GetFacetNumber(),
-                                               moWalk.GetShapes())
-                        : -1;
+    const std::size_t number = mbKept ? moSurvey.moKept.GetFacetNumber() : moWalk.GetFacetNumber();
+    const int id = more ? moSurvey.moIds.GetId(GetFeature(), number, GetShapes()) : -1;
     TestUnchanged(more, id);
     mnId = id;
     return id;
@@ -112,7 +127,7 @@ int StoreLayer::Step() {
 
 /// Some formats end early without an error; that would pass for a smaller surface.
 void StoreLayer::TestUnchanged(bool more, int id) const {
-    if (more ? id < 0 : !moRuns && moWalk.GetShapes() != moSurvey.mnShapes)
+    if (more ? id < 0 : !moRuns && GetShapes() != moSurvey.mnShapes)
         throw DataException(FormatString("The %s has changed since it was opened: there were %d "
                                          "shapes",
                                          GetSubject().c_str(), moSurvey.mnShapes),

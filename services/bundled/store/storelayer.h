@@ -13,6 +13,9 @@ namespace kelm::store {
 
 /// An open layer that GDAL reads: its record, what the survey found, and one walk that all
 /// questions share.
+///
+/// The first walk over the whole layer takes the facets that the survey kept, unless the file was
+/// touched since. Later ones read the file.
 class StoreLayer final : public OpenLayer {
   public:
     /// Surveys the layer. @param file the handle that GetFile gives back, not used otherwise
@@ -40,7 +43,15 @@ class StoreLayer final : public OpenLayer {
 
   private:
     void Restart();
+    bool IsUntouched() const;
     bool Advance();
+    FacetFault ReadShape();
+    std::int64_t GetFeature() const {
+        return mbKept ? moSurvey.moKept.GetFeature() : moWalk.GetFeature();
+    }
+    std::int64_t GetShapes() const {
+        return mbKept ? moSurvey.moKept.GetShapes() : moWalk.GetShapes();
+    }
     int Step();
     void TestUnchanged(bool more, int id) const;
     void Seek(int id);
@@ -50,11 +61,13 @@ class StoreLayer final : public OpenLayer {
     const Dataset& moDataset;
     int mnSegment;
     LayerWalk moWalk;
-    FileStamp moStamp; ///< from before the survey
+    std::int64_t mnOpened; ///< nanoseconds since 1970, from before the survey
+    FileStamp moStamp;     ///< from before the survey
     LayerSurvey moSurvey;
     std::optional<std::vector<FeatureRun>> moRuns; ///< those of the window; none: the whole layer
     std::size_t mnRun = 0;                         ///< the next one
-    int mnId = -1;                                 ///< of the facet that the walk is at, or -1
+    bool mbKept = false; ///< does the walk take what the survey kept, and not the file?
+    int mnId = -1;       ///< of the facet that the walk is at, or -1
     std::vector<ZARVertex> moVertices;
     ZARShape moShape{};
 };

@@ -8,6 +8,15 @@
 
 namespace kelm::store {
 
+namespace {
+
+constexpr std::int64_t SECOND = 1000000000;
+/// Ticks of the clocks of file systems: of those that keep whole seconds, and of others.
+constexpr std::int64_t COARSE_TICK = 2 * SECOND;
+constexpr std::int64_t FINE_TICK = SECOND / 50;
+
+} // namespace
+
 FileStamp::FileStamp(const std::vector<std::string>& files) {
     for (const std::string& file : files)
         for (const char* ending : {"", "-wal", "-journal"})
@@ -22,7 +31,15 @@ void FileStamp::Add(const std::string& path) {
     if (VSIStatL(path.c_str(), &found) != 0 || found.st_size == 0)
         return;
     moParts.push_back({CPLGetFilename(path.c_str()), static_cast<std::int64_t>(found.st_size),
-                       found.st_mtim.tv_sec, found.st_mtim.tv_nsec});
+                       found.st_mtim.tv_sec, found.st_mtim.tv_nsec,
+                       found.st_ctim.tv_sec * SECOND + found.st_ctim.tv_nsec});
+}
+
+bool FileStamp::AreOlderThan(std::int64_t nanoseconds) const {
+    return std::all_of(moParts.begin(), moParts.end(), [&](const Part& part) {
+        const std::int64_t tick = part.mnTouched % SECOND == 0 ? COARSE_TICK : FINE_TICK;
+        return part.mnTouched < nanoseconds - tick;
+    });
 }
 
 bool FileStamp::operator==(const FileStamp& other) const {

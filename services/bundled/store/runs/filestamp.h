@@ -18,6 +18,10 @@ class FileStamp {
 
     bool operator==(const FileStamp& other) const;
     bool operator!=(const FileStamp& other) const { return !(*this == other); }
+    /// Tells what equal stamps alone do not: a time of change can be set back, and two changes in
+    /// one tick of the file system's clock have the same time.
+    /// @param nanoseconds since 1970 @return true if nobody has touched any of the files since then
+    bool AreOlderThan(std::int64_t nanoseconds) const;
 
     void Write(ByteWriter& bytes) const;
     void Read(ByteReader& bytes);
@@ -28,6 +32,7 @@ class FileStamp {
         std::int64_t mnBytes;
         std::int64_t mnSeconds;
         std::int64_t mnNanoseconds;
+        std::int64_t mnTouched = 0; ///< nanoseconds since 1970, which no program can set
     };
 
     void Add(const std::string& path);
