@@ -153,8 +153,8 @@ class KELM_TIN_EXPORT TinReader {
     void ReadShape(int id, const BBox<double, point2_t<double>>* poWindow,
                    load::CornerList& rCorners) const;
     load::ElevationFactor GetElevationFactor() const;
-    Tin* CreateTin(std::vector<containers::KeyPoint<double>>& oPoints,
-                   std::vector<Triangle_Id>& oIds, const LoadOptions& oOptions);
+    Tin* AssembleTin(std::vector<containers::KeyPoint<double>>& oPoints,
+                     std::vector<Triangle_Id>& oIds, const LoadOptions& oOptions);
     load::HeightColumn GetColumn(point3_t<float>* poPoints, unsigned int nCount) const;
 
     ZARLayer_t* mpLayer;

@@ -137,7 +137,7 @@ Tin* TinReader::Load(const Window* poWindow, const LoadOptions& oOptions) {
         meter.Count();
         ReadShape(id, poWindow, corners);
     }
-    return CreateTin(corners.GetPoints(), corners.GetIds(), oOptions);
+    return AssembleTin(corners.GetPoints(), corners.GetIds(), oOptions);
 }
 
 std::string TinReader::GetSurvey() const {
@@ -183,11 +183,11 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
 }
 
 Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds) {
-    return CreateTin(oPoints, oIds, {});
+    return AssembleTin(oPoints, oIds, {});
 }
 
-Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds,
-                          const LoadOptions& oOptions) {
+Tin* TinReader::AssembleTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds,
+                            const LoadOptions& oOptions) {
     if (oPoints.empty() || oIds.empty())
         return nullptr;
     oOptions.progress.Report(READ, "welding corners");
