@@ -45,6 +45,19 @@ TEST_F(ThreadTest, QueriesOfEveryKindOnOneSurfaceAndTree) {
     EXPECT_EQ(mnDifferent, 0);
 }
 
+TEST_F(ThreadTest, BuildsOfAabbTreesInParts) {
+    script.shapes = CreateStrip(21000, 50);
+    const Surface surface = Load(*Open());
+    const AabbTree tree(surface.get());
+    RunOnThreads([&](unsigned thread) {
+        AabbTree own;
+        own.SetCapacity(thread % 2 == 0 ? 5 : 0); // a set of one triangle ends the work in parts
+        own.CreateTree(surface.get());
+        mnDifferent += (own.GetNodeCount() != tree.GetNodeCount()) != (thread % 2 != 0);
+    });
+    EXPECT_EQ(mnDifferent, 0);
+}
+
 TEST_F(ThreadTest, BatchesOnOneCrossingTreeAndSurface) {
     const Surface surface = Load(*Open());
     const AabbTree tree(surface.get());
