@@ -47,15 +47,18 @@ TEST_F(ThreadTest, QueriesOfEveryKindOnOneSurfaceAndTree) {
 
 TEST_F(ThreadTest, BuildsOfAabbTreesInParts) {
     script.shapes = CreateStrip(21000, 50);
-    const Surface surface = Load(*Open());
-    const AabbTree tree(surface.get());
+    const Surface whole = Load(*Open());
+    script.shapes.insert(script.shapes.end(), 9, script.shapes[15000]); // cannot be divided
+    const Surface copies = Load(*Open());
+    const AabbTree tree(whole.get()), raised(copies.get());
     RunOnThreads([&](unsigned thread) {
-        AabbTree own;
-        own.SetCapacity(thread % 2 == 0 ? 5 : 0); // a set of one triangle ends the work in parts
-        own.CreateTree(surface.get());
-        mnDifferent += (own.GetNodeCount() != tree.GetNodeCount()) != (thread % 2 != 0);
+        const AabbTree own(thread % 2 == 0 ? whole.get() : copies.get());
+        const AabbTree& same = thread % 2 == 0 ? tree : raised;
+        mnDifferent += own.GetNodeCount() != same.GetNodeCount();
+        mnDifferent += own.GetCapacity() != same.GetCapacity();
     });
-    EXPECT_EQ(mnDifferent, 0);
+    EXPECT_TRUE(mnDifferent == 0 && tree.GetCapacity() == 5 && raised.GetCapacity() == 10);
+    EXPECT_NE(transcript.Take(), "");
 }
 
 TEST_F(ThreadTest, BatchesOnOneCrossingTreeAndSurface) {

@@ -35,12 +35,7 @@ class SpanDivider {
     SpanDivider(const Triangle* triangles, std::vector<unsigned> order, bool bestAxis)
         : mpoTriangles(triangles), moOrder(std::move(order)), mbBestAxis(bestAxis) {}
 
-    Span GetWhole() const {
-        Span span{0, moOrder.size(), {}, {}};
-        for (const unsigned id : moOrder)
-            span.Add(mpoTriangles[id], CentroidOf(mpoTriangles[id]));
-        return span;
-    }
+    Span GetWhole() const;
 
     const unsigned* GetOrder() const { return moOrder.data(); }
     bool IsAscending() const { return std::is_sorted(moOrder.begin(), moOrder.end()); }
@@ -52,46 +47,11 @@ class SpanDivider {
 
     /// Divides on the axis of choice, or else on the other one, at the same centre.
     /// @return false if neither leaves a triangle on both sides
-    bool Divide(const Span& span, Span& left, Span& right) {
-        float center[2];
-        span.sum.GetMean(span.Size(), center);
-        const Axis axis = ChooseAxis(span, center);
-        return DivideAt(span, axis, center, left, right) ||
-               DivideAt(span, axis == AX_X ? AX_Y : AX_X, center, left, right);
-    }
+    bool Divide(const Span& span, Span& left, Span& right);
 
   private:
-    Axis ChooseAxis(const Span& span, const float* center) const {
-        if (!mbBestAxis)
-            return LongestAxis(span.extent.GetMin(), span.extent.GetMax());
-        const unsigned* order = moOrder.data();
-        return BestAxis(mpoTriangles, order + span.first, order + span.last, center);
-    }
-
-    /// The left side keeps its order at the front of the stretch, the right side behind it.
-    bool DivideAt(const Span& span, Axis axis, const float* center, Span& left, Span& right) {
-        left = Span{span.first, span.first, {}, {}};
-        right = Span{span.first, span.first, {}, {}};
-        const float split = center[axis];
-        for (std::size_t i = span.first; i != span.last; ++i) {
-            const unsigned id = moOrder[i];
-            const Triangle& triangle = mpoTriangles[id];
-            const point2_t<float> centroid = CentroidOf(triangle);
-            if (IsLeft(At(centroid, axis), split)) {
-                left.Add(triangle, centroid);
-                moOrder[left.last++] = id;
-            } else {
-                right.Add(triangle, centroid);
-                moRight[right.last++] = id;
-            }
-        }
-        std::copy(moRight.begin() + std::ptrdiff_t(right.first),
-                  moRight.begin() + std::ptrdiff_t(right.last),
-                  moOrder.begin() + std::ptrdiff_t(left.last));
-        right.first = left.last;
-        right.last = span.last;
-        return left.Size() != 0 && right.Size() != 0;
-    }
+    Axis ChooseAxis(const Span& span, const float* center) const;
+    bool DivideAt(const Span& span, Axis axis, const float* center, Span& left, Span& right);
 
     const Triangle* mpoTriangles;
     std::vector<unsigned> moOrder;
