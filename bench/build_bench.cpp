@@ -4,6 +4,7 @@
 #include <optional>
 
 #include <malloc.h>
+#include <omp.h>
 
 namespace kelm::bench {
 
@@ -22,6 +23,14 @@ void Build(benchmark::State& rState, const std::string& sTerrain) {
     }
     rState.SetItemsProcessed(static_cast<std::int64_t>(terrain->oTriangles.size()) *
                              rState.iterations());
+}
+
+/// A tree on as many threads as the runtime is told to take, by the clock on the wall.
+void BuildTree(benchmark::State& rState, const std::string& sTerrain, int nThreads) {
+    const int before = omp_get_max_threads();
+    omp_set_num_threads(nThreads);
+    Build<Ours>(rState, sTerrain);
+    omp_set_num_threads(before);
 }
 
 /// Bytes that a build takes at its peak and keeps, by a process of its own.
@@ -74,6 +83,12 @@ void AddBuild(const Plan& oPlan) {
         for (const std::string& size : oPlan.GetSizes())
             Add({"build", size + ending, Index<Ours>::GetName()},
                 [=](benchmark::State& state) { Build<Ours>(state, size + ending); });
+    for (const std::string& size : oPlan.GetSizes())
+        for (const int threads : {1, 2})
+            Add({"threads/build of an AabbTree", size, threads == 1 ? "ours" : "two threads"},
+                [=](benchmark::State& state) { BuildTree(state, size, threads); })
+                ->MeasureProcessCPUTime()
+                ->UseRealTime();
     const std::string terrain = oPlan.bQuick ? "100k" : "1M";
     forEachBuild([&](auto tag) {
         const std::string peer = Index<typename decltype(tag)::Type>::GetName();

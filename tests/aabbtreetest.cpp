@@ -1,5 +1,7 @@
 #include "tests/support/gdaltranscript.h"
-#include "tests/support/sheets.h"
+#include "tests/support/oddsurfaces.h"
+
+#include <omp.h>
 
 namespace kelm::tin::test {
 namespace {
@@ -81,6 +83,91 @@ TEST(AabbTreeTest, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
     EXPECT_EQ(EstimateAabbTreeBytes(7), 380U);
     tree.SetCapacity(-1); // no overflow
     EXPECT_GE(tree.EstimateObjBytes(4294967295U), 4294967295U * std::uint64_t{4});
+}
+
+void ExpectSame(const AabbNode* node, const AabbNode* wanted) {
+    std::vector<std::pair<const AabbNode*, const AabbNode*>> pending{{node, wanted}};
+    while (!pending.empty()) {
+        std::tie(node, wanted) = pending.back();
+        pending.pop_back();
+        ASSERT_EQ(node == nullptr, wanted == nullptr);
+        if (node == nullptr)
+            continue;
+        const Box &box = node->GetBBox(), &expected = wanted->GetBBox();
+        ASSERT_TRUE(IsSameBits(box.min.x, expected.min.x) && IsSameBits(box.min.y, expected.min.y));
+        ASSERT_TRUE(IsSameBits(box.max.x, expected.max.x) && IsSameBits(box.max.y, expected.max.y));
+        ASSERT_EQ(node->GetLeaves(), wanted->GetLeaves());
+        pending.emplace_back(node->GetLeft(), wanted->GetLeft());
+        pending.emplace_back(node->GetRight(), wanted->GetRight());
+    }
+}
+
+/// Surfaces that are large enough for a team.
+std::vector<OddSurface> MakeLargeSurfaces(Random& random) {
+    Mesh sheets;
+    while (sheets.ids.size() < 40000) { // in random order over one place, so that no order helps
+        const auto first = static_cast<unsigned>(sheets.vertices.size());
+        const Mesh sheet = MakeSheet(9, random);
+        sheets.vertices.insert(sheets.vertices.end(), sheet.vertices.begin(), sheet.vertices.end());
+        for (const Triangle_Id& id : sheet.ids)
+            sheets.ids.push_back({id.id0 + first, id.id1 + first, id.id2 + first});
+    }
+    Mesh early = sheets, late = sheets, crowded = sheets, holed = sheets;
+    for (unsigned i = 0; i < 70; ++i) {
+        early.Add({1, 1, 0}, {2, 1, 0}, {1, 2, 0});
+        late.Add({228, 228, 0}, {229, 228, 0}, {228, 229, 0});
+        holed.vertices[random.Below(holed.vertices.size())].x = NOT_A_NUMBER;
+    }
+    late.ids.insert(late.ids.begin() + 77, 9, late.ids.back()); // two such sets, the first smaller
+    late.Add({5, 5, 0}, {6, 5, 0}, {5, 6, 0});
+    for (unsigned i = 0; i < 20000; ++i) {
+        const float x = 3 + random.Between(0, 1e-3F), y = 3 + random.Between(0, 1e-3F);
+        crowded.Add({x, y, 0}, {x + 1e-3F, y, 1}, {x, y + 1e-3F, 2});
+    }
+    const auto same = [](float) {
+        return std::array<Point, 3>{Point{1, 1, 0}, Point{4, 2, 1}, Point{2, 5, 2}};
+    };
+    const auto peeled = [](float n) {
+        const float x = std::exp2(std::fmod(n, 240.0F) - 120);
+        return std::array<Point, 3>{Point{x, 0, 0}, Point{x * 1.25F, 0, 1}, Point{x, n, 2}};
+    };
+    return {{"sheets", sheets},
+            {"one set early", early},
+            {"one set late", late},
+            {"crowded", crowded},
+            {"NaN", holed},
+            {"same", MakeEach(30000, same)},
+            {"peeled", MakeEach(30000, peeled)}};
+}
+
+TEST(AabbTreeTest, IsTheSameOnAnyNumberOfThreads) {
+    Random random;
+    kelm::test::GdalTranscript transcript;
+    const int before = omp_get_max_threads();
+    for (const OddSurface& odd : MakeLargeSurfaces(random)) {
+        const OpenTin tin = odd.oMesh.MakeTin();
+        for (const int nCapacity : {5, 64, 0}) {
+            AabbTree wanted;
+            const auto build = [&](int nThreads, AabbTree& rTree) {
+                omp_set_num_threads(nThreads);
+                rTree.GetInfo()->SetDivisionType(nCapacity == 64 ? DT_BestAxis : DT_LongestAxis);
+                rTree.SetCapacity(nCapacity);
+                rTree.CreateTree(&tin);
+                return transcript.Take();
+            };
+            const std::string notes = build(1, wanted);
+            for (const int threads : {2, 3, 8}) {
+                SCOPED_TRACE(odd.sName + ", capacity " + std::to_string(nCapacity) + ", threads " +
+                             std::to_string(threads));
+                AabbTree tree;
+                EXPECT_EQ(build(threads, tree), notes);
+                EXPECT_EQ(tree.GetCapacity(), wanted.GetCapacity());
+                EXPECT_EQ(tree.GetNodeCount(), wanted.GetNodeCount());
+                ExpectSame(tree.GetRoot(), wanted.GetRoot());
+            }
+        }
+    }
+    omp_set_num_threads(before);
 }
 
 // Wrong releases show under the address sanitizer.

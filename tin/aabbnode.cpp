@@ -4,8 +4,8 @@
 #include "tin/index/division.h"
 #include "tin/index/leafwalk.h"
 #include "tin/index/nodeblocks.h"
-#include "tin/index/nodebuilder.h"
 #include "tin/index/segmentprobe.h"
+#include "tin/index/treebuilder.h"
 
 #include <algorithm>
 #include <utility>
@@ -71,8 +71,8 @@ void AabbNode::CreateChild(const Triangle* triangles, const std::vector<unsigned
 
 void AabbNode::Build(const Triangle* triangles, std::vector<unsigned> order, AabbTree& rTree) {
     const bool isBest = rTree.GetDivisionType() == DT_BestAxis;
-    index::NodeBuilder<AabbNode, Site>(triangles, std::move(order), isBest, Site{rTree}, mpoBlocks)
-        .Build(*this);
+    index::SpanDivider divider(triangles, std::move(order), isBest);
+    index::TreeBuilder<AabbNode, Site>(std::move(divider), Site{rTree}, mpoBlocks).Build(*this);
 }
 
 void AabbNode::FindLeaves(float x, float y, std::vector<unsigned>& list) const {

@@ -87,7 +87,8 @@ class KELM_TIN_EXPORT AabbNode {
     ~AabbNode();
 
     /// Makes this node, which must be a default one, the top of a tree over the triangles of
-    /// `list`. Nodes are built depth first, left before right.
+    /// `list`. It is built depth first, left before right; a large one in parts by several threads,
+    /// with the same tree.
     ///
     /// A node of more triangles than the tree's capacity is divided at the mean of the centroids.
     /// A set that cannot be divided on either axis becomes one leaf. A note says so. The size of
@@ -176,6 +177,7 @@ class KELM_TIN_EXPORT AabbTree {
     /// Releases the old nodes and builds anew, with the present parameters. A surface without
     /// triangles gives a tree without a root, which answers every search with nothing.
     ///
+    /// A large surface takes all threads of the runtime; any number of them gives the same tree.
     /// At its peak a build holds, besides the tree, two arrays of one index a triangle.
     /// @throw kelm::ParameterException if poTin is null, with nothing changed; std::bad_alloc, and
     /// the tree is then partly built: build it anew or destroy it

@@ -102,6 +102,34 @@ TEST_F(AllocationFailureTest, SurfaceTreeCopiesSearchesAndSubsets) {
     EXPECT_EQ(kelm::tin::test::AllocationCounter::mnRequests, 0) << "a query needs no memory";
 }
 
+TEST_F(AllocationFailureTest, ATreeThatIsBuiltInParts) {
+    script.shapes = CreateStrip(20002, 50);
+    for (const unsigned copies : {0U, 2500U}) { // no node may have more triangles but these
+        script.shapes.insert(script.shapes.end(), copies, script.shapes[19000]);
+        const Surface surface = Load(*Open());
+        const auto build = [&] {
+            AabbTree tree;
+            tree.SetCapacity(2000);
+            tree.CreateTree(surface.get());
+            EXPECT_EQ(tree.GetCapacity(), copies == 0 ? 2000U : 2501U);
+            return tree.GetNodeCount();
+        };
+        if (copies == 0)
+            FailEach(build);
+        const unsigned nodes = build();
+        for (long n = 1; n < 50; ++n) { // the copies may be met first, and no request fails then
+            const kelm::tin::test::AllocationCounter counter(n, n % 2 == 0);
+            try {
+                EXPECT_EQ(build(), nodes);
+            } catch (const std::bad_alloc&) {
+            }
+            kelm::tin::test::AllocationCounter::mnFailFrom = LONG_MAX;
+            EXPECT_EQ(build(), nodes);
+            EXPECT_EQ(kelm::tin::test::AllocationCounter::mnBalance, 0) << "request " << n;
+        }
+    }
+}
+
 TEST_F(AllocationFailureTest, CrossingTreeAndBatchesOfLines) {
     script.shapes = CreateStrip(240, 50);
     const Surface surface = Load(*Open());

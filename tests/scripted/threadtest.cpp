@@ -45,6 +45,22 @@ TEST_F(ThreadTest, QueriesOfEveryKindOnOneSurfaceAndTree) {
     EXPECT_EQ(mnDifferent, 0);
 }
 
+TEST_F(ThreadTest, BuildsOfAabbTreesInParts) {
+    script.shapes = CreateStrip(21000, 50);
+    const Surface whole = Load(*Open());
+    script.shapes.insert(script.shapes.end(), 9, script.shapes[15000]); // cannot be divided
+    const Surface copies = Load(*Open());
+    const AabbTree tree(whole.get()), raised(copies.get());
+    RunOnThreads([&](unsigned thread) {
+        const AabbTree own(thread % 2 == 0 ? whole.get() : copies.get());
+        const AabbTree& same = thread % 2 == 0 ? tree : raised;
+        mnDifferent += own.GetNodeCount() != same.GetNodeCount();
+        mnDifferent += own.GetCapacity() != same.GetCapacity();
+    });
+    EXPECT_TRUE(mnDifferent == 0 && tree.GetCapacity() == 5 && raised.GetCapacity() == 10);
+    EXPECT_NE(transcript.Take(), "");
+}
+
 TEST_F(ThreadTest, BatchesOnOneCrossingTreeAndSurface) {
     const Surface surface = Load(*Open());
     const AabbTree tree(surface.get());

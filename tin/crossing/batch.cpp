@@ -15,22 +15,36 @@ constexpr float NO_HEIGHT = std::numeric_limits<float>::quiet_NaN();
 std::size_t Batch::Answer(std::size_t first, std::size_t last) {
     mnNext = first;
     mnLast = last;
-    for (bool anyIsTaken = true; anyIsTaken;) {
-        anyIsTaken = false;
-        for (unsigned i = 0; i < mnTurns; ++i)
-            anyIsTaken |= Go(maoTurns[i]);
-    }
+    if (mrIndex.groups < LARGE)
+        AnswerInTurn();
+    else
+        AnswerTogether();
     return mnFound;
 }
 
-/// Goes a step on. A walk that is alone goes to its end.
+void Batch::AnswerInTurn() {
+    Turn turn;
+    while (Take(turn)) {
+        while (!turn.walk.IsDone())
+            turn.walk.Step();
+        Finish(turn);
+    }
+}
+
+void Batch::AnswerTogether() {
+    Turn turns[TURNS];
+    for (bool anyIsTaken = true; anyIsTaken;) {
+        anyIsTaken = false;
+        for (Turn& rTurn : turns)
+            anyIsTaken |= Go(rTurn);
+    }
+}
+
 bool Batch::Go(Turn& rTurn) {
     if (!rTurn.isTaken && !Take(rTurn))
         return false;
-    do {
-        if (!rTurn.walk.IsDone())
-            rTurn.walk.Step();
-    } while (mnTurns == 1 && !rTurn.walk.IsDone());
+    if (!rTurn.walk.IsDone())
+        rTurn.walk.Step();
     if (rTurn.walk.IsDone())
         Finish(rTurn);
     return true;

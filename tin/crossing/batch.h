@@ -12,14 +12,13 @@ class Batch {
   public:
     /// @param segments,heights as in CrossingTree::GetLineIntersectHeights
     Batch(const Index& index, const point3_t<double>* segments, float* heights)
-        : mrIndex(index), mpoSegments(segments), mpfHeights(heights),
-          mnTurns(index.groups < LARGE ? 1 : MOST_TURNS) {}
+        : mrIndex(index), mpoSegments(segments), mpfHeights(heights) {}
 
     /// Answers the segments first .. last-1. @return how many have a crossing
     std::size_t Answer(std::size_t first, std::size_t last);
 
   private:
-    static constexpr unsigned MOST_TURNS = 8;
+    static constexpr unsigned TURNS = 8;
     /// Nodes of blocks from which on walks take turns. Where all is in the cache anyway they would
     /// only get in the way of each other.
     static constexpr unsigned LARGE = 512;
@@ -30,6 +29,10 @@ class Batch {
         bool isTaken = false;
     };
 
+    /// Answers one segment after the other.
+    void AnswerInTurn();
+    void AnswerTogether();
+    /// Goes a step on. @return false if there is nothing left to do
     bool Go(Turn& rTurn);
     bool Take(Turn& rTurn);
     void Finish(Turn& rTurn);
@@ -37,11 +40,9 @@ class Batch {
     const Index& mrIndex;
     const point3_t<double>* mpoSegments;
     float* mpfHeights;
-    unsigned mnTurns;
     std::size_t mnNext = 0;
     std::size_t mnLast = 0;
     std::size_t mnFound = 0;
-    Turn maoTurns[MOST_TURNS];
 };
 
 } // namespace kelm::tin::crossing

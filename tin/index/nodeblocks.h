@@ -2,7 +2,9 @@
 
 #include <algorithm>
 #include <cstddef>
+#include <mutex>
 #include <new>
+#include <utility>
 
 namespace kelm::tin::index {
 
@@ -28,15 +30,27 @@ class NodeBlocks {
     /// @param first null; receives the first block when there is one
     explicit NodeBlocks(NodeBlock*& first) : mrFirst(first) {}
 
+    /// Nodes side by side.
+    struct Run {
+        Node* first = nullptr;
+        Node* last = nullptr;
+    };
+
     /// @return the left of two new default nodes side by side @throw std::bad_alloc
-    Node* MakePair() {
-        if (mpoLast == nullptr || mpoLast->nNodes + 2 > GetCapacity(*mpoLast))
+    Node* MakePair() { return MakeRun(2).first; }
+
+    /// @param most an even number above 0
+    /// @return new default nodes, whose number is even; fewer at the end of a block
+    /// @throw std::bad_alloc
+    Run MakeRun(std::size_t most) {
+        if (mpoLast == nullptr || mpoLast->nNodes == GetCapacity(*mpoLast))
             AddBlock();
-        Node* pair = GetNodes(mpoLast) + mpoLast->nNodes;
-        for (Node* node : {pair, pair + 1})
+        const std::size_t count = std::min(most, GetCapacity(*mpoLast) - mpoLast->nNodes);
+        Node* first = GetNodes(mpoLast) + mpoLast->nNodes;
+        for (Node* node = first; node != first + count; ++node)
             new (node) Node;
-        mpoLast->nNodes += 2;
-        return pair;
+        mpoLast->nNodes += count;
+        return {first, first + count};
     }
 
     /// Destroys the nodes of a chain and frees its memory. Null is an empty chain.
@@ -72,6 +86,30 @@ class NodeBlocks {
     NodeBlock*& mrFirst;
     NodeBlock* mpoLast = nullptr;
     std::size_t mnBytes = PAIR; ///< of the last block
+};
+
+/// Makes nodes for one thread in blocks that several threads share.
+template <typename Node>
+class SharedPairs {
+  public:
+    SharedPairs(NodeBlocks<Node>& rBlocks, std::mutex& rMutex)
+        : mrBlocks(rBlocks), mrMutex(rMutex) {}
+
+    /// As NodeBlocks::MakePair.
+    Node* MakePair() {
+        if (moRun.first == moRun.last) {
+            const std::lock_guard lock(mrMutex);
+            moRun = mrBlocks.MakeRun(RUN);
+        }
+        return std::exchange(moRun.first, moRun.first + 2);
+    }
+
+  private:
+    static constexpr std::size_t RUN = 64;
+
+    NodeBlocks<Node>& mrBlocks;
+    std::mutex& mrMutex;
+    typename NodeBlocks<Node>::Run moRun; ///< yet to be handed out
 };
 
 } // namespace kelm::tin::index
