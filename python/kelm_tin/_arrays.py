@@ -76,6 +76,14 @@ def to_bounds(name: str, value: ArrayLike) -> tuple[float, float, float, float]:
     return xmin, ymin, xmax, ymax
 
 
+def to_position(name: str, value: ArrayLike) -> tuple[float, float]:
+    """Makes x and y, finite."""
+    array = to_floats(name, value)
+    if array.shape != (2,) or not np.isfinite(array).all():
+        raise ValueError(f"{name}: expected two finite numbers, got {value!r}")
+    return float(array[0]), float(array[1])
+
+
 def to_positive(name: str, value: float) -> float:
     """Makes a finite number above 0."""
     array = to_floats(name, value)

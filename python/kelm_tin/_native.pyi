@@ -53,6 +53,7 @@ def read(
     source: Datum,
     output: Datum,
     window: Optional[tuple[float, float, float, float]],
+    base: Optional[tuple[float, float]],
     offset: float,
     scale: float,
     warnings: list[str],

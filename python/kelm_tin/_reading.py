@@ -9,7 +9,7 @@ from typing import NamedTuple, Optional, Union
 from numpy.typing import ArrayLike
 
 from . import _native
-from ._arrays import to_bounds
+from ._arrays import to_bounds, to_position
 from ._surface import Surface
 
 Path = Union[str, "os.PathLike[str]"]
@@ -17,6 +17,26 @@ Path = Union[str, "os.PathLike[str]"]
 
 class DataWarning(UserWarning):
     """Something in a file was left out, or is not as it should be."""
+
+
+class NothingRead(_native.DataError):
+    """No polygon of the layer or window gave a triangle."""
+
+
+class Survey(NamedTuple):
+    path: str
+    layer: int
+    shapes: int
+    bounds: tuple[float, float, float, float]
+    heights: tuple[float, float]
+    crs: Optional[str]
+    load_nbytes: int
+    surface_nbytes: int
+
+
+def survey(path: Path, layer: Optional[int] = None, *, progress: object = None) -> Survey:
+    each = layers(path)[(layer or 1) - 1]
+    return Survey(os.fspath(path), each.number, *each[2:])
 
 
 class Layer(NamedTuple):
@@ -47,8 +67,10 @@ def read(
     source: str = "other",
     output: Optional[str] = None,
     window: Optional[ArrayLike] = None,
+    base: Optional[ArrayLike] = None,
     offset: float = 0.0,
     scale: float = 1.0,
+    survey: Optional[Survey] = None,
 ) -> Surface:
     """Reads a surface from a layer of polygons.
 
@@ -82,6 +104,7 @@ def read(
             _to_datum("source", source),
             _to_datum("output", source if output is None else output),
             None if window is None else to_bounds("window", window),
+            None if base is None else to_position("base", base),
             offset,
             scale,
             texts,
@@ -89,7 +112,7 @@ def read(
     finally:
         _warn(texts)
     if native is None:
-        raise _native.DataError(f"{os.fspath(path)}: no polygon of the layer or window gave a triangle")
+        raise NothingRead(f"{os.fspath(path)}: no polygon of the layer or window gave a triangle")
     return Surface._wrap(native, crs, source if output is None else output)
 
 

@@ -32,9 +32,10 @@ auto Collect(py::list& texts, const Work& work) {
 }
 
 auto ReadFile(const std::string& file, int layer, DatumType source, DatumType output,
-              const std::optional<std::array<double, 4>>& window, double offset, double scale,
+              const std::optional<std::array<double, 4>>& window,
+              const std::optional<std::array<double, 2>>& base, double offset, double scale,
               py::list warnings) {
-    const ReadOptions options{layer, source, output, window, offset, scale};
+    const ReadOptions options{layer, source, output, window, base, offset, scale};
     return Collect(warnings, [&] { return Read(file, options); });
 }
 

@@ -102,7 +102,10 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
         window.min = {(*options.moWindow)[0], (*options.moWindow)[1]};
         window.max = {(*options.moWindow)[2], (*options.moWindow)[3]};
     }
-    std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr));
+    tin::LoadOptions load;
+    if (options.moBase)
+        load.base = {(*options.moBase)[0], (*options.moBase)[1]};
+    std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr, load));
     if (!surface)
         return {nullptr, std::nullopt};
     return {std::make_unique<Surface>(std::move(surface)), GetWkt(reader->GetCRSText())};

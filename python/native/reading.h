@@ -33,6 +33,7 @@ struct ReadOptions {
     ogc::cs::DatumType meSource = ogc::cs::VD_Other;
     ogc::cs::DatumType meOutput = ogc::cs::VD_Other;
     std::optional<std::array<double, 4>> moWindow;
+    std::optional<std::array<double, 2>> moBase;
     double mdfOffset = 0.0;
     double mdfScale = 1.0;
 };
