@@ -81,6 +81,26 @@ KELM_SERVICES_EXPORT int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVer
 KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL void
 ZARSetWindow(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high);
 
+/// Is told how far a long call is. @param done share of the work, from 0 to 1; never falls within
+/// one call, and stays 0 as long as the store cannot tell @param data what ZARSetProgress was given
+/// It may throw to stop the call. The store passes the exception on, and the file stays usable.
+using ZARProgress = void (*)(double done, void* data);
+
+/// Optional. Sets what is told how far ZARGetLayer is, some hundred times a call; null for nothing.
+KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL void ZARSetProgress(_iobuf* file, ZARProgress progress,
+                                                                void* data);
+
+/// Optional. @return what the store found out when it read the layer, as bytes for ZARSetSurvey;
+/// empty if a survey would save nothing
+KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL std::string ZARGetSurvey(ZARLayer_t* layer);
+
+/// Optional, and called before ZARGetLayer. Gives the store the survey of a layer, so that it need
+/// not read the layer to open it. @param survey what ZARGetSurvey gave, in this process or another
+/// @return the segment of the layer. @throw any exception, if the survey is not one of this file as
+/// it is now
+KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL int ZARSetSurvey(_iobuf* file,
+                                                             const std::string& survey);
+
 /// Walks the shapes. @param id -1 or a shape id. @return the first id for -1, else the id behind
 /// `id`; -1 at the end. @throw if the layer cannot be read on, or has no shape `id`
 KELM_SERVICES_EXPORT int ZARGetNext(ZARLayer_t* layer, int id);

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "tin/point.h"
+#include "tin/progress.h"
 
 #include <optional>
 
@@ -13,6 +14,8 @@ struct LoadOptions {
     /// first triangle is the base, so that each window has another one. A vertex has the same x and
     /// y to the bit in all surfaces of one base that make it of the same corner.
     std::optional<point2_t<double>> base = {};
+    /// Is told how far the load is.
+    Progress progress = {};
 };
 
 } // namespace kelm::tin

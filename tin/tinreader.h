@@ -69,7 +69,8 @@ class KELM_TIN_EXPORT TinReader {
     Tin* Load(const BBox<double, point2_t<double>>* poWindow);
     /// Loads as told by options. A note tells if the base lies so far from the surface that
     /// neighbouring positions there are more than 0.001 map units apart.
-    /// @throw kelm::ParameterException if the base is not finite; else as the other Load
+    /// @throw kelm::ParameterException if the base is not finite; CancelledException if the
+    /// progress function stops the load, and what that function throws; else as the other Load
     Tin* Load(const BBox<double, point2_t<double>>* poWindow, const LoadOptions& oOptions);
 
     /// Chooses the vertical datum in which later loads deliver heights. Heights of a local CRS are
@@ -79,6 +80,11 @@ class KELM_TIN_EXPORT TinReader {
     /// installed. The reader then keeps its former output datum
     void SetOutputVerticalDatum(DatumType eType);
 
+    /// @return what opening found out about the layer, as bytes that travel: with them
+    /// TinReaderFactory::CreateTinReader opens the same layer of the same unchanged file without
+    /// reading it. Empty if the services keep no surveys, or the format has none. Runs after a load
+    /// that another thread has begun
+    std::string GetSurvey() const;
     /// @return number of shapes of the layer
     int GetShapeCount() const { return mnShapeCount; }
     /// Extents of the whole layer in map coordinates, heights as stored. Load tests its window

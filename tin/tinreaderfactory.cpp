@@ -52,18 +52,66 @@ void TestFinite(const char* parameter, double value) {
                                  "tin/tinreaderfactory", __PRETTY_FUNCTION__, __LINE__);
 }
 
+/// Hands the survey to the store, if there is one. @return the number of the layer
+int ChooseLayer(_iobuf& file, int nLayer, const std::string& survey) {
+    if (survey.empty())
+        return nLayer < 1 ? ZARSegNext(&file, ZAR_SEGMENT_VECTOR, 0) : nLayer;
+    if (ZARSetSurvey == nullptr)
+        THROW_DATA_EXCEPTION("These services take no surveys");
+    const int surveyed = ZARSetSurvey(&file, survey);
+    if (nLayer >= 1 && nLayer != surveyed)
+        THROW_DATA_EXCEPTION(
+            FormatString("The survey is one of layer %d, not of layer %d", surveyed, nLayer));
+    return surveyed;
+}
+
+/// Lets the store tell a progress function how far it is.
+class ToldProgress {
+  public:
+    ToldProgress(_iobuf& file, const Progress& progress) : mrFile(file), moProgress(progress) {
+        if (ZARSetProgress != nullptr)
+            ZARSetProgress(&file, &ToldProgress::Tell, &moProgress);
+    }
+    ToldProgress(const ToldProgress&) = delete;
+    ToldProgress& operator=(const ToldProgress&) = delete;
+    ~ToldProgress() {
+        if (ZARSetProgress != nullptr)
+            ZARSetProgress(&mrFile, nullptr, nullptr);
+    }
+
+  private:
+    static void Tell(double done, void* data) {
+        static_cast<const Progress*>(data)->Report(done, "surveying the layer");
+    }
+
+    _iobuf& mrFile;
+    Progress moProgress;
+};
+
+ZARLayer_t* GetLayer(_iobuf& file, int number, const Progress& progress) {
+    const ToldProgress told(file, progress);
+    return ZARGetLayer(&file, number);
+}
+
 } // namespace
 
 TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int nLayer,
                                              const double dfOffset, const double dfScale,
                                              const ogc::cs::DatumType eSourceDatum) {
+    return CreateTinReader(pszFilename, nLayer, dfOffset, dfScale, eSourceDatum, {});
+}
+
+TinReader* TinReaderFactory::CreateTinReader(const char* pszFilename, const int nLayer,
+                                             const double dfOffset, const double dfScale,
+                                             const ogc::cs::DatumType eSourceDatum,
+                                             const OpenOptions& oOptions) {
     if (pszFilename == nullptr)
         THROW_DATA_EXCEPTION("The name of the file must be non-null");
     OpenFile file(Open(pszFilename));
     if (ZARSegCount(file.get(), ZAR_SEGMENT_VECTOR) < 1)
         THROW_DATA_EXCEPTION(FormatString("This file %s contains no vector layer", pszFilename));
-    const int layerNumber = nLayer < 1 ? ZARSegNext(file.get(), ZAR_SEGMENT_VECTOR, 0) : nLayer;
-    ZARLayer_t* layer = ZARGetLayer(file.get(), layerNumber);
+    const int layerNumber = ChooseLayer(*file, nLayer, oOptions.survey);
+    ZARLayer_t* layer = GetLayer(*file, layerNumber, oOptions.progress);
     if (layer == nullptr)
         THROW_DATA_EXCEPTION(
             FormatString("ZARGetLayer failed on the provided vector layer %d in the input file %s.",

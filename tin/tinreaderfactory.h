@@ -1,6 +1,7 @@
 #pragma once
 
 #include "services/crs.h"
+#include "tin/openoptions.h"
 #include "tin/tinexport.h"
 
 namespace kelm::tin {
@@ -27,6 +28,14 @@ class KELM_TIN_EXPORT TinReaderFactory {
     static TinReader* CreateTinReader(const char* pszFilename, const int nLayer,
                                       const double dfOffset, const double dfScale,
                                       const ogc::cs::DatumType eSourceDatum);
+    /// The same, as told by options. With a survey, nLayer below 1 means the layer of the survey.
+    /// @throw kelm::DataException if the survey is not one of this layer of the file as it is now,
+    /// or the services take none; CancelledException if the progress function stops the opening,
+    /// and what that function throws
+    static TinReader* CreateTinReader(const char* pszFilename, const int nLayer,
+                                      const double dfOffset, const double dfScale,
+                                      const ogc::cs::DatumType eSourceDatum,
+                                      const OpenOptions& oOptions);
 };
 
 } // namespace kelm::tin

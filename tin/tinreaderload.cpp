@@ -11,6 +11,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <limits>
 #include <memory>
 
@@ -53,6 +54,30 @@ class ToldWindow {
 
   private:
     ZARLayer_t* mpLayer = nullptr; ///< null if nothing was told
+};
+
+// Shares of a load that is done when the shapes are read, and when they are welded.
+constexpr double READ = 0.6;
+constexpr double WELDED = 0.9;
+
+/// Tells the progress of the walk over shapes. A window leaves some of them out, so the walk may
+/// end early.
+class ReadMeter {
+  public:
+    ReadMeter(const Progress& progress, int shapes)
+        : moProgress(progress), mnStep(1 + shapes / 100), mdfShapes(shapes) {}
+
+    void Count() {
+        if (mnDone++ % mnStep == 0)
+            moProgress.Report(READ * std::min(static_cast<double>(mnDone) / mdfShapes, 1.0),
+                              "reading shapes");
+    }
+
+  private:
+    Progress moProgress;
+    std::int64_t mnStep;
+    std::int64_t mnDone = 0;
+    double mdfShapes;
 };
 
 /// The shape, or null if the store cannot deliver it. A store that throws has told why.
@@ -106,9 +131,19 @@ Tin* TinReader::Load(const Window* poWindow, const LoadOptions& oOptions) {
     const ScopedLock lock(moMutex);
     const ToldWindow told(mpLayer, poWindow);
     load::CornerList corners(mnShapeCount);
-    for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id))
+    ReadMeter meter(oOptions.progress, mnShapeCount);
+    for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id)) {
+        meter.Count();
         ReadShape(id, poWindow, corners);
+    }
     return CreateTin(corners.GetPoints(), corners.GetIds(), oOptions);
+}
+
+std::string TinReader::GetSurvey() const {
+    if (mpLayer == nullptr || ZARGetSurvey == nullptr)
+        return {};
+    const ScopedLock lock(moMutex);
+    return ZARGetSurvey(mpLayer);
 }
 
 std::string TinReader::GetCRSText() const {
@@ -150,6 +185,7 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
                           const LoadOptions& oOptions) {
     if (oPoints.empty() || oIds.empty())
         return nullptr;
+    oOptions.progress.Report(READ, "welding corners");
     std::vector<unsigned> oKeys(oPoints.size());
     unsigned nVertices;
     try {
@@ -157,6 +193,7 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
     } catch (...) {
         throw Exception("Octree2 error", "tin/tinreader", __PRETTY_FUNCTION__, __LINE__);
     }
+    oOptions.progress.Report(WELDED, "making the surface");
     load::Assembly parts = load::Assemble(oPoints, oIds, oKeys, nVertices, oOptions.base);
     mdfXBase = parts.base.x;
     mdfYBase = parts.base.y;
@@ -167,6 +204,7 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
     auto surface =
         std::make_unique<Tin>(parts.vertices.get(), parts.vertexCount, parts.triangles.get(),
                               parts.triangleCount, mdfXBase, mdfYBase);
+    oOptions.progress.Report(1.0, "done");
     static_cast<void>(parts.vertices.release());
     static_cast<void>(parts.triangles.release());
     return surface.release();

@@ -30,10 +30,38 @@ struct Extents {
     }
 };
 
+/// Tells the progress some hundred times, however many features there are.
+class Meter {
+  public:
+    /// @param features -1 if that is not known
+    Meter(const ProgressCall& progress, std::int64_t features)
+        : moProgress(progress), mnAll(features) {}
+
+    void Count() {
+        if (++mnDone < mnNext)
+            return;
+        constexpr std::int64_t LEAST_STEP = 4096;
+        mnNext = mnDone + std::max({LEAST_STEP, mnAll / 100, mnDone / 100});
+        if (mnAll > 0)
+            mdfShare = std::min(static_cast<double>(mnDone) / static_cast<double>(mnAll), 1.0);
+        moProgress.Tell(mdfShare);
+    }
+    void Finish() const { moProgress.Tell(1.0); }
+
+  private:
+    ProgressCall moProgress;
+    std::int64_t mnAll;
+    std::int64_t mnDone = 0;
+    std::int64_t mnNext = 1;
+    double mdfShare = 0.0;
+};
+
 /// One survey under way.
 class Survey {
   public:
-    explicit Survey(LayerWalk& walk) : moWalk(walk), moRefusals(walk.GetReader().GetSubject()) {}
+    Survey(LayerWalk& walk, const ProgressCall& progress)
+        : moWalk(walk), moMeter(progress, walk.GetReader().GetKnownCount()),
+          moRefusals(walk.GetReader().GetSubject()) {}
     LayerSurvey Run();
 
   private:
@@ -53,6 +81,7 @@ class Survey {
     OGRLayer& GetLayer() const { return moWalk.GetReader().GetLayer(); }
 
     LayerWalk& moWalk;
+    Meter moMeter;
     Warnings moWarnings;
     RefusalLog moRefusals;
     LayerType moType;
@@ -84,6 +113,7 @@ void Survey::Walk() {
         throw;
     }
     FinishWarnings();
+    moMeter.Finish();
 }
 
 void Survey::TakeWarnings() {
@@ -113,6 +143,7 @@ void Survey::AddShape() {
 }
 
 void Survey::AddFeature() {
+    moMeter.Count();
     moIds.AddFeature(moWalk.GetFeature(), moWalk.GetFacetCount());
     moBlocks.AddFeature(moWalk.GetFeature(), moWalk.GetShapes() - 1, moWalk.GetPolygonsInFront());
 }
@@ -184,8 +215,8 @@ void Survey::ReportIds() const {
 
 } // namespace
 
-LayerSurvey SurveyLayer(LayerWalk& walk) {
-    return Survey(walk).Run();
+LayerSurvey SurveyLayer(LayerWalk& walk, const ProgressCall& progress) {
+    return Survey(walk, progress).Run();
 }
 
 } // namespace kelm::store

@@ -1,6 +1,7 @@
 #pragma once
 
 #include "services/bundled/store/facets/layerwalk.h"
+#include "services/bundled/store/handles/openfile.h"
 #include "services/bundled/store/runs/featureblocks.h"
 #include "services/bundled/store/shapeids.h"
 #include "services/vectorlayer.h"
@@ -20,7 +21,9 @@ struct LayerSurvey {
 
 /// Walks a layer once from its first facet to its last. Warns of the facets that cannot
 /// be used, once a reason, of missing heights and of what GDAL warned of.
-/// @throw kelm::DataException if the layer cannot be read or holds more shapes than an int counts
-LayerSurvey SurveyLayer(LayerWalk& walk);
+/// @param progress is told some hundred times
+/// @throw kelm::DataException if the layer cannot be read or holds more shapes than an int counts;
+/// what the progress throws
+LayerSurvey SurveyLayer(LayerWalk& walk, const ProgressCall& progress);
 
 } // namespace kelm::store

@@ -36,4 +36,16 @@ int ShapeIds::GetId(std::int64_t feature, std::size_t facet, std::int64_t shape)
     return static_cast<int>(feature * mnFactor + part);
 }
 
+void ShapeIds::Write(ByteWriter& bytes) const {
+    bytes.Put(mnLastFeature);
+    bytes.Put(mnShapes);
+    bytes.Put(mnFactor);
+}
+
+void ShapeIds::Read(ByteReader& bytes) {
+    mnLastFeature = bytes.Get<std::int64_t>();
+    mnShapes = bytes.Get<std::int64_t>();
+    mnFactor = bytes.Get<std::int64_t>();
+}
+
 } // namespace kelm::store

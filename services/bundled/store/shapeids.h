@@ -1,5 +1,7 @@
 #pragma once
 
+#include "services/bundled/store/runs/bytes.h"
+
 #include <cstdint>
 
 namespace kelm::store {
@@ -31,6 +33,9 @@ class ShapeIds {
     /// than an int counts
     /// @return the shape id, or -1 if the layer held no such shape when it was opened
     int GetId(std::int64_t feature, std::size_t facet, std::int64_t shape) const;
+
+    void Write(ByteWriter& bytes) const;
+    void Read(ByteReader& bytes);
 
   private:
     bool mbRising = true;

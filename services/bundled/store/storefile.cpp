@@ -4,6 +4,8 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 
+#include <cpl_conv.h>
+
 #include <utility>
 
 namespace kelm::store {
@@ -26,12 +28,37 @@ OGRLayer& StoreFile::Get(int segment) const {
 OpenLayer& StoreFile::GetLayer(int segment) {
     std::unique_ptr<StoreLayer>& layer = moLayers[static_cast<std::size_t>(segment) - 1];
     if (!layer) {
-        layer = std::make_unique<StoreLayer>(*this, *mpoDataset, Get(segment));
+        layer = std::make_unique<StoreLayer>(*this, *mpoDataset, segment, moProgress);
         if (GetLayerCount() > 1 && (layer->GetType() != 2 || layer->shapeCount == 0))
             WarnOfChoice(FormatString("The layer %s of file %s holds no polygons",
                                       Get(segment).GetName(), mpoDataset->GetName().c_str()));
     }
     return *layer;
+}
+
+int StoreFile::TakeSurvey(const std::string& survey) {
+    HandedSurvey handed = ReadSurvey(survey, mpoDataset->GetName());
+    TestSurvey(handed);
+    const int segment = handed.mnSegment;
+    std::unique_ptr<StoreLayer>& layer = moLayers[static_cast<std::size_t>(segment) - 1];
+    if (!layer)
+        layer = std::make_unique<StoreLayer>(*this, *mpoDataset, std::move(handed));
+    return segment;
+}
+
+void StoreFile::TestSurvey(const HandedSurvey& survey) const {
+    const std::string file = CPLGetFilename(mpoDataset->GetName().c_str());
+    const bool exists = survey.mnSegment >= 1 && survey.mnSegment <= GetLayerCount() &&
+                        Get(survey.mnSegment).GetName() == survey.moLayer;
+    std::string reason;
+    if (survey.moFile != file)
+        reason = "it is of file " + survey.moFile;
+    else if (survey.moStamp != mpoDataset->GetStamp())
+        reason = "the file has been written to since";
+    else if (!exists)
+        reason = "there is no layer " + survey.moLayer;
+    if (!reason.empty())
+        RefuseSurvey(mpoDataset->GetName(), reason);
 }
 
 int StoreFile::FindFirst() {

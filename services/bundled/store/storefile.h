@@ -20,13 +20,18 @@ class StoreFile final : public _iobuf {
     OpenLayer& GetLayer(int segment) override;
     int FindFirst() override;
     void WarnOfNumber(int segment) override;
+    void SetProgress(const ProgressCall& progress) override { moProgress = progress; }
+    int TakeSurvey(const std::string& survey) override;
 
   private:
     void WarnOfChoice(const std::string& found);
     OGRLayer& Get(int segment) const;
     std::string GetChoice();
 
+    void TestSurvey(const HandedSurvey& survey) const;
+
     std::unique_ptr<Dataset> mpoDataset;
+    ProgressCall moProgress;
     /// Null until the layer is taken. Declared behind the dataset, which must end last.
     std::vector<std::unique_ptr<StoreLayer>> moLayers;
 };

@@ -3,6 +3,8 @@
 #include "services/exception.h"
 #include "services/reporting.h"
 
+#include <cpl_conv.h>
+
 #include <utility>
 
 namespace kelm::store {
@@ -11,13 +13,38 @@ namespace {
 
 constexpr const char* SOURCE = "services/bundled/store/storelayer";
 
+OGRLayer& FindLayer(const Dataset& dataset, int segment) {
+    return *dataset.GetLayers()[static_cast<std::size_t>(segment) - 1];
+}
+
 } // namespace
 
-StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, OGRLayer& layer)
-    : moFile(file), moDataset(dataset), moWalk(dataset, layer), moStamp(dataset.GetStamp()),
-      moSurvey(SurveyLayer(moWalk)) {
+StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, int segment, const ProgressCall& progress)
+    : moFile(file), moDataset(dataset), mnSegment(segment),
+      moWalk(dataset, FindLayer(dataset, segment)), moStamp(dataset.GetStamp()),
+      moSurvey(SurveyLayer(moWalk, progress)) {
     shapeCount = moSurvey.mnShapes;
     shapeCountValid = 1;
+}
+
+StoreLayer::StoreLayer(_iobuf& file, Dataset& dataset, HandedSurvey survey)
+    : moFile(file), moDataset(dataset), mnSegment(survey.mnSegment),
+      moWalk(dataset, FindLayer(dataset, mnSegment)), moStamp(survey.moStamp),
+      moSurvey(std::move(survey.moSurvey)) {
+    moWalk.GetFacets().SetWhole(std::move(survey.moWhole));
+    shapeCount = moSurvey.mnShapes;
+    shapeCountValid = 1;
+}
+
+std::string StoreLayer::GetSurvey() const {
+    HandedSurvey handed;
+    handed.moFile = CPLGetFilename(moDataset.GetName().c_str());
+    handed.moLayer = moWalk.GetReader().GetLayer().GetName();
+    handed.mnSegment = mnSegment;
+    handed.moStamp = moStamp;
+    handed.moSurvey = moSurvey;
+    handed.moWhole = moWalk.GetFacets().GetWhole();
+    return WriteSurvey(handed);
 }
 
 void StoreLayer::SetWindow(const ZARVertex* low, const ZARVertex* high) {

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "services/bundled/store/handedsurvey.h"
 #include "services/bundled/store/handles/openlayer.h"
 #include "services/bundled/store/layercrs.h"
 #include "services/bundled/store/layersurvey.h"
@@ -15,9 +16,11 @@ namespace kelm::store {
 class StoreLayer final : public OpenLayer {
   public:
     /// Surveys the layer. @param file the handle that GetFile gives back, not used otherwise
-    /// @param dataset owns the layer, and outlives this object
+    /// @param dataset owns the layer, and outlives this object @param segment number of the layer
     /// @throw kelm::DataException, see SurveyLayer
-    StoreLayer(_iobuf& file, Dataset& dataset, OGRLayer& layer);
+    StoreLayer(_iobuf& file, Dataset& dataset, int segment, const ProgressCall& progress);
+    /// Takes a survey that was made of the file as it is now.
+    StoreLayer(_iobuf& file, Dataset& dataset, HandedSurvey survey);
 
     int GetFirst() override;
     int GetBehind(int id) override;
@@ -25,6 +28,7 @@ class StoreLayer final : public OpenLayer {
     /// Walks then skip the blocks of features beside the window, unless the file has been written
     /// to since it was surveyed.
     void SetWindow(const ZARVertex* low, const ZARVertex* high) override;
+    std::string GetSurvey() const override;
     int GetType() const override { return moSurvey.mnType; }
     ZARVertex GetLow() const override { return moSurvey.moLow; }
     ZARVertex GetHigh() const override { return moSurvey.moHigh; }
@@ -44,6 +48,7 @@ class StoreLayer final : public OpenLayer {
 
     _iobuf& moFile;
     const Dataset& moDataset;
+    int mnSegment;
     LayerWalk moWalk;
     FileStamp moStamp; ///< from before the survey
     LayerSurvey moSurvey;

@@ -109,6 +109,18 @@ void ZARSetWindow(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high
     Get(layer).SetWindow(low, high);
 }
 
+void ZARSetProgress(_iobuf* file, ZARProgress progress, void* data) {
+    file->SetProgress({progress, data});
+}
+
+std::string ZARGetSurvey(ZARLayer_t* layer) {
+    return Get(layer).GetSurvey();
+}
+
+int ZARSetSurvey(_iobuf* file, const std::string& survey) {
+    return file->TakeSurvey(survey);
+}
+
 int ZARGetNext(ZARLayer_t* layer, int id) {
     return id == -1 ? Get(layer).GetFirst() : Get(layer).GetBehind(id);
 }

@@ -8,6 +8,7 @@
 
 #include <deque>
 #include <memory>
+#include <utility>
 #include <vector>
 
 namespace kelm::store {
@@ -43,6 +44,11 @@ class FacetList {
     void Restart(std::size_t polygons);
     /// @return the polygons of the layer in front of the geometry that are no triangles
     std::size_t GetPolygonsInFront() const { return mnInFront; }
+
+    /// @return a bit for each polygon of the layer that is no triangle: delivered as it is stored?
+    const std::vector<bool>& GetWhole() const { return moWhole; }
+    /// Takes the bits that an earlier walk over the layer has found.
+    void SetWhole(std::vector<bool> whole) { moWhole = std::move(whole); }
 
     std::size_t GetCount() const { return moFacets.size(); }
     const Facet& Get(std::size_t number) const { return moFacets[number]; }

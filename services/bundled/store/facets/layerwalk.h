@@ -15,8 +15,8 @@ class LayerWalk {
 
     /// Goes back to the position in front of the first facet.
     void Restart();
-    /// Goes to the position in front of a run, behind which Advance gives false. A walk over the
-    /// whole layer must have gone before, and the reader must have runs.
+    /// Goes to the position in front of a run, behind which Advance gives false. The facets must
+    /// know which polygons are whole, and the reader must have runs.
     void Restart(const FeatureRun& run);
     /// Moves to the next facet. @return false behind the last one
     /// @throw kelm::DataException if the layer cannot be read on; Restart must come next
@@ -35,6 +35,8 @@ class LayerWalk {
 
     /// @return the number of the facet in the layer, from 1
     std::int64_t GetShapes() const { return mnShapes; }
+    FacetList& GetFacets() { return moFacets; }
+    const FacetList& GetFacets() const { return moFacets; }
     FeatureReader& GetReader() { return moReader; }
     const FeatureReader& GetReader() const { return moReader; }
 

@@ -39,6 +39,8 @@ class FeatureReader {
     /// before the next call of Next
     Warnings TakeWarnings();
 
+    /// @return the number of features if it is known exactly, else -1
+    std::int64_t GetKnownCount() const { return mnKnown; }
     OGRLayer& GetLayer() const { return moLayer; }
     /// @return what is read, for a message: "layer l of file f"
     const std::string& GetSubject() const { return moSubject; }

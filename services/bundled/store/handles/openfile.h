@@ -1,6 +1,22 @@
 #pragma once
 
 #include "services/bundled/store/handles/openlayer.h"
+#include "services/exception.h"
+
+namespace kelm::store {
+
+/// Whom to tell how far a long call is.
+struct ProgressCall {
+    ZARProgress mpfnTell = nullptr; ///< may be null, and may throw
+    void* mpData = nullptr;
+
+    void Tell(double done) const {
+        if (mpfnTell != nullptr)
+            mpfnTell(done, mpData);
+    }
+};
+
+} // namespace kelm::store
 
 /// An open file as the store hands it out, whatever reads it.
 struct _iobuf {
@@ -19,4 +35,13 @@ struct _iobuf {
     virtual int FindFirst() { return 1; }
     /// Warns that there is no such layer, if any hold polygons, and names these.
     virtual void WarnOfNumber(int /*segment*/) {}
+    /// Tells how far later calls of GetLayer are.
+    virtual void SetProgress(const kelm::store::ProgressCall& /*progress*/) {}
+    /// Makes the layer that a survey is of, without reading it. @return its segment
+    /// @throw kelm::DataException if the survey is not of this file as it is now
+    virtual int TakeSurvey(const std::string& /*survey*/) {
+        throw kelm::DataException("The survey cannot be used: it is not of such a file",
+                                  "services/bundled/store/handles/openfile", __PRETTY_FUNCTION__,
+                                  __LINE__);
+    }
 };

@@ -28,6 +28,9 @@ class OpenLayer : public ZARLayer_t {
     /// walks over all shapes. @param low,high both null: all shapes
     virtual void SetWindow(const ZARVertex* /*low*/, const ZARVertex* /*high*/) {}
 
+    /// @return what opening found out, for _iobuf::TakeSurvey; empty if it cost nothing
+    virtual std::string GetSurvey() const { return {}; }
+
     /// @return 2 if the layer holds any facets, else 3 for lines, 1 for points
     virtual int GetType() const = 0;
     /// @return a corner of the extents of the deliverable shapes, heights as stored; zero if there

@@ -9,9 +9,32 @@ namespace {
 /// A reader may keep a whole run in memory.
 constexpr std::int64_t MOST_JOINED = 8192;
 
+/// Calls a function with each field of a run.
+template <typename Run, typename Function>
+void Visit(Run& run, const Function& function) {
+    function(run.mnFirst);
+    function(run.mnLast);
+    function(run.mnFeatures);
+    function(run.mnShapes);
+    function(run.mnPolygons);
+    function(run.mdfLowX);
+    function(run.mdfLowY);
+    function(run.mdfHighX);
+    function(run.mdfHighY);
+}
+
 bool IsMet(const FeatureRun& block, const ZARVertex& low, const ZARVertex& high) {
     return high.x >= block.mdfLowX && block.mdfHighX >= low.x && high.y >= block.mdfLowY &&
            block.mdfHighY >= low.y;
+}
+
+/// A reader may keep a place for each id between the first and the last.
+bool CanBeRead(const FeatureRun& run) {
+    constexpr std::int64_t MOST_FEATURES = std::int64_t{1} << 31U;
+    const std::uint64_t span =
+        static_cast<std::uint64_t>(run.mnLast) - static_cast<std::uint64_t>(run.mnFirst);
+    return run.mnFirst <= run.mnLast && span < std::uint64_t{1} << 62U && run.mnFeatures > 0 &&
+           run.mnFeatures <= MOST_FEATURES;
 }
 
 /// Adds the run that follows right behind.
@@ -76,6 +99,27 @@ std::vector<FeatureRun> FeatureBlocks::Find(const ZARVertex& low, const ZARVerte
         joins = met;
     }
     return runs;
+}
+
+void FeatureBlocks::Write(ByteWriter& bytes) const {
+    bytes.Put(static_cast<unsigned char>(mbRising));
+    bytes.Put(static_cast<std::uint64_t>(moBlocks.size()));
+    for (const FeatureRun& block : moBlocks)
+        Visit(block, [&](const auto& field) { bytes.Put(field); });
+}
+
+bool FeatureBlocks::Read(ByteReader& bytes, std::size_t polygons) {
+    mbRising = bytes.Get<unsigned char>() != 0;
+    moBlocks.resize(bytes.GetCount(9 * sizeof(std::int64_t)));
+    mnFeatures = 0;
+    bool sound = true;
+    for (FeatureRun& block : moBlocks) {
+        Visit(block,
+              [&](auto& field) { field = bytes.Get<std::remove_reference_t<decltype(field)>>(); });
+        sound = sound && block.mnPolygons <= polygons && (!mbRising || CanBeRead(block));
+        mnFeatures += sound ? block.mnFeatures : 0;
+    }
+    return sound && moBlocks.size() <= MOST_BLOCKS;
 }
 
 } // namespace kelm::store

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "services/bundled/store/runs/bytes.h"
 #include "services/bundled/store/runs/featurerun.h"
 #include "services/vectorlayer.h"
 
@@ -29,6 +30,11 @@ class FeatureBlocks {
     /// @return the blocks whose box shares a point with a window, in reading order; neighbours are
     /// joined to runs of some thousand features
     std::vector<FeatureRun> Find(const ZARVertex& low, const ZARVertex& high) const;
+
+    void Write(ByteWriter& bytes) const;
+    /// @param polygons the layer's polygons that are no triangles
+    /// @return false if these are not the blocks of a layer
+    bool Read(ByteReader& bytes, std::size_t polygons);
 
   private:
     void StartBlock(std::int64_t id, std::int64_t shapes, std::size_t polygons);

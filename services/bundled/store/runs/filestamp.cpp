@@ -33,4 +33,24 @@ bool FileStamp::operator==(const FileStamp& other) const {
                       [&](const Part& a, const Part& b) { return tie(a) == tie(b); });
 }
 
+void FileStamp::Write(ByteWriter& bytes) const {
+    bytes.Put(static_cast<std::uint64_t>(moParts.size()));
+    for (const Part& part : moParts) {
+        bytes.Put(part.moName);
+        bytes.Put(part.mnBytes);
+        bytes.Put(part.mnSeconds);
+        bytes.Put(part.mnNanoseconds);
+    }
+}
+
+void FileStamp::Read(ByteReader& bytes) {
+    moParts.resize(bytes.GetCount(4 * sizeof(std::int64_t)));
+    for (Part& part : moParts) {
+        part.moName = bytes.GetText();
+        part.mnBytes = bytes.Get<std::int64_t>();
+        part.mnSeconds = bytes.Get<std::int64_t>();
+        part.mnNanoseconds = bytes.Get<std::int64_t>();
+    }
+}
+
 } // namespace kelm::store

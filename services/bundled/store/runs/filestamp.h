@@ -1,5 +1,7 @@
 #pragma once
 
+#include "services/bundled/store/runs/bytes.h"
+
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -16,6 +18,9 @@ class FileStamp {
 
     bool operator==(const FileStamp& other) const;
     bool operator!=(const FileStamp& other) const { return !(*this == other); }
+
+    void Write(ByteWriter& bytes) const;
+    void Read(ByteReader& bytes);
 
   private:
     struct Part {

@@ -1,0 +1,99 @@
+#include "services/bundled/store/handedsurvey.h"
+
+#include "services/bundled/store/facets/cutting/planecutter.h"
+#include "services/exception.h"
+#include "services/reporting.h"
+
+#include <gdal.h>
+
+#include <utility>
+
+namespace kelm::store {
+
+namespace {
+
+/// Who wrote a survey. To be changed with what Write writes, or with what becomes of a geometry.
+std::string GetWriter() {
+    constexpr std::uint32_t BYTE_ORDER_MARK = 0x01020304;
+    ByteWriter mark;
+    mark.Put(BYTE_ORDER_MARK);
+    return "survey 1, GDAL " + std::string(GDALVersionInfo("RELEASE_NAME")) + ", GEOS " +
+           GEOSversion() + mark.GetBytes();
+}
+
+void Write(const ZARVertex& vertex, ByteWriter& bytes) {
+    bytes.Put(vertex.x);
+    bytes.Put(vertex.y);
+    bytes.Put(vertex.z);
+}
+
+ZARVertex ReadVertex(ByteReader& bytes) {
+    ZARVertex vertex{};
+    vertex.x = bytes.Get<double>();
+    vertex.y = bytes.Get<double>();
+    vertex.z = bytes.Get<double>();
+    return vertex;
+}
+
+/// @return false if the bytes tell of no layer
+bool Read(ByteReader& bytes, HandedSurvey& survey) {
+    survey.moFile = bytes.GetText();
+    survey.moLayer = bytes.GetText();
+    survey.mnSegment = bytes.Get<int>();
+    survey.moStamp.Read(bytes);
+    survey.moSurvey.mnShapes = bytes.Get<int>();
+    survey.moSurvey.mnType = bytes.Get<int>();
+    survey.moSurvey.moLow = ReadVertex(bytes);
+    survey.moSurvey.moHigh = ReadVertex(bytes);
+    survey.moSurvey.moIds.Read(bytes);
+    survey.moWhole = bytes.GetBits();
+    const bool sound = survey.moSurvey.moBlocks.Read(bytes, survey.moWhole.size());
+    return sound && !bytes.HasFailed() && bytes.IsAtEnd();
+}
+
+} // namespace
+
+std::string WriteSurvey(const HandedSurvey& survey) {
+    ByteWriter bytes;
+    bytes.Put(survey.moFile);
+    bytes.Put(survey.moLayer);
+    bytes.Put(survey.mnSegment);
+    survey.moStamp.Write(bytes);
+    bytes.Put(survey.moSurvey.mnShapes);
+    bytes.Put(survey.moSurvey.mnType);
+    Write(survey.moSurvey.moLow, bytes);
+    Write(survey.moSurvey.moHigh, bytes);
+    survey.moSurvey.moIds.Write(bytes);
+    bytes.Put(survey.moWhole);
+    survey.moSurvey.moBlocks.Write(bytes);
+
+    ByteWriter framed;
+    framed.Put(GetWriter());
+    framed.Put(ComputeChecksum(bytes.GetBytes()));
+    framed.Put(bytes.GetBytes());
+    return framed.GetBytes();
+}
+
+HandedSurvey ReadSurvey(const std::string& bytes, const std::string& file) {
+    ByteReader framed(bytes);
+    const std::string writer = framed.GetText();
+    const auto sum = framed.Get<std::uint64_t>();
+    const std::string content = framed.GetText();
+    if (framed.HasFailed() || !framed.IsAtEnd() || sum != ComputeChecksum(content))
+        RefuseSurvey(file, "it is damaged");
+    if (writer != GetWriter())
+        RefuseSurvey(file, "other versions of the libraries made it");
+    ByteReader reader(content);
+    HandedSurvey survey;
+    if (!Read(reader, survey))
+        RefuseSurvey(file, "it is damaged");
+    return survey;
+}
+
+void RefuseSurvey(const std::string& file, const std::string& reason) {
+    throw DataException(
+        FormatString("The survey cannot be used for file %s: %s", file.c_str(), reason.c_str()),
+        "services/bundled/store/handedsurvey", __PRETTY_FUNCTION__, __LINE__);
+}
+
+} // namespace kelm::store
