@@ -79,7 +79,8 @@ struct WindowTest : FileTest {
         SCOPED_TRACE(path);
         const File oFile = OpenFile(path);
         ZARLayer_t* const poLayer = ZARGetLayer(oFile.get(), 1);
-        const auto poReader = OpenReader(path), poWhole = OpenReader(path);
+        const auto poWhole = OpenReader(path), poReader = OpenSurveyed(path, poWhole->GetSurvey());
+        EXPECT_EQ(poReader->GetSurvey(), poWhole->GetSurvey());
         const auto tNow = fs::last_write_time(path);
         const Shapes oAll = Walk(poLayer);
         for (const Window& oWindow : MakeWindows()) {

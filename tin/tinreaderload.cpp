@@ -209,10 +209,10 @@ Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Tr
     if (oOptions.base)
         ReportFarBase(parts.base, oBox);
     (this->*mpfnHeightConvert)(&oBox, parts.vertices.get(), nVertices);
+    oOptions.progress.Report(1.0, "done"); // a stop still finds an owner for the parts
     auto surface =
         std::make_unique<Tin>(parts.vertices.get(), parts.vertexCount, parts.triangles.get(),
                               parts.triangleCount, mdfXBase, mdfYBase);
-    oOptions.progress.Report(1.0, "done");
     static_cast<void>(parts.vertices.release());
     static_cast<void>(parts.triangles.release());
     return surface.release();

@@ -42,6 +42,14 @@ inline std::unique_ptr<tin::TinReader> OpenReader(const std::string& path, int n
         tin::TinReaderFactory::CreateTinReader(path.c_str(), nLayer, 0.0, 1.0, eDatum));
 }
 
+/// @param survey of the layer, as GetSurvey gave it
+inline std::unique_ptr<tin::TinReader> OpenSurveyed(const std::string& path,
+                                                    const std::string& survey, int nLayer = 0,
+                                                    const tin::Progress& oProgress = {}) {
+    return std::unique_ptr<tin::TinReader>(tin::TinReaderFactory::CreateTinReader(
+        path.c_str(), nLayer, 0.0, 1.0, ogc::cs::VD_Other, {survey, oProgress}));
+}
+
 /// A layer to be written.
 struct LayerText {
     /// Well-known texts, whose rings need not be closed; an empty one is a feature without
@@ -97,7 +105,8 @@ inline std::string MakeTriangle(double dfX, double dfY, double dfZ) {
 struct FileTest : testing::Test {
     FileTest() { moTranscript.moFolder = moFolder.GetPath(""); }
     /// Writes a new file of a layer "facets", and another if wanted, without a word in the
-    /// transcript. FlatGeobuf gets an index if the name begins with "indexed". @return its path @throw std::runtime_error with GDAL's reason
+    /// transcript. FlatGeobuf gets an index if the name begins with "indexed". @return its path
+    /// @throw std::runtime_error with GDAL's reason
     std::string Write(const LayerText& oText, const char* pszFormat = "GPKG",
                       const std::string& name = "a.gpkg", bool bTwice = false) {
         const CPLErrorHandlerPusher oQuiet(CPLQuietErrorHandler);
