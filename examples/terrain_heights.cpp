@@ -13,9 +13,7 @@
 
 #include <sys/resource.h>
 
-#include <chrono>
 #include <cmath>
-#include <future>
 #include <optional>
 
 using namespace kelm::ogc::cs;
@@ -24,10 +22,8 @@ using namespace kelm::tin;
 namespace {
 
 struct Options {
-    DatumType source = VD_Other;
+    HeightOptions heights;
     std::optional<DatumType> output; ///< none: the same as the source
-    double offset = 0.0;
-    double scale = 1.0;
     std::vector<double> window;
     std::vector<double> positions; ///< x and y in turn
     bool readStdin = false;
@@ -36,12 +32,13 @@ struct Options {
 void DefineOptions(CLI::App& app, Options& options) {
     const CLI::CheckedTransformer datums(std::map<std::string, DatumType>{
         {"other", VD_Other}, {"orthometric", VD_Orthometric}, {"ellipsoidal", VD_Ellipsoidal}});
-    app.add_option("--source", options.source, "Vertical datum of the stored heights")
+    app.add_option("--source", options.heights.source, "Vertical datum of the stored heights")
         ->transform(datums);
     app.add_option("--output", options.output, "Vertical datum of the answers; else as --source")
         ->transform(datums);
-    app.add_option("--offset", options.offset, "A stored height h counts as (h + offset) * scale");
-    app.add_option("--scale", options.scale, "See --offset");
+    app.add_option("--offset", options.heights.offset,
+                   "A stored height h counts as (h + offset) * scale");
+    app.add_option("--scale", options.heights.scale, "See --offset");
     app.add_option("--window", options.window, "xmin,ymin,xmax,ymax: load what meets this box")
         ->delimiter(',')
         ->expected(4);
@@ -72,23 +69,13 @@ void PrintLayer(const TinReader& reader, const OGRSpatialReference& crs) {
                  Bytes{HeightGrid::EstimateObjBytes(shapes)});
 }
 
-/// Loads on another thread, so that this thread can print how long the load has run.
 std::unique_ptr<Tin> Load(TinReader& reader, const std::vector<double>& sides) {
     BBox<double, point2_t<double>> window;
     if (!sides.empty()) {
         window.min = {sides[0], sides[1]};
         window.max = {sides[2], sides[3]};
     }
-    auto load = std::async(std::launch::async,
-                           [&] { return reader.Load(sides.empty() ? nullptr : &window); });
-    int seconds = 0;
-    while (load.wait_for(std::chrono::seconds(1)) != std::future_status::ready)
-        std::fprintf(stderr, "\rloading for %d s", ++seconds);
-    std::fputs(seconds > 0 ? "\n" : "", stderr);
-    std::unique_ptr<Tin> surface(load.get());
-    if (!surface)
-        throw std::runtime_error("no polygon of the layer or the window gave a triangle");
-    return surface;
+    return LoadTerrain(reader, sides.empty() ? nullptr : &window);
 }
 
 void PrintHeights(const HeightGrid& index, const std::vector<point2_t<double>>& positions) {
@@ -125,9 +112,8 @@ void PrintHeightsOfStdin(const HeightGrid& index) {
 void Run(const Layer& layer, const Options& options) {
     if (options.positions.size() % 2 != 0)
         throw CLI::ValidationError("--at", "a position is a pair x,y");
-    const std::unique_ptr<TinReader> reader(TinReaderFactory::CreateTinReader(
-        layer.file.c_str(), layer.number, options.offset, options.scale, options.source));
-    reader->SetOutputVerticalDatum(options.output.value_or(options.source));
+    const std::unique_ptr<TinReader> reader = OpenTerrain(layer, options.heights);
+    reader->SetOutputVerticalDatum(options.output.value_or(options.heights.source));
     PrintLayer(*reader, ReadCrs(layer));
 
     const Bytes before = GetPeakBytes();
