@@ -12,6 +12,7 @@ from numpy.typing import ArrayLike, NDArray
 
 from .._arrays import FloatArray, to_position, to_positive
 from .._reading import Path, Survey, survey
+from .._reading import _to_datum as to_datum
 
 Tile = tuple[int, int]
 """Row from the north on, column from the west on."""
@@ -84,6 +85,8 @@ class Plan:
             self._set(base=to_position("base", self.base))
         if self.limit is not None:
             self._set(limit=int(to_positive("limit", self.limit)))
+        for name in ("source", "output"):
+            to_datum(name, getattr(self, name) or "other")
         if self.survey is None:
             self._set(survey=survey(self.path, self.layer, progress=progress))
         rows, columns = self.tiles
