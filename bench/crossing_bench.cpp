@@ -77,11 +77,13 @@ void AskCrossingTree(const std::string& sTerrain, const Questions& oQuestions, A
         });
 }
 
-void AskCrossingTreeBatch(const std::string& sTerrain, const Questions& oQuestions,
-                          Answers& rAnswers, benchmark::State& rState) {
+template <int THREADS>
+void AskBatch(const std::string& sTerrain, const Questions& oQuestions, Answers& rAnswers,
+              benchmark::State& rState) {
     const auto index = GetCrossingTree(sTerrain);
     for (auto _ : rState)
-        index->GetLineIntersectHeights(oQuestions.oMap.data(), rAnswers.size(), rAnswers.data(), 1);
+        index->GetLineIntersectHeights(oQuestions.oMap.data(), rAnswers.size(), rAnswers.data(),
+                                       THREADS);
 }
 
 #ifdef KELM_BENCH_EMBREE
@@ -97,7 +99,7 @@ void AskEmbree(const std::string& sTerrain, const Questions& oQuestions, Answers
 
 constexpr std::pair<const char*, Way> WAYS[] = {
     {"ours", AskCrossingTree},
-    {"ours, batch", AskCrossingTreeBatch},
+    {"ours, batch", AskBatch<1>},
     {"Tin with its tree", AskTin},
 #ifdef KELM_BENCH_EMBREE
     {"Embree, all hits", AskEmbree<Batching::Single>},
@@ -133,6 +135,22 @@ void Cross(benchmark::State& rState, const std::string& sTerrain, unsigned nPerc
     rState.counters["differ"] = static_cast<double>(differ);
 }
 
+void Build(benchmark::State& rState, const std::string& sTerrain, int nThreads) {
+    const auto surface = GetSurface(sTerrain);
+    std::optional<tin::CrossingTree> tree;
+    tin::BuildOptions options;
+    options.threads = nThreads;
+    for (auto _ : rState) {
+        tree.emplace(*surface, options);
+        rState.PauseTiming();
+        rState.counters["bytes"] =
+            static_cast<double>(tree->GetObjBytes()) / surface->GetTriangleCount();
+        tree.reset();
+        rState.ResumeTiming();
+    }
+    rState.SetItemsProcessed(std::int64_t{surface->GetTriangleCount()} * rState.iterations());
+}
+
 } // namespace
 
 void AddCrossing(const Plan& oPlan) {
@@ -144,19 +162,22 @@ void AddCrossing(const Plan& oPlan) {
                         Cross(state, terrain, percent, way);
                     });
     for (const std::string& terrain : oPlan.GetTerrains())
-        Add({"build", terrain, "crossing tree"}, [terrain](benchmark::State& state) {
-            const auto surface = GetSurface(terrain);
-            std::optional<tin::CrossingTree> tree;
-            for (auto _ : state) {
-                tree.emplace(*surface);
-                state.PauseTiming();
-                state.counters["bytes"] =
-                    static_cast<double>(tree->GetObjBytes()) / surface->GetTriangleCount();
-                tree.reset();
-                state.ResumeTiming();
-            }
-            state.SetItemsProcessed(std::int64_t{surface->GetTriangleCount()} * state.iterations());
-        });
+        Add({"build", terrain, "crossing tree"},
+            [terrain](benchmark::State& state) { Build(state, terrain, 1); });
+    for (const std::string& size : oPlan.GetSizes())
+        for (const int threads : {1, 2}) {
+            const char* who = threads == 1 ? "ours" : "two threads";
+            Add({"threads/build of a crossing tree", size, who},
+                [=](benchmark::State& state) { Build(state, size, threads); })
+                ->MeasureProcessCPUTime()
+                ->UseRealTime();
+            Add({"threads/crossings", size, who},
+                [=](benchmark::State& state) {
+                    Cross(state, size, 2, threads == 1 ? AskBatch<1> : AskBatch<2>);
+                })
+                ->MeasureProcessCPUTime()
+                ->UseRealTime();
+        }
 }
 
 } // namespace kelm::bench

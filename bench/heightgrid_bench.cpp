@@ -163,12 +163,14 @@ void AddThreads(const std::string& sTerrain) {
     for (const int threads : {1, 2}) {
         const char* who = threads == 1 ? "ours" : "two threads";
         const auto answer = threads == 1 ? AnswerBatch<1> : AnswerBatch<2>;
-        Add({"threads/heights", sTerrain, who}, [=](benchmark::State& state) {
-            Run(state, sTerrain, "random", answer);
-        })->UseRealTime();
-        Add({"threads/build", sTerrain, who}, [=](benchmark::State& state) {
-            BuildGrid(state, sTerrain, threads);
-        })->UseRealTime();
+        Add({"threads/heights", sTerrain, who},
+            [=](benchmark::State& state) { Run(state, sTerrain, "random", answer); })
+            ->MeasureProcessCPUTime()
+            ->UseRealTime();
+        Add({"threads/build", sTerrain, who},
+            [=](benchmark::State& state) { BuildGrid(state, sTerrain, threads); })
+            ->MeasureProcessCPUTime()
+            ->UseRealTime();
     }
 }
 

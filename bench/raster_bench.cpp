@@ -222,12 +222,14 @@ void AddRaster(const Plan& oPlan) {
 #endif
         if (size == "100k")
             add("GDAL linear grid", GridByGdal);
-        Add({"threads/raster", size, "ours"}, [=](benchmark::State& state) {
-            MakeRaster(state, terrain, CallOurs<1>);
-        })->UseRealTime();
-        Add({"threads/raster", size, "two threads"}, [=](benchmark::State& state) {
-            MakeRaster(state, terrain, CallOurs<2>);
-        })->UseRealTime();
+        Add({"threads/raster", size, "ours"},
+            [=](benchmark::State& state) { MakeRaster(state, terrain, CallOurs<1>); })
+            ->MeasureProcessCPUTime()
+            ->UseRealTime();
+        Add({"threads/raster", size, "two threads"},
+            [=](benchmark::State& state) { MakeRaster(state, terrain, CallOurs<2>); })
+            ->MeasureProcessCPUTime()
+            ->UseRealTime();
     }
 }
 

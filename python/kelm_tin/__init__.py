@@ -17,18 +17,21 @@ import importlib
 from types import ModuleType
 
 from ._native import DataError
-from ._reading import DataWarning, Layer, layers, read
+from ._reading import DataWarning, Layer, NothingRead, Survey, layers, read, survey
 from ._surface import Profile, Raster, Surface
 
 __all__ = [
     "DataError",
     "DataWarning",
     "Layer",
+    "NothingRead",
     "Profile",
     "Raster",
     "Surface",
+    "Survey",
     "layers",
     "read",
+    "survey",
 ]
 
 

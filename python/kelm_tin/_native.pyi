@@ -1,4 +1,4 @@
-from typing import Optional
+from typing import Callable, Optional
 
 import numpy as np
 from numpy.typing import NDArray
@@ -56,6 +56,18 @@ def read(
     base: Optional[tuple[float, float]],
     offset: float,
     scale: float,
+    survey: bytes,
+    progress: Optional[Callable[[int, int], object]],
     warnings: list[str],
 ) -> tuple[Optional[Surface], Optional[str]]: ...
+def survey(
+    file: str, layer: int, progress: Optional[Callable[[int, int], object]], warnings: list[str]
+) -> tuple[LayerFacts, bytes]: ...
+def count(
+    file: str,
+    layer: int,
+    survey: bytes,
+    windows: list[tuple[float, float, float, float]],
+    warnings: list[str],
+) -> list[int]: ...
 def layers(file: str, warnings: list[str]) -> list[LayerFacts]: ...

@@ -4,7 +4,8 @@ from __future__ import annotations
 
 import os
 import warnings
-from typing import NamedTuple, Optional, Union
+from dataclasses import dataclass, field
+from typing import Callable, NamedTuple, Optional, Union
 
 from numpy.typing import ArrayLike
 
@@ -13,6 +14,7 @@ from ._arrays import to_bounds, to_position
 from ._surface import Surface
 
 Path = Union[str, "os.PathLike[str]"]
+Progress = Callable[[int, int], object]
 
 
 class DataWarning(UserWarning):
@@ -21,22 +23,6 @@ class DataWarning(UserWarning):
 
 class NothingRead(_native.DataError):
     """No polygon of the layer or window gave a triangle."""
-
-
-class Survey(NamedTuple):
-    path: str
-    layer: int
-    shapes: int
-    bounds: tuple[float, float, float, float]
-    heights: tuple[float, float]
-    crs: Optional[str]
-    load_nbytes: int
-    surface_nbytes: int
-
-
-def survey(path: Path, layer: Optional[int] = None, *, progress: object = None) -> Survey:
-    each = layers(path)[(layer or 1) - 1]
-    return Survey(os.fspath(path), each.number, *each[2:])
 
 
 class Layer(NamedTuple):
@@ -60,6 +46,27 @@ class Layer(NamedTuple):
     """Estimated bytes of the surface."""
 
 
+@dataclass(frozen=True)
+class Survey:
+    """What one walk over a layer has found: `read` then opens the file without another walk.
+
+    A plain value that pickles: a thousand processes can read windows of a file that one has surveyed. It
+    holds for the file as it was: its name, sizes and times of change must be the same where it is read.
+    """
+
+    path: str
+    layer: Optional[int]
+    """Number of the layer as `survey` was given it; None for the first with polygons."""
+    shapes: int
+    bounds: tuple[float, float, float, float]
+    heights: tuple[float, float]
+    crs: Optional[str]
+    load_nbytes: int
+    surface_nbytes: int
+    data: bytes = field(repr=False)
+    """The survey itself, for `read`. Empty where a survey would save nothing."""
+
+
 def read(
     path: Path,
     layer: Optional[int] = None,
@@ -70,6 +77,7 @@ def read(
     base: Optional[ArrayLike] = None,
     offset: float = 0.0,
     scale: float = 1.0,
+    progress: Optional[Progress] = None,
     survey: Optional[Survey] = None,
 ) -> Surface:
     """Reads a surface from a layer of polygons.
@@ -80,12 +88,18 @@ def read(
         source: vertical datum of the stored heights: "orthometric", "ellipsoidal" or "other".
         output: vertical datum of the answers; None for that of the source.
         window: xmin, ymin, xmax, ymax in map coordinates: only polygons that meet it are loaded, whole.
+        base: x, y that the stored positions are relative to, in map coordinates; None for the first corner
+            that is kept. Two windows read with one base have the same bits where they share polygons.
         offset, scale: a stored height h counts as (h + offset) * scale.
+        progress: called with (done, total), some hundred times: done rises from 0 to total, which is 100.
+            What it raises stops the read and is raised from here. So does Ctrl-C.
+        survey: of this layer, from `survey`, so that the layer is not walked to open it.
 
     Raises:
         OSError: the file cannot be opened.
-        DataError: the layer holds no polygons, no polygon gave a triangle, or heights cannot be
-            converted.
+        DataError: the layer holds no polygons, heights cannot be converted, or the file was written to
+            since its survey.
+        NothingRead: no polygon of the layer or window gave a triangle. It is a DataError.
 
     Warns:
         DataWarning: for example for a polygon that was left out.
@@ -94,19 +108,19 @@ def read(
     >>> len(surface.triangles)
     17619
     """
-    if layer is not None and (not isinstance(layer, int) or layer < 1):
-        raise ValueError(f"layer: expected an integer from 1 on, got {layer!r}")
     texts: list[str] = []
     try:
         native, crs = _native.read(
             _to_file(path),
-            layer or 0,
-            _to_datum("source", source),
-            _to_datum("output", source if output is None else output),
+            _to_number(layer),
+            to_datum("source", source),
+            to_datum("output", source if output is None else output),
             None if window is None else to_bounds("window", window),
             None if base is None else to_position("base", base),
             offset,
             scale,
+            b"" if survey is None else survey.data,
+            progress,
             texts,
         )
     finally:
@@ -114,6 +128,52 @@ def read(
     if native is None:
         raise NothingRead(f"{os.fspath(path)}: no polygon of the layer or window gave a triangle")
     return Surface._wrap(native, crs, source if output is None else output)
+
+
+def survey(path: Path, layer: Optional[int] = None, *, progress: Optional[Progress] = None) -> Survey:
+    """Walks over a layer once and returns what it found.
+
+    Args:
+        path, layer, progress: as for `read`.
+
+    Raises:
+        OSError: the file cannot be opened.
+        DataError: the layer holds no polygons.
+
+    Warns:
+        DataWarning: as `read` does. A read with the survey does not warn again of what the walk found.
+
+    >>> found = survey("data/jacksboro.gpkg")
+    >>> xmin, ymin, xmax, ymax = found.bounds
+    >>> part = read("data/jacksboro.gpkg", window=(xmin, ymin, xmin + 1000, ymin + 1000), survey=found)
+    """
+    texts: list[str] = []
+    try:
+        facts, data = _native.survey(_to_file(path), _to_number(layer), progress, texts)
+    finally:
+        _warn(texts)
+    return Survey(
+        os.fspath(path),
+        layer,
+        facts.shapes,
+        _to_plan(facts),
+        _to_heights(facts),
+        facts.crs,
+        facts.load_nbytes,
+        facts.surface_nbytes,
+        data,
+    )
+
+
+def count_shapes(
+    path: Path, found: Survey, windows: list[tuple[float, float, float, float]]
+) -> list[int]:
+    """For each window a bound on the number of shapes that meet it, without a walk. Raises as `read`."""
+    texts: list[str] = []
+    try:
+        return _native.count(_to_file(path), _to_number(found.layer), found.data, windows, texts)
+    finally:
+        _warn(texts)
 
 
 def layers(path: Path) -> list[Layer]:
@@ -135,8 +195,8 @@ def layers(path: Path) -> list[Layer]:
             each.number,
             each.refusal,
             each.shapes,
-            (each.box[0], each.box[1], each.box[3], each.box[4]),
-            (each.box[2], each.box[5]),
+            _to_plan(each),
+            _to_heights(each),
             each.crs,
             each.load_nbytes,
             each.surface_nbytes,
@@ -152,7 +212,23 @@ def _to_file(path: Path) -> str:
     return name
 
 
-def _to_datum(name: str, value: str) -> _native.Datum:
+def _to_number(layer: Optional[int]) -> int:
+    if layer is None:
+        return 0
+    if not isinstance(layer, int) or layer < 1:
+        raise ValueError(f"layer: expected an integer from 1 on, got {layer!r}")
+    return layer
+
+
+def _to_plan(facts: _native.LayerFacts) -> tuple[float, float, float, float]:
+    return facts.box[0], facts.box[1], facts.box[3], facts.box[4]
+
+
+def _to_heights(facts: _native.LayerFacts) -> tuple[float, float]:
+    return facts.box[2], facts.box[5]
+
+
+def to_datum(name: str, value: str) -> _native.Datum:
     datum = _native.Datum.__members__.get(value) if isinstance(value, str) else None
     if datum is None:
         raise ValueError(f'{name}: expected "orthometric", "ellipsoidal" or "other", got {value!r}')

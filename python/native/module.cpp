@@ -1,4 +1,5 @@
 #include "python/native/messages.h"
+#include "python/native/progress.h"
 #include "python/native/reading.h"
 #include "python/native/surface.h"
 
@@ -34,9 +35,31 @@ auto Collect(py::list& texts, const Work& work) {
 auto ReadFile(const std::string& file, int layer, DatumType source, DatumType output,
               const std::optional<std::array<double, 4>>& window,
               const std::optional<std::array<double, 2>>& base, double offset, double scale,
-              py::list warnings) {
-    const ReadOptions options{layer, source, output, window, base, offset, scale};
+              const std::string& survey, const py::object& progress, py::list warnings) {
+    // A layer without a survey is read twice: by opening and by loading it.
+    const double opened = survey.empty() ? 0.5 : 0.0;
+    PythonProgress opening(progress, 0.0, opened);
+    PythonProgress loading(progress, opened, 1.0);
+    const ReadOptions options{layer,  source, output, window,        base,
+                              offset, scale,  survey, opening.Get(), loading.Get()};
     return Collect(warnings, [&] { return Read(file, options); });
+}
+
+auto SurveyFile(const std::string& file, int layer, const py::object& progress, py::list warnings) {
+    PythonProgress opening(progress, 0.0, 1.0);
+    ReadOptions options;
+    options.mnLayer = layer;
+    options.moOpening = opening.Get();
+    auto [facts, bytes] = Collect(warnings, [&] { return SurveyLayer(file, options); });
+    return std::pair(std::move(facts), py::bytes(bytes));
+}
+
+auto CountFile(const std::string& file, int layer, const std::string& survey,
+               const std::vector<std::array<double, 4>>& windows, py::list warnings) {
+    ReadOptions options;
+    options.mnLayer = layer;
+    options.moSurvey = survey;
+    return Collect(warnings, [&] { return CountShapes(file, options, windows); });
 }
 
 auto ListFile(const std::string& file, py::list warnings) {
@@ -93,6 +116,8 @@ void AddFiles(py::module_& module) {
         .def_readonly("load_nbytes", &LayerFacts::mnLoadBytes)
         .def_readonly("surface_nbytes", &LayerFacts::mnSurfaceBytes);
     module.def("read", &ReadFile);
+    module.def("survey", &SurveyFile);
+    module.def("count", &CountFile);
     module.def("layers", &ListFile);
 }
 

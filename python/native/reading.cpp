@@ -37,7 +37,8 @@ bool IsNested(const std::exception& failure) {
 std::unique_ptr<TinReader> OpenReader(const std::string& file, const ReadOptions& options) {
     try {
         return std::unique_ptr<TinReader>(tin::TinReaderFactory::CreateTinReader(
-            file.c_str(), options.mnLayer, options.mdfOffset, options.mdfScale, options.meSource));
+            file.c_str(), options.mnLayer, options.mdfOffset, options.mdfScale, options.meSource,
+            {options.moSurvey, options.moOpening}));
     } catch (const kelm::Exception& failure) {
         if (IsNested(failure))
             throw FileError(GetText(failure));
@@ -61,22 +62,34 @@ std::optional<std::string> GetWkt(const std::string& definition) {
     return wkt;
 }
 
-LayerFacts GetFacts(const std::string& file, int number) {
+tin::BBox<double, point2_t<double>> MakeWindow(const std::array<double, 4>& sides) {
+    tin::BBox<double, point2_t<double>> window;
+    window.min = {sides[0], sides[1]};
+    window.max = {sides[2], sides[3]};
+    return window;
+}
+
+LayerFacts GetFacts(const TinReader& reader) {
+    LayerFacts facts;
+    const auto& box = reader.GetBBox();
+    facts.mnShapes = reader.GetShapeCount();
+    facts.moBox = {box.min.x, box.min.y, box.min.z, box.max.x, box.max.y, box.max.z};
+    facts.moCrs = GetWkt(reader.GetCRSText());
+    facts.mnLoadBytes = reader.EstimateLoadBytes();
+    facts.mnSurfaceBytes = reader.EstimateObjBytes_Tin();
+    return facts;
+}
+
+LayerFacts FindFacts(const std::string& file, int number) {
     ReadOptions options;
     options.mnLayer = number;
     LayerFacts facts;
-    facts.mnNumber = number;
     try {
-        const std::unique_ptr<TinReader> reader = OpenReader(file, options);
-        const auto& box = reader->GetBBox();
-        facts.mnShapes = reader->GetShapeCount();
-        facts.moBox = {box.min.x, box.min.y, box.min.z, box.max.x, box.max.y, box.max.z};
-        facts.moCrs = GetWkt(reader->GetCRSText());
-        facts.mnLoadBytes = reader->EstimateLoadBytes();
-        facts.mnSurfaceBytes = reader->EstimateObjBytes_Tin();
+        facts = GetFacts(*OpenReader(file, options));
     } catch (const kelm::Exception& failure) {
         facts.moRefusal = GetText(failure);
     }
+    facts.mnNumber = number;
     return facts;
 }
 
@@ -98,11 +111,10 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
     if (options.meOutput != options.meSource)
         reader->SetOutputVerticalDatum(options.meOutput);
     tin::BBox<double, point2_t<double>> window;
-    if (options.moWindow) {
-        window.min = {(*options.moWindow)[0], (*options.moWindow)[1]};
-        window.max = {(*options.moWindow)[2], (*options.moWindow)[3]};
-    }
+    if (options.moWindow)
+        window = MakeWindow(*options.moWindow);
     tin::LoadOptions load;
+    load.progress = options.moLoading;
     if (options.moBase)
         load.base = {(*options.moBase)[0], (*options.moBase)[1]};
     std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr, load));
@@ -111,12 +123,29 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
     return {std::make_unique<Surface>(std::move(surface)), GetWkt(reader->GetCRSText())};
 }
 
+std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,
+                                               const ReadOptions& options) {
+    const std::unique_ptr<TinReader> reader = OpenReader(file, options);
+    LayerFacts facts = GetFacts(*reader);
+    facts.mnNumber = options.mnLayer;
+    return {std::move(facts), reader->GetSurvey()};
+}
+
+std::vector<int> CountShapes(const std::string& file, const ReadOptions& options,
+                             const std::vector<std::array<double, 4>>& windows) {
+    const std::unique_ptr<TinReader> reader = OpenReader(file, options);
+    std::vector<int> counts;
+    for (const std::array<double, 4>& window : windows)
+        counts.push_back(reader->EstimateShapeCount(MakeWindow(window)));
+    return counts;
+}
+
 std::vector<LayerFacts> ListLayers(const std::string& file) {
     const OpenFile open = Open(file);
     std::vector<LayerFacts> layers;
     const int count = ZARSegCount(open.get(), ZAR_SEGMENT_VECTOR);
     for (int number = 1; number <= count; ++number)
-        layers.push_back(GetFacts(file, number));
+        layers.push_back(FindFacts(file, number));
     return layers;
 }
 

@@ -3,6 +3,7 @@
 #include "python/native/surface.h"
 
 #include <services/crs.h>
+#include <tin/progress.h>
 
 #include <optional>
 #include <string>
@@ -36,12 +37,24 @@ struct ReadOptions {
     std::optional<std::array<double, 2>> moBase;
     double mdfOffset = 0.0;
     double mdfScale = 1.0;
+    std::string moSurvey; ///< of the layer; empty: it is surveyed
+    tin::Progress moOpening;
+    tin::Progress moLoading;
 };
 
 /// @return the surface, or null if no polygon gave a triangle; and the CRS of the layer as WKT
 /// @throw FileError; kelm::Exception
 std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::string& file,
                                                                      const ReadOptions& options);
+
+/// Surveys one layer; only the first fields of the options count.
+/// @return its facts, and the survey as bytes @throw FileError; kelm::Exception
+std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file, const ReadOptions& options);
+
+/// Counts without a walk; of the options, layer and survey count.
+/// @return for each window a bound on the number of shapes that meet it @throw as Read
+std::vector<int> CountShapes(const std::string& file, const ReadOptions& options,
+                             const std::vector<std::array<double, 4>>& windows);
 
 /// @throw FileError; kelm::Exception
 std::vector<LayerFacts> ListLayers(const std::string& file);

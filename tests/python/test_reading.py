@@ -1,6 +1,9 @@
 """Files: what is read, warned of and refused."""
 
 import os
+import pickle
+import shutil
+import signal
 
 import kelm_tin
 import numpy as np
@@ -75,6 +78,7 @@ def test_what_is_left_out_is_a_warning(write, capfd):
         (dict(source="geoid"), ValueError, 'source: expected "orthometric"'),
         (dict(output=3), ValueError, "output: expected"),
         (dict(output="ellipsoidal"), kelm_tin.DataError, ""),
+        (dict(base=(0, np.nan)), ValueError, "base: expected"),
         (dict(window=(0, 0, np.nan, 1)), ValueError, "window: expected finite"),
         (dict(window=(0, 0, 1, 1)), kelm_tin.DataError, "no polygon of the layer or window"),
         (dict(scale=0.0), kelm_tin.DataError, ""),
@@ -96,3 +100,45 @@ def test_the_handler_of_gdal_is_left_alone():
     finally:
         gdal.PopErrorHandler()
     assert told == ["still there"]
+
+
+def test_windows_of_one_survey_and_one_base(tmp_path):
+    path = tmp_path / "a.gpkg"
+    shutil.copy(TERRAIN, path)
+    survey = pickle.loads(pickle.dumps(kelm_tin.survey(path)))
+    (layer,) = kelm_tin.layers(path)
+    assert (survey.shapes, survey.bounds, survey.heights, survey.crs) == layer[2:6]
+    xmin, ymin, xmax, ymax = survey.bounds
+    base = ((xmin + xmax) / 2, (ymin + ymax) / 2)
+    whole = kelm_tin.read(path, base=base)
+    assert whole.base == base
+    xy = np.random.default_rng(1).uniform((xmin, ymin), (xmin + 2000, ymin + 2000), (10_000, 2))
+    part = kelm_tin.read(path, base=base, window=(*xy.min(axis=0), *xy.max(axis=0)), survey=survey)
+    assert len(part.triangles) < len(whole.triangles) / 10
+    assert np.array_equal(part.heights(xy), whole.heights(xy), equal_nan=True)
+    with pytest.raises(kelm_tin.NothingRead):
+        kelm_tin.read(path, window=(xmin, ymin, xmin, ymin), survey=survey)
+    os.utime(path, (1, 1))
+    with pytest.raises(kelm_tin.DataError, match="written to since"):
+        kelm_tin.read(path, survey=survey)
+
+
+def test_progress_rises_to_its_total():
+    for call in (kelm_tin.read, kelm_tin.survey):
+        told = []
+        call(TERRAIN, progress=lambda *parts: told.append(parts))
+        assert {total for _, total in told} == {100} and told[-1] == (100, 100)
+        assert told == sorted(told) and 4 < len(told) < 1000
+
+
+@pytest.mark.parametrize("call", [kelm_tin.read, kelm_tin.survey])
+@pytest.mark.parametrize("share", [0, 30, 60, 100])
+def test_what_progress_raises_stops_the_work(call, share):
+    def stop(done, _):
+        if done >= share:
+            raise LookupError("of the caller")
+
+    with pytest.raises(LookupError, match="of the caller"):
+        call(TERRAIN, progress=stop)
+    with pytest.raises(KeyboardInterrupt):
+        call(TERRAIN, progress=lambda done, _: done < share or signal.raise_signal(signal.SIGINT))

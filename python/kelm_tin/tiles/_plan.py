@@ -11,8 +11,7 @@ import numpy as np
 from numpy.typing import ArrayLike, NDArray
 
 from .._arrays import FloatArray, to_position, to_positive
-from .._reading import Path, Survey, survey
-from .._reading import _to_datum as to_datum
+from .._reading import Path, Survey, count_shapes, survey, to_datum
 
 Tile = tuple[int, int]
 """Row from the north on, column from the west on."""
