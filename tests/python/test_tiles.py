@@ -235,6 +235,12 @@ def test_refusals(call, message):
         call()
 
 
+def test_examples_of_the_documentation():
+    code = "import doctest, kelm_tin, sys; from kelm_tin.tiles import _plan, _raster, _heights; " \
+        "sys.exit(sum(doctest.testmod(m).failed for m in (kelm_tin.tiles, _plan, _raster, _heights)))"
+    subprocess.run([sys.executable, "-c", code], check=True)
+
+
 def test_the_package_does_without_dask():
     code = "import sys; sys.modules['dask'] = None; import kelm_tin; kelm_tin.read; kelm_tin.tiles"
     run = subprocess.run([sys.executable, "-c", code], stderr=subprocess.PIPE, text=True)

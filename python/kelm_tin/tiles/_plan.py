@@ -27,8 +27,8 @@ rule is off by at most 24 times 2^-24 of the triangle's size. So a triangle can 
 its polygon does not touch it, but only so near."""
 MOST_HALVINGS = 12
 """How often a tile is halved before it counts as too large."""
-INDEX_NBYTES = 110
-"""Bytes a triangle of the index of heights while it is built."""
+OPEN_NBYTES = 32_000_000
+"""Bytes of an open file with its survey."""
 
 
 class TileError(RuntimeError):
@@ -52,7 +52,7 @@ class Plan:
             every answer is that of the whole layer read with this base, to the bit. With "tile" each tile
             is stored relative to its own centre, so that a wide layer loses no precision.
         limit: bytes that a worker may need for a tile; a tile that would need more is answered in parts.
-            None for no limit.
+            None for no limit. See `estimate`.
         survey: what `kelm_tin.survey` tells of the layer; None to find it out now, which reads the layer
             once.
         progress: told how far that is; see `kelm_tin.survey`.
@@ -119,6 +119,11 @@ class Plan:
         _, ymin, xmax, _ = self.bounds
         return max(1, math.ceil((y - ymin) / self.tile)), max(1, math.ceil((xmax - x) / self.tile))
 
+    def list_tiles(self) -> list[Tile]:
+        """Row and column of every tile, row by row."""
+        rows, columns = self.tiles
+        return [(row, column) for row in range(rows) for column in range(columns)]
+
     def box(self, tile: Tile) -> Box:
         """The sides of a tile in map coordinates."""
         (x, y), (row, column) = self.origin, tile
@@ -169,43 +174,48 @@ class Plan:
         column = np.clip(np.floor((near[:, 0] - x) / self.tile), 0, columns - 1)
         return np.where(inside, row * columns + column, NO_TILE).astype(np.int64)
 
+    def count(self, boxes: list[Box]) -> NDArray[np.int64]:
+        """For each box a bound on the number of polygons that are loaded for it. Opens the file once, and
+        reads no polygon: the survey knows where blocks of polygons lie.
+
+        Raises:
+            OSError, DataError: the file is gone, or was written to since the survey.
+        """
+        windows = [self.window(box) for box in boxes]
+        counts: NDArray[np.int64] = np.array(count_shapes(self.path, self._survey, windows), np.int64)
+        return counts
+
     @property
     def estimate(self) -> int:
-        """Bytes that a worker needs for its largest tile, beyond what it holds while it waits."""
-        return max(self.estimate_box(self.box((row, column))) for row, column in np.ndindex(self.tiles))
+        """Bytes that a worker needs for its largest tile, beyond what it holds while it waits, and beyond the
+        cells or positions: what a load of the polygons that `count` bounds takes, at one triangle a polygon.
+        With a limit it is that of a part. Raises as `count`, and as `parts`."""
+        most = int(self.estimate_boxes([self.box(tile) for tile in self.list_tiles()]).max())
+        return most if self.limit is None else min(most, self.limit)
 
-    def estimate_box(self, box: Box) -> int:
-        """Estimated bytes to load a box and to build an index over it."""
-        survey = self._survey
-        xmin, ymin, xmax, ymax = survey.bounds
-        area = max((xmax - xmin) * (ymax - ymin), 1e-300)
-        share = min(1.0, (box[2] - box[0]) * (box[3] - box[1]) / area)
-        return math.ceil(share * (survey.load_nbytes + survey.shapes * INDEX_NBYTES))
+    def estimate_boxes(self, boxes: list[Box]) -> NDArray[np.int64]:
+        """The same for each of some boxes."""
+        each = self._survey.load_nbytes / max(1, self._survey.shapes)
+        return OPEN_NBYTES + np.ceil(self.count(boxes) * each).astype(np.int64)
 
     def parts(self, tile: Tile) -> list[Box]:
         """The boxes in which a tile is answered, so that each stays within the limit.
 
         Raises:
-            TileError: the limit is too small for the smallest part.
+            TileError: a part would exceed the limit although it is 64 times as narrow as the tile.
+            OSError, DataError: as `count`.
         """
-        return self._halve(tile, self.box(tile), MOST_HALVINGS)
-
-    def _halve(self, tile: Tile, box: Box, left: int) -> list[Box]:
-        estimate = self.estimate_box(box)
-        if self.limit is None or estimate <= self.limit:
-            return [box]
-        if left == 0:
-            raise TileError(
-                f"{self.describe(tile)}: a part of it needs {estimate:,} bytes, and the limit is {self.limit:,}"
-            )
-        xmin, ymin, xmax, ymax = box
-        if left % 2 == 0:
-            x = (xmin + xmax) / 2
-            halves = [(xmin, ymin, x, ymax), (x, ymin, xmax, ymax)]
-        else:
-            y = (ymin + ymax) / 2
-            halves = [(xmin, y, xmax, ymax), (xmin, ymin, xmax, y)]
-        return [part for half in halves for part in self._halve(tile, half, left - 1)]
+        boxes, done = [self.box(tile)], []
+        if self.limit is None:
+            return boxes
+        for level in range(MOST_HALVINGS + 1):
+            fits = (self.estimate_boxes(boxes) <= self.limit).tolist()
+            done += [box for box, fit in zip(boxes, fits) if fit]
+            boxes = [box for box, fit in zip(boxes, fits) if not fit]
+            if not boxes:
+                return done
+            boxes = [half for box in boxes for half in _halve(box, level % 2)]
+        raise TileError(f"{self.describe(tile)}: a small part of it exceeds the limit of {self.limit:,} bytes")
 
     def describe(self, tile: Tile) -> str:
         """The file, the tile and where it lies, for messages."""
@@ -219,6 +229,16 @@ class Plan:
     def _survey(self) -> Survey:
         assert self.survey is not None
         return self.survey
+
+
+def _halve(box: Box, axis: int) -> list[Box]:
+    """The two halves, cut across x or across y."""
+    xmin, ymin, xmax, ymax = box
+    if axis == 0:
+        x = (xmin + xmax) / 2
+        return [(xmin, ymin, x, ymax), (x, ymin, xmax, ymax)]
+    y = (ymin + ymax) / 2
+    return [(xmin, y, xmax, ymax), (xmin, ymin, xmax, y)]
 
 
 def _to_path(path: Path) -> str:

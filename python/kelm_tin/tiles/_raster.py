@@ -9,7 +9,7 @@ import numpy as np
 from .._arrays import to_positive
 from ._dask import Array, tokenize
 from ._plan import Plan
-from ._work import Frame, fill_cells
+from ._work import Frame, fill_cells, make_empty
 
 Transform = tuple[float, float, float, float, float, float]
 
@@ -39,7 +39,8 @@ class RasterArray(Array):  # type: ignore[misc]
 
 
 def raster(plan: Plan, cell: float, *, closed: bool = False) -> RasterArray:
-    """The height at the centre of each cell, for all tiles. Nothing is computed yet.
+    """The height at the centre of each cell, for all tiles. No cell is computed yet. The call opens the file
+    once to see which tiles hold any polygons.
 
     Args:
         cell: side of a cell in map units; a tile must be a whole number of cells wide.
@@ -51,6 +52,7 @@ def raster(plan: Plan, cell: float, *, closed: bool = False) -> RasterArray:
 
     Raises:
         ValueError: the cells do not fit the tiles.
+        OSError, DataError: the file is gone, or was written to since the plan was made.
         TileError: when it is computed: a tile could not be answered.
 
     >>> cells = raster(Plan("data/jacksboro.gpkg", tile=2000.0), 40.0)
@@ -66,8 +68,10 @@ def raster(plan: Plan, cell: float, *, closed: bool = False) -> RasterArray:
     key, name = "kelm-tin-plan-" + token, "kelm-tin-raster-" + token
     rows, columns = plan.tiles
     graph: dict[Any, Any] = {key: plan}
-    for tile in np.ndindex(rows, columns):
-        graph[(name, *tile)] = (fill_cells, key, frame, tile)
+    places = plan.list_tiles()
+    for tile, count in zip(places, plan.count([plan.box(tile) for tile in places])):
+        fill = (fill_cells, key, frame, tile) if count else (make_empty, side)
+        graph[(name, *tile)] = fill
     array = Array(graph, name, ((side,) * rows, (side,) * columns), np.float32)
     x, y = plan.origin
     return RasterArray._make(array, (size, 0.0, x, 0.0, -size, y), plan.crs)

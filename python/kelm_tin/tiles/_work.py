@@ -28,7 +28,7 @@ def fill_cells(plan: Plan, frame: Frame, tile: Tile) -> Heights:
     numbers = np.arange(frame.side) + 0.5
     xs = x + (tile[1] * frame.side + numbers) * frame.cell
     ys = y - (tile[0] * frame.side + numbers) * frame.cell
-    cells = np.full((frame.side, frame.side), np.nan, np.float32)
+    cells = make_empty(frame.side)
     with _named(plan, tile):
         for box in plan.parts(tile):
             columns = slice(*np.searchsorted(xs, (box[0], box[2])))
@@ -37,6 +37,11 @@ def fill_cells(plan: Plan, frame: Frame, tile: Tile) -> Heights:
             if surface is not None:
                 cells[rows, columns] = _fill(surface, xs[columns], ys[rows], frame)
     return cells
+
+
+def make_empty(side: int) -> Heights:
+    """A tile without any height."""
+    return np.full((side, side), np.nan, np.float32)
 
 
 def _fill(surface: Surface, xs: FloatArray, ys: FloatArray, frame: Frame) -> Heights:
