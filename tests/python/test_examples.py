@@ -24,3 +24,13 @@ def test_example(name, arguments, needs, expected, tmp_path):
     paths = [each.replace("OUT", str(tmp_path / "out")) for each in arguments]
     run = subprocess.run(program + paths, stdout=subprocess.PIPE, text=True, check=True)
     assert expected in run.stdout
+
+
+def test_the_picture_of_the_guide_is_what_its_program_draws(tmp_path):
+    image = pytest.importorskip("matplotlib.image")
+    program = ROOT / "docs" / "guide" / "programs" / "python" / "relief.py"
+    subprocess.run([sys.executable, program, TERRAIN, tmp_path / "drawn.png"], check=True)
+    drawn = image.imread(tmp_path / "drawn.png")
+    shown = image.imread(ROOT / "docs" / "guide" / "python.png")
+    assert drawn.shape == shown.shape
+    assert abs(drawn - shown).mean() < 0.01, "letters may differ between versions of matplotlib"
