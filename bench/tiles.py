@@ -39,10 +39,15 @@ def make_country(folder, triangles):
     return paths
 
 
-def measure(call):
-    start = time.perf_counter()
+def measure(call, clock=time.perf_counter):
+    start = clock()
     result = call()
-    return time.perf_counter() - start, result
+    return clock() - start, result
+
+
+def measure_processor(call):
+    """Seconds of the processor, which other programs on the machine do not change much."""
+    return measure(call, time.process_time)
 
 
 def get_resident():
@@ -60,25 +65,23 @@ def digest(cells):
 
 def find_inner_tiles(plan, count):
     """Tiles in the middle of the country, which the sea and the rim do not touch much."""
-    survey = plan.survey
     full = plan.tile**2 / 50  # two triangles in ten by ten metres
-    rows, columns = plan.tiles
-    numbers = [n for n in np.ndindex(rows, columns) if plan.count([plan.box(n)])[0] > full]
-    step = max(1, len(numbers) // count)
-    del survey
-    return numbers[::step][:count]
+    everywhere = plan.list_tiles()
+    counts = plan.count([plan.box(tile) for tile in everywhere])
+    inner = [tile for tile, found in zip(everywhere, counts) if found > full]
+    return inner[:: max(1, len(inner) // count)][:count]
 
 
 def report_tiles(plans):
-    """The time of one tile, from the small and from the large layer, in one process."""
+    """The processor time of one tile, from the small and from the large layer, in one process."""
     print("| layer | triangles | survey, s | plan, kB | opening, ms | a tile, ms | of these reading, ms |")
     print("|---|---|---|---|---|---|---|")
     medians = {}
     for path, plan, seconds in plans:
         names = find_inner_tiles(plan, 12)
-        opening = statistics.median(measure(lambda: plan.count([plan.bounds]))[0] for _ in range(5))
-        times = [measure(lambda: _work.fill_cells(plan, FRAME, tile))[0] for tile in names]
-        reads = [measure(lambda: _work._load(plan, tile, plan.box(tile)))[0] for tile in names]
+        opening = statistics.median(measure_processor(lambda: plan.count([plan.bounds]))[0] for _ in range(5))
+        times = [measure_processor(lambda: _work.fill_cells(plan, FRAME, tile))[0] for tile in names]
+        reads = [measure_processor(lambda: _work._load(plan, tile, plan.box(tile)))[0] for tile in names]
         medians[path] = statistics.median(times)
         print(
             f"| {os.path.basename(path)} | {plan.survey.shapes:,} | {seconds:.1f} | "
@@ -173,7 +176,7 @@ def main():
     plans = []
     for count in (options.small, options.triangles):
         for path in make_country(options.folder, count):
-            seconds, plan = measure(lambda: tiles.Plan(path, tile=TILE, base=BASE))
+            seconds, plan = measure_processor(lambda: tiles.Plan(path, tile=TILE, base=BASE))
             plans.append((path, plan, seconds))
     report_tiles(plans)
     for path, plan, _ in plans[2:]:
