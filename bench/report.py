@@ -17,6 +17,11 @@ from results import Results, get_count
 from subjects import SUBJECTS
 
 
+TILES = """## Tiles on Dask
+
+`scripts/bench tiles` measures them. The figures stand in [A country at once](guide/scale.md#measured)."""
+
+
 def format_figure(value):
     if value is None:
         return ""
@@ -191,7 +196,7 @@ def main(paths):
     ]
     parts += [format_subject(results, title, key, factor, unit, words)
               for title, key, (factor, unit), words in SUBJECTS]
-    parts.append(format_growth(results))
+    parts += [format_growth(results), TILES]
     print("\n\n".join(part for part in parts if part))
 
 

@@ -37,6 +37,7 @@ if(TARGET kelm_tin_python)
   set(CPACK_DEBIAN_PYTHON_PACKAGE_SHLIBDEPS ON)
   set(CPACK_DEBIAN_PYTHON_PACKAGE_DEPENDS
       "python3 (>= 3.${KELM_TIN_PYTHON_MINOR}~), python3 (<< 3.${next}), python3-numpy")
+  set(CPACK_DEBIAN_PYTHON_PACKAGE_SUGGESTS "python3-dask, python3-distributed, python3-rasterio")
   set(CPACK_COMPONENT_PYTHON_DEPENDS runtime)
   set(CPACK_COMPONENT_PYTHON_DESCRIPTION "${PROJECT_DESCRIPTION}\n The Python package kelm_tin.")
   list(APPEND CPACK_DEBIAN_PACKAGE_SHLIBDEPS_PRIVATE_DIRS ${PROJECT_BINARY_DIR}/tin)

@@ -81,6 +81,11 @@ KELM_SERVICES_EXPORT int ZARGetExtents(ZARLayer_t* layer, ZARVertex* low, ZARVer
 KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL void
 ZARSetWindow(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high);
 
+/// Optional. @return a bound on the number of shapes that share a point in plan with a window,
+/// without a look into the file @param low,high as for ZARSetWindow, never null
+KELM_SERVICES_EXPORT KELM_SERVICES_OPTIONAL int
+ZARCountShapes(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high);
+
 /// Is told how far a long call is. @param done share of the work, from 0 to 1; never falls within
 /// one call, and stays 0 as long as the store cannot tell @param data what ZARSetProgress was given
 /// It may throw to stop the call. The store passes the exception on, and the file stays usable.

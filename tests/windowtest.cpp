@@ -95,6 +95,11 @@ struct WindowTest : FileTest {
                     << oShape.first;
             const bool bLarge = oWindow.min.x < -99 && oWindow.max.x > 99;
             EXPECT_EQ(oFound.size() < oAll.size() / 2, bQuick && !bLarge);
+            const auto nCount = static_cast<unsigned>(ZARCountShapes(poLayer, &low, &high));
+            if (bQuick && !bLarge)
+                EXPECT_EQ(nCount, oFound.size());
+            EXPECT_EQ(nCount, poReader->EstimateShapeCount(oWindow));
+            EXPECT_LE(CountMet(oAll, oWindow), nCount);
             for (const auto& oShape : {oAll.back(), oAll.front()}) // out of turn
                 EXPECT_EQ(ReadShape(poLayer, oShape.first), oShape.second);
             const std::string part = Print(poReader->Load(&oWindow));
@@ -105,6 +110,12 @@ struct WindowTest : FileTest {
         ZARSetWindow(poLayer, nullptr, nullptr);
         EXPECT_EQ(Walk(poLayer), oAll);
         moTranscript.moLines.clear(); // other tests read these
+    }
+    static unsigned CountMet(const Shapes& oAll, const Window& oWindow) {
+        return static_cast<unsigned>(
+            std::count_if(oAll.begin(), oAll.end(), [&](const auto& oShape) {
+                return !oShape.second.empty() && Meets(oShape.second, oWindow);
+            }));
     }
     static std::vector<Window> MakeWindows() {
         std::vector<Window> oWindows;
@@ -197,6 +208,7 @@ TEST_F(WindowTest, ManyFeaturesShareTheirBlocks) {
         for (const auto& oShape : Walk(poLayer))
             oFound.push_back(oShape.first);
         EXPECT_LE(oFound.size(), 40U);
+        EXPECT_EQ(ZARCountShapes(poLayer, &low, &high), static_cast<int>(oFound.size()));
         for (int nRow = 20; nRow < 30; ++nRow)
             for (const int nCol : {int(x), int(x + 1)})
                 EXPECT_TRUE(std::binary_search(oFound.begin(), oFound.end(), nRow * 700 + nCol));

@@ -85,6 +85,9 @@ class KELM_TIN_EXPORT TinReader {
     /// reading it. Empty if the services keep no surveys, or the format has none. Runs after a load
     /// that another thread has begun
     std::string GetSurvey() const;
+    /// @return a bound on the number of shapes that meet a window, without a look into the file;
+    /// all shapes if the services cannot tell. May run during a load
+    int EstimateShapeCount(const BBox<double, point2_t<double>>& oWindow) const;
     /// @return number of shapes of the layer
     int GetShapeCount() const { return mnShapeCount; }
     /// Extents of the whole layer in map coordinates, heights as stored. Load tests its window

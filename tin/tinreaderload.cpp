@@ -147,6 +147,14 @@ std::string TinReader::GetSurvey() const {
     return ZARGetSurvey(mpLayer);
 }
 
+int TinReader::EstimateShapeCount(const Window& oWindow) const {
+    if (mpLayer == nullptr || ZARCountShapes == nullptr)
+        return mnShapeCount;
+    const ZARVertex low{oWindow.min.x, oWindow.min.y, 0.0};
+    const ZARVertex high{oWindow.max.x, oWindow.max.y, 0.0};
+    return ZARCountShapes(mpLayer, &low, &high);
+}
+
 std::string TinReader::GetCRSText() const {
     if (mpLayer == nullptr)
         return {};

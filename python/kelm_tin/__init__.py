@@ -13,6 +13,9 @@ position without a height gives NaN. Do not fork a process that has used this pa
 with "fork"): the child would wait for threads that it does not have. Start it with "spawn".
 """
 
+import importlib
+from types import ModuleType
+
 from ._native import DataError
 from ._reading import DataWarning, Layer, NothingRead, Survey, layers, read, survey
 from ._surface import Profile, Raster, Surface
@@ -30,3 +33,10 @@ __all__ = [
     "read",
     "survey",
 ]
+
+
+def __getattr__(name: str) -> ModuleType:
+    """Imports `kelm_tin.tiles` when it is first used, since it needs dask."""
+    if name == "tiles":
+        return importlib.import_module(".tiles", __name__)
+    raise AttributeError(f"module {__name__!r} has no attribute {name!r}")

@@ -63,4 +63,11 @@ def read(
 def survey(
     file: str, layer: int, progress: Optional[Callable[[int, int], object]], warnings: list[str]
 ) -> tuple[LayerFacts, bytes]: ...
+def count(
+    file: str,
+    layer: int,
+    survey: bytes,
+    windows: list[tuple[float, float, float, float]],
+    warnings: list[str],
+) -> list[int]: ...
 def layers(file: str, warnings: list[str]) -> list[LayerFacts]: ...

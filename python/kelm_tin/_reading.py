@@ -113,8 +113,8 @@ def read(
         native, crs = _native.read(
             _to_file(path),
             _to_number(layer),
-            _to_datum("source", source),
-            _to_datum("output", source if output is None else output),
+            to_datum("source", source),
+            to_datum("output", source if output is None else output),
             None if window is None else to_bounds("window", window),
             None if base is None else to_position("base", base),
             offset,
@@ -163,6 +163,17 @@ def survey(path: Path, layer: Optional[int] = None, *, progress: Optional[Progre
         facts.surface_nbytes,
         data,
     )
+
+
+def count_shapes(
+    path: Path, found: Survey, windows: list[tuple[float, float, float, float]]
+) -> list[int]:
+    """For each window a bound on the number of shapes that meet it, without a walk. Raises as `read`."""
+    texts: list[str] = []
+    try:
+        return _native.count(_to_file(path), _to_number(found.layer), found.data, windows, texts)
+    finally:
+        _warn(texts)
 
 
 def layers(path: Path) -> list[Layer]:
@@ -217,7 +228,7 @@ def _to_heights(facts: _native.LayerFacts) -> tuple[float, float]:
     return facts.box[2], facts.box[5]
 
 
-def _to_datum(name: str, value: str) -> _native.Datum:
+def to_datum(name: str, value: str) -> _native.Datum:
     datum = _native.Datum.__members__.get(value) if isinstance(value, str) else None
     if datum is None:
         raise ValueError(f'{name}: expected "orthometric", "ellipsoidal" or "other", got {value!r}')

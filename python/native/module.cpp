@@ -54,6 +54,14 @@ auto SurveyFile(const std::string& file, int layer, const py::object& progress, 
     return std::pair(std::move(facts), py::bytes(bytes));
 }
 
+auto CountFile(const std::string& file, int layer, const std::string& survey,
+               const std::vector<std::array<double, 4>>& windows, py::list warnings) {
+    ReadOptions options;
+    options.mnLayer = layer;
+    options.moSurvey = survey;
+    return Collect(warnings, [&] { return CountShapes(file, options, windows); });
+}
+
 auto ListFile(const std::string& file, py::list warnings) {
     return Collect(warnings, [&] { return ListLayers(file); });
 }
@@ -109,6 +117,7 @@ void AddFiles(py::module_& module) {
         .def_readonly("surface_nbytes", &LayerFacts::mnSurfaceBytes);
     module.def("read", &ReadFile);
     module.def("survey", &SurveyFile);
+    module.def("count", &CountFile);
     module.def("layers", &ListFile);
 }
 

@@ -62,6 +62,13 @@ std::optional<std::string> GetWkt(const std::string& definition) {
     return wkt;
 }
 
+tin::BBox<double, point2_t<double>> MakeWindow(const std::array<double, 4>& sides) {
+    tin::BBox<double, point2_t<double>> window;
+    window.min = {sides[0], sides[1]};
+    window.max = {sides[2], sides[3]};
+    return window;
+}
+
 LayerFacts GetFacts(const TinReader& reader) {
     LayerFacts facts;
     const auto& box = reader.GetBBox();
@@ -104,10 +111,8 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
     if (options.meOutput != options.meSource)
         reader->SetOutputVerticalDatum(options.meOutput);
     tin::BBox<double, point2_t<double>> window;
-    if (options.moWindow) {
-        window.min = {(*options.moWindow)[0], (*options.moWindow)[1]};
-        window.max = {(*options.moWindow)[2], (*options.moWindow)[3]};
-    }
+    if (options.moWindow)
+        window = MakeWindow(*options.moWindow);
     tin::LoadOptions load;
     load.progress = options.moLoading;
     if (options.moBase)
@@ -124,6 +129,15 @@ std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,
     LayerFacts facts = GetFacts(*reader);
     facts.mnNumber = options.mnLayer;
     return {std::move(facts), reader->GetSurvey()};
+}
+
+std::vector<int> CountShapes(const std::string& file, const ReadOptions& options,
+                             const std::vector<std::array<double, 4>>& windows) {
+    const std::unique_ptr<TinReader> reader = OpenReader(file, options);
+    std::vector<int> counts;
+    for (const std::array<double, 4>& window : windows)
+        counts.push_back(reader->EstimateShapeCount(MakeWindow(window)));
+    return counts;
 }
 
 std::vector<LayerFacts> ListLayers(const std::string& file) {

@@ -62,6 +62,10 @@ void StoreLayer::SetWindow(const ZARVertex* low, const ZARVertex* high) {
         moRuns = std::move(runs);
 }
 
+int StoreLayer::CountShapes(const ZARVertex& low, const ZARVertex& high) const {
+    return static_cast<int>(moSurvey.moBlocks.CountShapes(low, high, moSurvey.mnShapes));
+}
+
 int StoreLayer::GetFirst() {
     Restart();
     return Step();

@@ -31,6 +31,7 @@ class StoreLayer final : public OpenLayer {
     /// Walks then skip the blocks of features beside the window, unless the file has been written
     /// to since it was surveyed.
     void SetWindow(const ZARVertex* low, const ZARVertex* high) override;
+    int CountShapes(const ZARVertex& low, const ZARVertex& high) const override;
     std::string GetSurvey() const override;
     int GetType() const override { return moSurvey.mnType; }
     ZARVertex GetLow() const override { return moSurvey.moLow; }

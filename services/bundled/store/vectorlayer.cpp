@@ -109,6 +109,10 @@ void ZARSetWindow(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high
     Get(layer).SetWindow(low, high);
 }
 
+int ZARCountShapes(ZARLayer_t* layer, const ZARVertex* low, const ZARVertex* high) {
+    return Get(layer).CountShapes(*low, *high);
+}
+
 void ZARSetProgress(_iobuf* file, ZARProgress progress, void* data) {
     file->SetProgress({progress, data});
 }

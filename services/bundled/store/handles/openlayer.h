@@ -28,6 +28,11 @@ class OpenLayer : public ZARLayer_t {
     /// walks over all shapes. @param low,high both null: all shapes
     virtual void SetWindow(const ZARVertex* /*low*/, const ZARVertex* /*high*/) {}
 
+    /// @return a bound on the number of shapes that share a point with a window
+    virtual int CountShapes(const ZARVertex& /*low*/, const ZARVertex& /*high*/) const {
+        return shapeCount;
+    }
+
     /// @return what opening found out, for _iobuf::TakeSurvey; empty if it cost nothing
     virtual std::string GetSurvey() const { return {}; }
 

@@ -101,6 +101,16 @@ std::vector<FeatureRun> FeatureBlocks::Find(const ZARVertex& low, const ZARVerte
     return runs;
 }
 
+std::int64_t FeatureBlocks::CountShapes(const ZARVertex& low, const ZARVertex& high,
+                                        std::int64_t all) const {
+    std::int64_t shapes = 0;
+    for (std::size_t i = 0; i < moBlocks.size(); ++i) {
+        const std::int64_t behind = i + 1 < moBlocks.size() ? moBlocks[i + 1].mnShapes : all;
+        shapes += IsMet(moBlocks[i], low, high) ? behind - moBlocks[i].mnShapes : 0;
+    }
+    return shapes;
+}
+
 void FeatureBlocks::Write(ByteWriter& bytes) const {
     bytes.Put(static_cast<unsigned char>(mbRising));
     bytes.Put(static_cast<std::uint64_t>(moBlocks.size()));

@@ -30,6 +30,8 @@ class FeatureBlocks {
     /// @return the blocks whose box shares a point with a window, in reading order; neighbours are
     /// joined to runs of some thousand features
     std::vector<FeatureRun> Find(const ZARVertex& low, const ZARVertex& high) const;
+    /// @param all shapes of the layer @return the shapes of the blocks that Find gives
+    std::int64_t CountShapes(const ZARVertex& low, const ZARVertex& high, std::int64_t all) const;
 
     void Write(ByteWriter& bytes) const;
     /// @param polygons the layer's polygons that are no triangles

@@ -1,0 +1,190 @@
+"""A raster of tiles as a GeoTIFF."""
+
+from __future__ import annotations
+
+import os
+from collections import deque
+from contextlib import contextmanager
+from typing import Any, Callable, Iterator, NamedTuple, Optional
+
+import numpy as np
+
+from .._reading import Path
+from ._dask import compute, get_scheduler
+from ._raster import Transform
+
+GROUP = 8
+"""Chunks that are computed together. On a cluster the next group runs while one is written."""
+SMALLEST_OVERVIEW = 256
+MOST_BLOCK = 512
+OPTIONS = {"TILED": "YES", "COMPRESS": "DEFLATE", "BIGTIFF": "IF_SAFER"}
+Blocks = Iterator[tuple[int, int, Any]]
+"""First row, first column and cells of a block."""
+
+
+class Sheet(NamedTuple):
+    """What a file is made for."""
+
+    rows: int
+    columns: int
+    dtype: Any
+    side: int
+    """Cells on a side of a block in the file."""
+    transform: Transform
+    crs: Optional[str]
+
+    def options(self) -> dict[str, str]:
+        predictor = "3" if self.dtype.kind == "f" else "2"
+        side = str(self.side)
+        return {**OPTIONS, "PREDICTOR": predictor, "BLOCKXSIZE": side, "BLOCKYSIZE": side}
+
+    def overviews(self) -> list[int]:
+        levels: list[int] = []
+        while max(self.rows, self.columns) >> len(levels) > SMALLEST_OVERVIEW:
+            levels.append(2 << len(levels))
+        return levels
+
+
+def write_geotiff(
+    array: Any,
+    path: Path,
+    *,
+    transform: Optional[Transform] = None,
+    crs: Optional[str] = None,
+) -> None:
+    """Computes a raster chunk by chunk and writes it: tiled, compressed, with overviews.
+
+    Some chunks are in memory at a time, however large the raster is. The file appears under its name when
+    it is whole. Needs rasterio or GDAL's Python module.
+
+    Args:
+        array: what `raster` gave, or a dask array of two axes computed from it.
+        path: the file; one that is there is replaced.
+        transform, crs: where the cells lie; None for those of the array.
+
+    Raises:
+        ValueError: the array has not two axes, or it is not known where its cells lie.
+        TileError: a tile could not be answered. No file is left.
+        ImportError: neither rasterio nor GDAL's Python module is there.
+        OSError: the file cannot be written.
+    """
+    where = getattr(array, "transform", None) if transform is None else transform
+    if array.ndim != 2 or where is None:
+        raise ValueError(f"array: expected two axes and a transform, got shape {array.shape}, {where}")
+    crs = getattr(array, "crs", None) if crs is None else crs
+    sheet = Sheet(array.shape[0], array.shape[1], array.dtype, _find_side(array.chunks), where, crs)
+    write = _find_writer()
+    with _whole_or_not_at_all(os.fspath(path)) as name:
+        write(name, sheet, _compute_blocks(array))
+
+
+def _find_side(chunks: Any) -> int:
+    """A side of blocks that divides the chunks, so that no block is written twice. Must be a multiple of
+    16."""
+    sides = range(MOST_BLOCK, 127, -16)
+    count = chunks[0][0]
+    return next((side for side in sides if count % side == 0), 256)
+
+
+def _find_writer() -> Callable[[str, Sheet, Blocks], None]:
+    try:
+        import rasterio  # type: ignore[import]  # noqa: F401
+
+        return _write_by_rasterio
+    except ImportError:
+        from osgeo import gdal  # type: ignore[import]  # noqa: F401
+
+        return _write_by_gdal
+
+
+@contextmanager
+def _whole_or_not_at_all(path: str) -> Iterator[str]:
+    folder, name = os.path.split(path)
+    part = os.path.join(folder, f".{name}.{os.getpid()}.part")
+    try:
+        yield part
+        os.replace(part, path)
+    finally:
+        if os.path.exists(part):
+            os.remove(part)
+
+
+def _compute_blocks(array: Any) -> Blocks:
+    blocks = array.to_delayed().ravel().tolist()
+    rows, columns = (np.cumsum((0, *sizes))[:-1].tolist() for sizes in array.chunks)
+    places = [(row, column) for row in rows for column in columns]
+    for first, cells in enumerate(_compute_in_order(blocks)):
+        yield (*places[first], cells)
+
+
+def _compute_in_order(blocks: list[Any]) -> Iterator[Any]:
+    groups = [blocks[i : i + GROUP] for i in range(0, len(blocks), GROUP)]
+    client = getattr(get_scheduler(), "__self__", None)
+    if client is None:
+        for group in groups:
+            yield from compute(*group)
+        return
+    running: deque[Any] = deque()
+    for group in groups:
+        running.append(client.compute(group))
+        if len(running) > 1:
+            yield from client.gather(running.popleft())
+    for futures in running:
+        yield from client.gather(futures)
+
+
+def _write_by_rasterio(name: str, sheet: Sheet, blocks: Blocks) -> None:
+    import rasterio
+    from rasterio.enums import Resampling  # type: ignore[import]
+    from rasterio.windows import Window  # type: ignore[import]
+
+    with rasterio.open(
+        name,
+        "w",
+        driver="GTiff",
+        width=sheet.columns,
+        height=sheet.rows,
+        count=1,
+        dtype=sheet.dtype.name,
+        crs=sheet.crs,
+        transform=rasterio.Affine(*sheet.transform),
+        nodata=np.nan if sheet.dtype.kind == "f" else None,
+        **sheet.options(),
+    ) as file:
+        for row, column, cells in blocks:
+            file.write(cells, 1, window=Window(column, row, cells.shape[1], cells.shape[0]))
+    with rasterio.open(name, "r+") as file:
+        file.build_overviews(sheet.overviews(), Resampling.average)
+
+
+def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
+    from osgeo import gdal, gdal_array
+
+    with _exceptions_of(gdal):
+        kind = gdal_array.NumericTypeCodeToGDALTypeCode(sheet.dtype)
+        options = [f"{key}={value}" for key, value in sheet.options().items()]
+        file = gdal.GetDriverByName("GTiff").Create(name, sheet.columns, sheet.rows, 1, kind, options)
+        a, b, c, d, e, f = sheet.transform
+        file.SetGeoTransform((c, a, b, f, d, e))
+        if sheet.crs is not None:
+            file.SetProjection(sheet.crs)
+        band = file.GetRasterBand(1)
+        if sheet.dtype.kind == "f":
+            band.SetNoDataValue(np.nan)
+        for row, column, cells in blocks:
+            band.WriteArray(cells, column, row)
+        file.FlushCache()
+        file.BuildOverviews("AVERAGE", sheet.overviews())
+        del band, file
+
+
+@contextmanager
+def _exceptions_of(gdal: Any) -> Iterator[None]:
+    """Errors of GDAL become exceptions here, and afterwards what the program has chosen."""
+    before = gdal.GetUseExceptions()
+    gdal.UseExceptions()
+    try:
+        yield
+    finally:
+        if not before:
+            gdal.DontUseExceptions()
