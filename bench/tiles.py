@@ -151,8 +151,8 @@ def draw(cells, picture):
     import matplotlib
 
     matplotlib.use("Agg")
-    from matplotlib import image
     from matplotlib.colors import LightSource
+    from PIL import Image
 
     heights = cells.compute()
     land = np.isfinite(heights)
@@ -162,7 +162,8 @@ def draw(cells, picture):
         np.where(land, heights, 0), matplotlib.colormaps["gist_earth"], dx=50, dy=50, vert_exag=3, vmin=-900
     )
     shaded[~land, :3] = 0.82, 0.9, 0.95
-    image.imsave(picture, (255 * shaded[..., :3]).astype(np.uint8), pil_kwargs={"optimize": True})
+    image = Image.fromarray((255 * shaded[..., :3]).astype(np.uint8))
+    image.quantize(64).save(picture, optimize=True)
 
 
 def main():

@@ -53,7 +53,7 @@ std::string WriteLayer(fuzz::Bytes& rBytes) {
     for (unsigned rest = rBytes.TakeFrom(1, 60); rest > 0; --rest) {
         OGRFeature feature(layer->GetLayerDefn());
         feature.SetGeometryDirectly(TakeTriangle(rBytes).release());
-        static_cast<void>(layer->CreateFeature(&feature));
+        fuzz::Require(layer->CreateFeature(&feature) == OGRERR_NONE);
     }
     return name;
 }

@@ -95,8 +95,10 @@ struct WindowTest : FileTest {
                     << oShape.first;
             const bool bLarge = oWindow.min.x < -99 && oWindow.max.x > 99;
             EXPECT_EQ(oFound.size() < oAll.size() / 2, bQuick && !bLarge);
-            const auto nCount = static_cast<unsigned>(ZARCountShapes(poLayer, &low, &high));
-            EXPECT_EQ(nCount, bQuick && !bLarge ? oFound.size() : nCount);
+            const int nCount = ZARCountShapes(poLayer, &low, &high);
+            if (bQuick && !bLarge) {
+                EXPECT_EQ(nCount, static_cast<int>(oFound.size()));
+            }
             EXPECT_EQ(nCount, poReader->EstimateShapeCount(oWindow));
             EXPECT_LE(CountMet(oAll, oWindow), nCount);
             for (const auto& oShape : {oAll.back(), oAll.front()}) // out of turn
@@ -110,11 +112,10 @@ struct WindowTest : FileTest {
         EXPECT_EQ(Walk(poLayer), oAll);
         moTranscript.moLines.clear(); // other tests read these
     }
-    static unsigned CountMet(const Shapes& oAll, const Window& oWindow) {
-        return static_cast<unsigned>(
-            std::count_if(oAll.begin(), oAll.end(), [&](const auto& oShape) {
-                return !oShape.second.empty() && Meets(oShape.second, oWindow);
-            }));
+    static int CountMet(const Shapes& oAll, const Window& oWindow) {
+        return static_cast<int>(std::count_if(oAll.begin(), oAll.end(), [&](const auto& oShape) {
+            return !oShape.second.empty() && Meets(oShape.second, oWindow);
+        }));
     }
     static std::vector<Window> MakeWindows() {
         std::vector<Window> oWindows;

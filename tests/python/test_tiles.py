@@ -6,6 +6,7 @@ import pickle
 import subprocess
 import sys
 import time
+from types import SimpleNamespace
 
 import kelm_tin
 import numpy as np
@@ -15,6 +16,7 @@ from conftest import ROOT, TERRAIN
 dask = pytest.importorskip("dask")
 import dask.array as da  # noqa: E402
 from kelm_tin import tiles  # noqa: E402
+from kelm_tin.tiles import _work  # noqa: E402
 
 BASE = (500000.25, 4649776.5)
 CELL = 4.0
@@ -69,6 +71,22 @@ def test_bits_are_those_of_the_whole_surface(country, tile, limit):
     assert tiles.heights(plan, xy).compute().tobytes() == whole.heights(xy).tobytes()
     closed = tiles.heights(plan, xy, closed=True).compute()
     assert closed.tobytes() == whole.heights(xy, closed=True).tobytes()
+
+
+@pytest.mark.parametrize("cell, call", [(2.0, "raster"), (1000 / 999, "heights")])
+def test_centres_are_those_of_the_whole_raster(cell, call):
+    """Of some sizes of cells a raster call for one tile would round the centres in another way."""
+    plan = tiles.Plan(TERRAIN, tile=1000.0)
+    asked = []
+    spy = SimpleNamespace(
+        raster=lambda *_, **__: asked.append("raster") or SimpleNamespace(heights=0),
+        heights=lambda *_, **__: asked.append("heights") or 0,
+    )
+    frame = _work.Frame(cell, round(1000 / cell), False)
+    with pytest.MonkeyPatch.context() as patch:
+        patch.setattr(_work, "_load", lambda *_: spy)
+        _work.fill_cells(plan, frame, (7, 5))
+    assert asked == [call]
 
 
 def test_a_far_base_loses_no_triangle_beside_a_seam(country):
@@ -226,7 +244,7 @@ def test_estimate_bounds_what_a_worker_needs(country):
         (lambda: tiles.raster(tiles.Plan(TERRAIN, tile=2000), 5000), "no whole number of cells of 5000"),
         (lambda: tiles.heights(tiles.Plan(TERRAIN, tile=2000), [1.0, 2.0]), r"xy: expected shape \(n, 2\)"),
         (lambda: tiles.heights(tiles.Plan(TERRAIN, tile=2000), da.zeros((3, 3))), r"got \(3, 3\)"),
-        (lambda: tiles.raster(tiles.Plan(TERRAIN, tile=2000, limit=999), 50).compute(), "tile .* limit is 999"),
+        (lambda: tiles.raster(tiles.Plan(TERRAIN, tile=2000, limit=999), 50).compute(), "tile .* exceeds the limit of 999"),
     ],
 )
 def test_refusals(call, message):

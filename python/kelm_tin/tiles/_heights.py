@@ -38,7 +38,7 @@ def heights(plan: Plan, xy: Any, *, closed: bool = False) -> Any:
 
     >>> plan = Plan("data/jacksboro.gpkg", tile=2000.0)
     >>> heights(plan, [[745000.0, 4052000.0], [0.0, 0.0]]).compute()
-    array([752.5049,      nan], dtype=float32)
+    array([752.4963,      nan], dtype=float32)
     """
     if hasattr(xy, "columns"):
         return _answer_frame(plan, xy, closed)

@@ -63,7 +63,7 @@ class Plan:
 
     >>> plan = Plan("data/jacksboro.gpkg", tile=2000.0)
     >>> plan.tiles, plan.origin
-    ((8, 7), (736000.0, 4062000.0))
+    ((8, 8), (738000.0, 4060000.0))
     """
 
     path: str

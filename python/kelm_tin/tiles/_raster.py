@@ -57,7 +57,7 @@ def raster(plan: Plan, cell: float, *, closed: bool = False) -> RasterArray:
 
     >>> cells = raster(Plan("data/jacksboro.gpkg", tile=2000.0), 40.0)
     >>> cells.shape, cells.transform
-    ((400, 350), (40.0, 0.0, 736000.0, 0.0, -40.0, 4062000.0))
+    ((400, 400), (40.0, 0.0, 738000.0, 0.0, -40.0, 4060000.0))
     """
     size = to_positive("cell", cell)
     side = round(plan.tile / size)
