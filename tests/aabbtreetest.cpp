@@ -105,7 +105,7 @@ void ExpectSame(const AabbNode* node, const AabbNode* wanted) {
 /// Surfaces that are large enough for a team.
 std::vector<OddSurface> MakeLargeSurfaces(Random& random) {
     Mesh sheets;
-    while (sheets.ids.size() < 40000) { // in random order over one place, so that no order helps
+    while (sheets.ids.size() < 40000) { // all over one place
         const auto first = static_cast<unsigned>(sheets.vertices.size());
         const Mesh sheet = MakeSheet(9, random);
         sheets.vertices.insert(sheets.vertices.end(), sheet.vertices.begin(), sheet.vertices.end());
