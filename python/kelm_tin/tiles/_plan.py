@@ -196,7 +196,8 @@ class Plan:
     def estimate_boxes(self, boxes: list[Box]) -> NDArray[np.int64]:
         """The same for each of some boxes."""
         each = self._survey.load_nbytes / max(1, self._survey.shapes)
-        return OPEN_NBYTES + np.ceil(self.count(boxes) * each).astype(np.int64)
+        needed: NDArray[np.int64] = OPEN_NBYTES + np.ceil(self.count(boxes) * each).astype(np.int64)
+        return needed
 
     def parts(self, tile: Tile) -> list[Box]:
         """The boxes in which a tile is answered, so that each stays within the limit.
