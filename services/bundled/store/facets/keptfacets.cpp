@@ -1,6 +1,7 @@
 #include "services/bundled/store/facets/keptfacets.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstring>
 #include <limits>
 #include <new>
@@ -11,9 +12,18 @@ namespace {
 
 constexpr std::size_t BLOCK_BYTES = 2 * memory::LARGE_PAGE;
 
+/// False for a NaN, which is kept as it is.
+bool HasSameBits(double a, double b) {
+    return a == b && std::signbit(a) == std::signbit(b);
+}
+
 bool IsTriangle(const std::vector<ZARVertex>& vertices) {
-    return vertices.size() == 4 &&
-           std::memcmp(&vertices.front(), &vertices.back(), sizeof(ZARVertex)) == 0;
+    if (vertices.size() != 4)
+        return false;
+    const ZARVertex& first = vertices.front();
+    const ZARVertex& last = vertices.back();
+    return HasSameBits(first.x, last.x) && HasSameBits(first.y, last.y) &&
+           HasSameBits(first.z, last.z);
 }
 
 } // namespace
