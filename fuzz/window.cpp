@@ -45,7 +45,7 @@ OGRGeometryUniquePtr TakeTriangle(fuzz::Bytes& rBytes) {
 /// @return the name of the file
 std::string WriteLayer(fuzz::Bytes& rBytes) {
     const bool isShape = rBytes.TakeFrom(0, 1) == 1;
-    const std::string name = std::string(FOLDER) + (isShape ? "/a.shp" : "/a.fgb");
+    std::string name = std::string(FOLDER) + (isShape ? "/a.shp" : "/a.fgb");
     GDALDriver* driver =
         GetGDALDriverManager()->GetDriverByName(isShape ? "ESRI Shapefile" : "FlatGeobuf");
     const GDALDatasetUniquePtr file(driver->Create(name.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
