@@ -68,9 +68,14 @@ class IndexReader final : public RunReader {
 
 void IndexReader::Start(const FeatureRun& run) {
     moFeatures.clear();
-    moFeatures.resize(static_cast<std::size_t>(run.mnLast - run.mnFirst + 1));
     mnFirst = run.mnFirst;
     mnNext = 0;
+    // Ids of such a layer count its features. A run that says otherwise is not of this file: it
+    // then ends at once, which the caller takes for a change of the file.
+    const std::int64_t count = run.mnLast - run.mnFirst + 1;
+    if (count != run.mnFeatures || count > moLayer.GetFeatureCount(FALSE))
+        return;
+    moFeatures.resize(static_cast<std::size_t>(count));
     Fetch(run);
     Stop();
 }
