@@ -23,8 +23,8 @@ CAUSES = {
             "load then welds the corners and makes vertices and triangles",
     "load-again": "The loop makes nothing. A second load reads as the loop does, since the file may "
                   "have changed, and then welds. GDAL's columns would read a GeoPackage in half "
-                  "the time, but GDAL 3.6 fills them on threads that open the file anew, and a "
-                  "damaged page makes it try without end",
+                  "the time, but GDAL 3.6 fills them on threads of its own, past the error "
+                  "handler, and with damaged pages one run did not end in ten minutes",
     "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing "
               "is. At equal density of the positions, in the row `fine`, a height grows less",
 }
