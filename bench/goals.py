@@ -19,9 +19,9 @@ CAUSES = {
     "raster": "The walk gives column, row and height of every cell, with two divisions in double "
               "for each cell by the inside rule. The plain walk trusts the ends of a row, "
               "divides once for each row and writes to the raster directly",
-    "load": "The loop makes nothing. Opening reads as the loop does, and keeps what it reads. The "
+    "load": "Not proved. The loop makes nothing. Opening reads as the loop does, and keeps what it reads. The "
             "load then welds the corners and makes vertices and triangles",
-    "load-again": "The loop makes nothing. A second load reads as the loop does, since the file may "
+    "load-again": "Not proved. The loop makes nothing. A second load reads as the loop does, since the file may "
                   "have changed, and then welds. GDAL's columns would read a GeoPackage in half "
                   "the time, but GDAL 3.6 fills them on threads of its own, past the error "
                   "handler, and with damaged pages one run did not end in ten minutes",
@@ -142,9 +142,8 @@ def add_ratios(goal, results, subject, who, others, bounds):
     return goal
 
 
-def by_size(bound, **others):
-    return {row: others.get(row, others.get("M", bound) if "M" in row else bound)
-            for row in TERRAINS}
+def by_size(bound):
+    return dict.fromkeys(TERRAINS, bound)
 
 
 def get_height_goals(results):

@@ -5,20 +5,12 @@
 #include "tin/tinreaderfactory.h"
 
 #include <cmath>
-#include <stdexcept>
 
 #include <ogrsf_frmts.h>
 
 namespace kelm::bench {
 
 namespace {
-
-template <typename T>
-T& Need(T* poObject, const std::string& sWhat) {
-    if (poObject == nullptr)
-        throw std::runtime_error("GDAL: no " + sWhat);
-    return *poObject;
-}
 
 /// Sum of all ordinates of a triangle's corners, to tell whether two loads found the same.
 double AddCorner(double x, double y, double z) {

@@ -11,13 +11,6 @@ namespace kelm::bench {
 
 namespace {
 
-template <typename T>
-T& Need(T* poObject, const std::string& sWhat) {
-    if (poObject == nullptr)
-        throw std::runtime_error("GDAL: no " + sWhat);
-    return *poObject;
-}
-
 /// Three corners and the first again.
 OGRPolygon* MakePolygon(const containers::KeyPoint<double>* poCorners) {
     auto* ring = new OGRLinearRing;

@@ -107,9 +107,9 @@ void TestWindows(ZARLayer_t* layer, const Shapes* all, fuzz::Bytes& rBytes) {
 /// Alters the content of a survey and mends its checksum. @return is it still the same?
 bool Alter(std::string& rSurvey, fuzz::Bytes& rBytes) {
     ByteReader reader(rSurvey);
-    const std::string writer = reader.GetText();
+    const std::string writer(reader.GetText());
     static_cast<void>(reader.Get<std::uint64_t>());
-    std::string content = reader.GetText();
+    std::string content(reader.GetText());
     const std::string before = content;
     for (unsigned rest = rBytes.TakeFrom(0, 6); rest > 0; --rest) {
         const std::size_t at = rBytes.Take<std::uint16_t>() % content.size();

@@ -15,6 +15,8 @@ from ._surface import Surface
 
 Path = Union[str, "os.PathLike[str]"]
 Progress = Callable[[int, int], object]
+Facts = tuple[int, tuple[float, float, float, float], tuple[float, float], Optional[str], int, int]
+"""What `Layer` and `Survey` have in common, from `shapes` to `surface_nbytes`."""
 
 
 class DataWarning(UserWarning):
@@ -152,17 +154,7 @@ def survey(path: Path, layer: Optional[int] = None, *, progress: Optional[Progre
         facts, data = _native.survey(_to_file(path), _to_number(layer), progress, texts)
     finally:
         _warn(texts)
-    return Survey(
-        os.fspath(path),
-        layer,
-        facts.shapes,
-        _to_plan(facts),
-        _to_heights(facts),
-        facts.crs,
-        facts.load_nbytes,
-        facts.surface_nbytes,
-        data,
-    )
+    return Survey(os.fspath(path), layer, *_to_facts(facts), data)
 
 
 def count_shapes(
@@ -190,19 +182,7 @@ def layers(path: Path) -> list[Layer]:
         facts = _native.layers(_to_file(path), texts)
     finally:
         _warn(texts)
-    return [
-        Layer(
-            each.number,
-            each.refusal,
-            each.shapes,
-            _to_plan(each),
-            _to_heights(each),
-            each.crs,
-            each.load_nbytes,
-            each.surface_nbytes,
-        )
-        for each in facts
-    ]
+    return [Layer(each.number, each.refusal, *_to_facts(each)) for each in facts]
 
 
 def _to_file(path: Path) -> str:
@@ -220,12 +200,10 @@ def _to_number(layer: Optional[int]) -> int:
     return layer
 
 
-def _to_plan(facts: _native.LayerFacts) -> tuple[float, float, float, float]:
-    return facts.box[0], facts.box[1], facts.box[3], facts.box[4]
-
-
-def _to_heights(facts: _native.LayerFacts) -> tuple[float, float]:
-    return facts.box[2], facts.box[5]
+def _to_facts(facts: _native.LayerFacts) -> Facts:
+    xmin, ymin, zmin, xmax, ymax, zmax = facts.box
+    bounds, heights = (xmin, ymin, xmax, ymax), (zmin, zmax)
+    return facts.shapes, bounds, heights, facts.crs, facts.load_nbytes, facts.surface_nbytes
 
 
 def to_datum(name: str, value: str) -> _native.Datum:

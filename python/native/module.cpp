@@ -36,12 +36,12 @@ auto ReadFile(const std::string& file, int layer, DatumType source, DatumType ou
               const std::optional<std::array<double, 4>>& window,
               const std::optional<std::array<double, 2>>& base, double offset, double scale,
               const std::string& survey, const py::object& progress, py::list warnings) {
-    // A layer without a survey is read twice: by opening and by loading it.
+    // Without a survey, opening reads the layer, which is about half of the work.
     const double opened = survey.empty() ? 0.5 : 0.0;
     PythonProgress opening(progress, 0.0, opened);
     PythonProgress loading(progress, opened, 1.0);
-    const ReadOptions options{layer,  source, output, window,        base,
-                              offset, scale,  survey, opening.Get(), loading.Get()};
+    const ReadOptions options{
+        layer, source, output, window, base, offset, scale, {survey, opening.Get()}, loading.Get()};
     return Collect(warnings, [&] { return Read(file, options); });
 }
 
@@ -49,7 +49,7 @@ auto SurveyFile(const std::string& file, int layer, const py::object& progress, 
     PythonProgress opening(progress, 0.0, 1.0);
     ReadOptions options;
     options.mnLayer = layer;
-    options.moOpening = opening.Get();
+    options.moOpening.progress = opening.Get();
     auto [facts, bytes] = Collect(warnings, [&] { return SurveyLayer(file, options); });
     return std::pair(std::move(facts), py::bytes(bytes));
 }
@@ -58,7 +58,7 @@ auto CountFile(const std::string& file, int layer, const std::string& survey,
                const std::vector<std::array<double, 4>>& windows, py::list warnings) {
     ReadOptions options;
     options.mnLayer = layer;
-    options.moSurvey = survey;
+    options.moOpening.survey = survey;
     return Collect(warnings, [&] { return CountShapes(file, options, windows); });
 }
 

@@ -38,7 +38,7 @@ std::unique_ptr<TinReader> OpenReader(const std::string& file, const ReadOptions
     try {
         return std::unique_ptr<TinReader>(tin::TinReaderFactory::CreateTinReader(
             file.c_str(), options.mnLayer, options.mdfOffset, options.mdfScale, options.meSource,
-            {options.moSurvey, options.moOpening}));
+            options.moOpening));
     } catch (const kelm::Exception& failure) {
         if (IsNested(failure))
             throw FileError(GetText(failure));

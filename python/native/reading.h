@@ -3,7 +3,7 @@
 #include "python/native/surface.h"
 
 #include <services/crs.h>
-#include <tin/progress.h>
+#include <tin/openoptions.h>
 
 #include <optional>
 #include <string>
@@ -37,8 +37,7 @@ struct ReadOptions {
     std::optional<std::array<double, 2>> moBase;
     double mdfOffset = 0.0;
     double mdfScale = 1.0;
-    std::string moSurvey; ///< of the layer; empty: it is surveyed
-    tin::Progress moOpening;
+    tin::OpenOptions moOpening;
     tin::Progress moLoading;
 };
 

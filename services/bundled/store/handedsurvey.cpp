@@ -77,9 +77,9 @@ std::string WriteSurvey(const SurveyOrigin& origin, const LayerSurvey& survey,
 
 HandedSurvey ReadSurvey(const std::string& bytes, const std::string& file) {
     ByteReader framed(bytes);
-    const std::string writer = framed.GetText();
+    const std::string_view writer = framed.GetText();
     const auto sum = framed.Get<std::uint64_t>();
-    const std::string content = framed.GetText();
+    const std::string_view content = framed.GetText();
     if (framed.HasFailed() || !framed.IsAtEnd() || sum != ComputeChecksum(content))
         RefuseSurvey(file, "it is damaged");
     if (writer != GetWriter())

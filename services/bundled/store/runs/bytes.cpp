@@ -23,7 +23,7 @@ std::size_t ByteReader::GetCount(std::size_t bytes) {
     return mbFailed ? 0 : static_cast<std::size_t>(count);
 }
 
-std::string ByteReader::GetText() {
+std::string_view ByteReader::GetText() {
     const std::size_t size = GetCount(1);
     mnNext += size;
     return moBytes.substr(mnNext - size, size);
@@ -42,7 +42,7 @@ std::vector<bool> ByteReader::GetBits() {
     return bits;
 }
 
-std::uint64_t ComputeChecksum(const std::string& bytes) {
+std::uint64_t ComputeChecksum(std::string_view bytes) {
     std::uint64_t sum = 0xcbf29ce484222325U;
     for (const char byte : bytes)
         sum = (sum ^ static_cast<unsigned char>(byte)) * 0x100000001b3U;

@@ -3,6 +3,7 @@
 #include <cstdint>
 #include <cstring>
 #include <string>
+#include <string_view>
 #include <type_traits>
 #include <vector>
 
@@ -32,7 +33,7 @@ class ByteWriter {
 class ByteReader {
   public:
     /// @param bytes must outlive the reader
-    explicit ByteReader(const std::string& bytes) : moBytes(bytes) {}
+    explicit ByteReader(std::string_view bytes) : moBytes(bytes) {}
 
     template <typename Value>
     Value Get() {
@@ -46,7 +47,8 @@ class ByteReader {
     }
     /// @return the number of items that follow. @param bytes the least that one takes
     std::size_t GetCount(std::size_t bytes);
-    std::string GetText();
+    /// @return a text, which stands in the bytes
+    std::string_view GetText();
     std::vector<bool> GetBits();
 
     /// @return true if more was asked for than there is
@@ -56,13 +58,13 @@ class ByteReader {
   private:
     bool Has(std::size_t count);
 
-    const std::string& moBytes;
+    std::string_view moBytes;
     std::size_t mnNext = 0;
     bool mbFailed = false;
 };
 
 /// @return a number that any change of a byte changes (FNV-1a of 64 bits). It guards against
 /// accidents, not against intent
-std::uint64_t ComputeChecksum(const std::string& bytes);
+std::uint64_t ComputeChecksum(std::string_view bytes);
 
 } // namespace kelm::store
