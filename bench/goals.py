@@ -19,12 +19,12 @@ CAUSES = {
     "raster": "The walk gives column, row and height of every cell, with two divisions in double "
               "for each cell by the inside rule. The plain walk trusts the ends of a row, "
               "divides once for each row and writes to the raster directly",
-    "load": "Not proved. The loop makes nothing. Opening reads as the loop does, and keeps what it reads. The "
-            "load then welds the corners and makes vertices and triangles",
-    "load-again": "Not proved. The loop makes nothing. A second load reads as the loop does, since the file may "
-                  "have changed, and then welds. GDAL's columns would read a GeoPackage in half "
-                  "the time, but GDAL 3.6 fills them on threads of its own, past the error "
-                  "handler, and with damaged pages one run did not end in ten minutes",
+    "load": "The table of the loads has the parts. Opening reads as much as the loop, and keeps "
+            "it: that is the column `opening`. The first load then only welds and makes the "
+            "surface, and takes what is left of a second load without its reading",
+    "load-again": "The table of the loads has the parts. Reading alone takes what the last but "
+                  "one column tells, in loops. The rest is what the loop does not do: it welds "
+                  "three million corners, and writes vertices and triangles",
     "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing "
               "is. At equal density of the positions, in the row `fine`, a height grows less",
 }

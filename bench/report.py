@@ -93,15 +93,18 @@ def format_load(results, subject):
     rows = []
     for row in results.get_rows(subject):
         for who in results.get_columns(subject):
-            again = results.get(subject, row, who, "again")
-            share = again / results.get(subject, row, "bare OGR loop", "again")
+            loop = results.get(subject, row, "bare OGR loop", "again")
+            again, reading = (results.get(subject, row, who, name)
+                              for name in ("again", "reading"))
             rows.append([row, who, format_cell(results, subject, row, who, 1e-9 * get_count(row)),
                          format_figure(results.get(subject, row, who, "open")),
                          format_figure(results.get(subject, row, who, "load")),
-                         f"{format_figure(again)} ({share:.2f} loops)",
+                         f"{format_figure(again)} ({again / loop:.2f} loops)",
+                         f"{format_figure(reading)} ({reading / loop:.2f} loops)",
                          format_figure(results.get(subject, row, who, "peak") / 1e6)])
     return format_table(["Triangles", "", "opening and first load, s (ratio)", "opening, s",
-                         "first load, s", "second load, s", "peak memory, MB"], rows)
+                         "first load, s", "second load, s", "of it reading, s", "peak memory, MB"],
+                        rows)
 
 
 def format_subject(results, title, subject, factor, unit, words):

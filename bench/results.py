@@ -30,7 +30,7 @@ class Results:
             return
         figures = self.figures.setdefault(key, {})
         for name in ("items_per_second", "differ", "differ_found",
-                     "differ_most", "open", "load", "again", "peak", "held", "triangles",
+                     "differ_most", "open", "load", "again", "reading", "peak", "held", "triangles",
                      "crossings", "bytes", "cpu_time"):
             if name in run:
                 figures.setdefault(name, []).append(run[name])

@@ -32,15 +32,22 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     std::iota(keys.begin(), keys.end(), 0U);
     const Octree2 tree(corners, keys);
 
-    std::vector<unsigned> standIns(corners.size());
-    const bool decided = kelm::tin::load::CornerHash::FindStandIns(corners, standIns);
+    // The corners in front of the first one that the hash leaves to the octree are decided.
+    std::vector<std::uint32_t> numbers(corners.size());
+    kelm::tin::load::CornerHash hash(corners.size());
+    const std::size_t decided = hash.Add(corners.data(), corners.size(), numbers.data());
+    std::vector<unsigned> firsts;
     unsigned kept = 0;
     for (unsigned i = 0; i < corners.size(); ++i) {
         Require(keys[i] <= 1);
         kept += keys[i];
         const unsigned standIn = keys[i] == 1 ? i : GetStandIn(tree, corners[i]);
         Require(keys[standIn] == 1);
-        Require(!decided || standIns[i] == standIn);
+        if (i >= decided)
+            continue;
+        if (numbers[i] == firsts.size())
+            firsts.push_back(i);
+        Require(firsts.at(numbers[i]) == standIn);
     }
     Require(static_cast<unsigned>(tree.GetPointCount()) == kept);
     return 0;

@@ -20,9 +20,10 @@ struct ZARLayer_t;
 namespace kelm::tin {
 
 namespace load {
-class CornerList;
+class Welder;
 struct ElevationFactor;
 struct HeightColumn;
+struct Welded;
 } // namespace load
 
 /// Reads surfaces from the polygon layer of a file.
@@ -154,10 +155,9 @@ class KELM_TIN_EXPORT TinReader {
     void SetUp(double dfOffset, double dfScale);
     void ReleaseCRS();
     void ReadShape(int id, const BBox<double, point2_t<double>>* poWindow,
-                   load::CornerList& rCorners) const;
+                   load::Welder& rCorners) const;
     load::ElevationFactor GetElevationFactor() const;
-    Tin* AssembleTin(std::vector<containers::KeyPoint<double>>& oPoints,
-                     std::vector<Triangle_Id>& oIds, const LoadOptions& oOptions);
+    Tin* AssembleTin(load::Welded& rWelded, const LoadOptions& oOptions);
     load::HeightColumn GetColumn(point3_t<float>* poPoints, unsigned int nCount) const;
 
     ZARLayer_t* mpLayer;

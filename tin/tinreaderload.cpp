@@ -1,13 +1,12 @@
 #include "tin/tinreader.h"
 
 #include "services/exception.h"
-#include "services/memory/largepages.h"
 #include "services/reporting.h"
 #include "services/vectorlayer.h"
 #include "tin/detail/polygon.h"
 #include "tin/load/assembly.h"
-#include "tin/load/cornerlist.h"
 #include "tin/load/weld.h"
+#include "tin/load/welder.h"
 #include "tin/triangulate.h"
 
 #include <algorithm>
@@ -95,6 +94,16 @@ const ZARShape* FindShape(ZARLayer_t* layer, int id) {
     return shape;
 }
 
+/// Whatever fails in a weld, the caller gets one exception.
+template <typename Function>
+load::Welded TryWeld(const Function& weld) {
+    try {
+        return weld();
+    } catch (...) {
+        throw Exception("Octree2 error", "tin/tinreader", __PRETTY_FUNCTION__, __LINE__);
+    }
+}
+
 /// Positions of such a surface would not be numbers.
 void TestBase(const LoadOptions& options) {
     if (options.base && !(std::isfinite(options.base->x) && std::isfinite(options.base->y)))
@@ -131,13 +140,15 @@ Tin* TinReader::Load(const Window* poWindow, const LoadOptions& oOptions) {
         return nullptr;
     const ScopedLock lock(moMutex);
     const ToldWindow told(mpLayer, poWindow);
-    load::CornerList corners(mnShapeCount);
+    load::Welder corners(mnShapeCount);
     ReadMeter meter(oOptions.progress, mnShapeCount);
     for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id)) {
         meter.Count();
         ReadShape(id, poWindow, corners);
     }
-    return AssembleTin(corners.GetPoints(), corners.GetIds(), oOptions);
+    oOptions.progress.Report(READ, "welding corners");
+    load::Welded welded = TryWeld([&] { return corners.Finish(); });
+    return AssembleTin(welded, oOptions);
 }
 
 std::string TinReader::GetSurvey() const {
@@ -164,7 +175,7 @@ std::string TinReader::GetCRSText() const {
     return info.definition;
 }
 
-void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCorners) const {
+void TinReader::ReadShape(int id, const Window* poWindow, load::Welder& rCorners) const {
     const ZARShape* shape = FindShape(mpLayer, id);
     if (shape == nullptr)
         return;
@@ -179,7 +190,7 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
         rCorners.AddTriangle(*shape);
         return;
     }
-    load::CornerList::Ring& ring = rCorners.GetEmptyRing();
+    load::Welder::Ring& ring = rCorners.GetEmptyRing();
     if (Triangulate(polygon, ring.triangles) != 0) {
         tellus::Warning::Warn(
             FormatString("Triangulate(): Polygon# %d is ignored becasue it is not simple.\n", id),
@@ -191,29 +202,23 @@ void TinReader::ReadShape(int id, const Window* poWindow, load::CornerList& rCor
 }
 
 Tin* TinReader::CreateTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds) {
-    return AssembleTin(oPoints, oIds, {});
-}
-
-Tin* TinReader::AssembleTin(std::vector<KeyPoint<double>>& oPoints, std::vector<Triangle_Id>& oIds,
-                            const LoadOptions& oOptions) {
     if (oPoints.empty() || oIds.empty())
         return nullptr;
-    oOptions.progress.Report(READ, "welding corners");
-    auto oKeys = memory::CreateLargeList<unsigned>(oPoints.size());
-    unsigned nVertices;
-    try {
-        nVertices = load::Weld(oPoints, oIds, oKeys);
-    } catch (...) {
-        throw Exception("Octree2 error", "tin/tinreader", __PRETTY_FUNCTION__, __LINE__);
-    }
+    load::Welded welded = TryWeld([&] { return load::Weld(oPoints, oIds); });
+    return AssembleTin(welded, {});
+}
+
+Tin* TinReader::AssembleTin(load::Welded& rWelded, const LoadOptions& oOptions) {
+    if (rWelded.triangles.empty())
+        return nullptr;
     oOptions.progress.Report(WELDED, "making the surface");
-    load::Assembly parts = load::Assemble(oPoints, oIds, oKeys, nVertices, oOptions.base);
+    load::Assembly parts = load::Assemble(rWelded, oOptions.base);
     mdfXBase = parts.base.x;
     mdfYBase = parts.base.y;
     const aabb_t<point2_t<float>> oBox = load::ComputeBox(parts);
     if (oOptions.base)
         ReportFarBase(parts.base, oBox);
-    (this->*mpfnHeightConvert)(&oBox, parts.vertices.get(), nVertices);
+    (this->*mpfnHeightConvert)(&oBox, parts.vertices.get(), parts.vertexCount);
     oOptions.progress.Report(1.0, "done"); // a stop still finds an owner for the parts
     auto surface =
         std::make_unique<Tin>(parts.vertices.get(), parts.vertexCount, parts.triangles.get(),

@@ -1,13 +1,11 @@
 #pragma once
 
-#include "containers/keypoint.h"
+#include "tin/load/weld.h"
 #include "tin/point.h"
 #include "tin/triangle.h"
-#include "tin/triangleid.h"
 
 #include <memory>
 #include <optional>
-#include <vector>
 
 namespace kelm::tin::load {
 
@@ -21,14 +19,11 @@ struct Assembly {
 };
 
 /// Makes the arrays of welded corners. Vertices come in the order of their corners.
-/// @param points,ids,keys as Weld leaves them; each list is emptied as soon as it falls out of use,
-/// so that the large ones do not coexist @param kept the number of kept corners
-/// @param given the base; if there is none, the base is the first kept corner that has a finite
-/// position, else the origin
+/// @param welded not empty; each list is emptied as soon as it falls out of use, so that the large
+/// ones do not coexist @param given the base; if there is none, the base is the first corner that
+/// has a finite position, else the origin
 /// @throw std::bad_alloc
-Assembly Assemble(std::vector<containers::KeyPoint<double>>& points, std::vector<Triangle_Id>& ids,
-                  std::vector<unsigned>& keys, unsigned kept,
-                  const std::optional<point2_t<double>>& given);
+Assembly Assemble(Welded& welded, const std::optional<point2_t<double>>& given);
 
 /// @return box of the triangles in plan
 aabb_t<point2_t<float>> ComputeBox(const Assembly& parts);

@@ -4,14 +4,13 @@
 #include "tin/octree2.h"
 
 #include <algorithm>
-#include <array>
 #include <cmath>
 
 namespace kelm::tin::load {
 
 namespace {
 
-using Point = containers::KeyPoint<double>;
+using Point = CornerHash::Point;
 
 constexpr std::uint32_t NONE = 0xFFFFFFFFU;
 
@@ -29,9 +28,6 @@ constexpr double REACH = 2e-9;
 
 /// More different corners than this behind one hash are left to the octree.
 constexpr int MOST_PROBES = 64;
-
-/// Corners whose slots are fetched ahead of their turn.
-constexpr std::size_t BATCH = 32;
 
 struct Cell {
     std::int64_t x;
@@ -72,49 +68,54 @@ std::uint32_t GetTag(std::uint64_t hash) {
 
 } // namespace
 
-CornerHash::CornerHash(const std::vector<Point>& rPoints) : mrPoints(rPoints) {
-    // A closed sheet keeps a sixth of its corners; other layers make the table grow.
+CornerHash::CornerHash(std::size_t corners) {
+    // A sheet keeps a sixth of its corners and those of its rim; other layers make the table grow.
     std::size_t slots = 64;
-    while (slots < rPoints.size() / 2)
+    while (slots < corners / 3 + corners / 100)
         slots *= 2;
     moSlots = memory::CreateLargeList(slots, Slot{NONE, 0});
     mnMask = slots - 1;
+    memory::ReserveLarge(moKept, slots / 2);
 }
 
-bool CornerHash::FindStandIns(const std::vector<Point>& points, std::vector<unsigned>& standIns) {
-    return CornerHash(points).Run(standIns);
-}
-
-bool CornerHash::Run(std::vector<unsigned>& standIns) {
-    std::array<std::uint64_t, BATCH> hashes;
-    for (std::size_t first = 0; first < mrPoints.size(); first += BATCH) {
-        const std::size_t last = std::min(first + BATCH, mrPoints.size());
-        for (std::size_t i = first; i < last; ++i) {
-            if (!IsInRange(mrPoints[i]))
-                return false;
-            hashes[i - first] = GetHash(GetCell(mrPoints[i]));
-            __builtin_prefetch(&moSlots[hashes[i - first] & mnMask]);
-        }
-        for (std::size_t i = first; i < last; ++i)
-            if (!Resolve(static_cast<unsigned>(i), hashes[i - first], standIns[i]))
-                return false;
+std::size_t CornerHash::Add(const Point* corners, std::size_t count, std::uint32_t* numbers) {
+    Hashes hashes;
+    for (std::size_t first = 0; first < count; first += BATCH) {
+        const std::size_t fetched = Fetch(&corners[first], std::min(count - first, BATCH), hashes);
+        for (std::size_t i = 0; i < fetched; ++i)
+            if (!Resolve(corners[first + i], hashes[i], numbers[first + i]))
+                return first + i;
+        if (fetched < std::min(count - first, BATCH))
+            return first + fetched;
     }
-    return true;
+    return count;
 }
 
-bool CornerHash::Resolve(unsigned corner, std::uint64_t hash, unsigned& standIn) {
-    standIn = corner;
-    const Find found = Search(mrPoints[corner], hash, standIn);
+/// @return the corners in front of the first one beyond the range of the cells
+std::size_t CornerHash::Fetch(const Point* corners, std::size_t count, Hashes& hashes) const {
+    for (std::size_t i = 0; i < count; ++i) {
+        if (!IsInRange(corners[i]))
+            return i;
+        hashes[i] = GetHash(GetCell(corners[i]));
+        __builtin_prefetch(&moSlots[hashes[i] & mnMask]);
+    }
+    return count;
+}
+
+bool CornerHash::Resolve(const Point& corner, std::uint64_t hash, std::uint32_t& number) {
+    const Find found = Search(corner, hash, number);
     if (found != Find::None)
         return found == Find::Equal;
-    if (!IsAlone(mrPoints[corner]))
+    if (!IsAlone(corner))
         return false;
+    number = static_cast<std::uint32_t>(moKept.size());
     Keep(corner, hash);
     return true;
 }
 
 /// Looks for a held point in the cell behind a hash: an equal one, or one that is too near.
-CornerHash::Find CornerHash::Search(const Point& point, std::uint64_t hash, unsigned& found) const {
+CornerHash::Find CornerHash::Search(const Point& point, std::uint64_t hash,
+                                    std::uint32_t& found) const {
     const std::uint32_t tag = GetTag(hash);
     std::size_t at = hash & mnMask;
     for (int probe = 0; probe < MOST_PROBES; ++probe, at = (at + 1) & mnMask) {
@@ -123,7 +124,7 @@ CornerHash::Find CornerHash::Search(const Point& point, std::uint64_t hash, unsi
             return Find::None;
         if (slot.nTag != tag)
             continue;
-        const Point& held = mrPoints[slot.nCorner];
+        const Point& held = moKept[slot.nCorner];
         if (IsEqual(held, point)) {
             found = slot.nCorner;
             return Find::Equal;
@@ -143,27 +144,28 @@ bool CornerHash::IsAlone(const Point& point) const {
     for (std::int64_t x = low.x; x <= high.x; ++x)
         for (std::int64_t y = low.y; y <= high.y; ++y)
             for (std::int64_t z = low.z; z <= high.z; ++z) {
-                unsigned found;
+                std::uint32_t found;
                 if (Search(point, GetHash({x, y, z}), found) != Find::None)
                     return false;
             }
     return true;
 }
 
-void CornerHash::Keep(unsigned corner, std::uint64_t hash) {
-    if (2 * (mnKept + 1) > moSlots.size())
+void CornerHash::Keep(const Point& corner, std::uint64_t hash) {
+    if (2 * (moKept.size() + 1) > moSlots.size())
         Grow();
-    Place({corner, GetTag(hash)}, hash);
-    ++mnKept;
+    Place({static_cast<std::uint32_t>(moKept.size()), GetTag(hash)}, hash);
+    moKept.push_back(corner);
 }
 
 void CornerHash::Grow() {
+    memory::ReserveLarge(moKept, moSlots.size());
     auto old = memory::CreateLargeList(2 * moSlots.size(), Slot{NONE, 0});
     old.swap(moSlots);
     mnMask = moSlots.size() - 1;
     for (const Slot& slot : old)
         if (slot.nCorner != NONE)
-            Place(slot, GetHash(GetCell(mrPoints[slot.nCorner])));
+            Place(slot, GetHash(GetCell(moKept[slot.nCorner])));
 }
 
 void CornerHash::Place(const Slot& slot, std::uint64_t hash) {

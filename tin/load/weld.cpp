@@ -1,10 +1,12 @@
 #include "tin/load/weld.h"
 
+#include "services/memory/largepages.h"
 #include "tin/load/cornerhash.h"
 #include "tin/octree2.h"
 #include "tin/parallel/parallelblocks.h"
 
 #include <numeric>
+#include <utility>
 
 namespace kelm::tin::load {
 
@@ -36,29 +38,40 @@ void Renumber(std::vector<Triangle_Id>& ids, const StandIn& getStandIn) {
         });
 }
 
-/// Welds where no octree is needed. @return the number of kept corners, 0 if one is
-unsigned WeldByHash(const Points& points, std::vector<Triangle_Id>& ids,
-                    std::vector<unsigned>& keys) {
-    if (!CornerHash::FindStandIns(points, keys))
-        return 0;
-    Renumber(ids, [&](unsigned corner) { return keys[corner]; });
+/// Moves the kept corners to the front, and turns their marks into their new positions.
+void Compact(Points& points, std::vector<unsigned>& keys) {
     unsigned kept = 0;
-    for (unsigned i = 0; i < keys.size(); ++i) {
-        keys[i] = keys[i] == i ? 1 : 0;
-        kept += keys[i];
+    for (std::size_t i = 0; i < keys.size(); ++i) {
+        if (keys[i] != 1)
+            continue;
+        points[kept] = points[i];
+        keys[i] = kept++;
     }
-    return kept;
+    points.resize(kept);
 }
 
 } // namespace
 
-unsigned Weld(Points& points, std::vector<Triangle_Id>& ids, std::vector<unsigned>& keys) {
-    if (const unsigned kept = WeldByHash(points, ids, keys); kept != 0)
-        return kept;
+Welded Weld(Points& points, std::vector<Triangle_Id>& ids) {
+    auto numbers = memory::CreateLargeList<std::uint32_t>(points.size());
+    CornerHash hash(points.size());
+    if (hash.Add(points.data(), points.size(), numbers.data()) < points.size())
+        return WeldByOctree(points, ids);
+    Renumber(ids, [&](unsigned corner) { return numbers[corner]; });
+    Points().swap(points);
+    return {std::move(hash.GetKept()), std::exchange(ids, {})};
+}
+
+Welded WeldByOctree(Points& points, std::vector<Triangle_Id>& ids) {
+    auto keys = memory::CreateLargeList<unsigned>(points.size());
     std::iota(keys.begin(), keys.end(), 0U);
-    const Octree2 tree(points, keys);
-    Renumber(ids, [&](unsigned corner) { return FindStandIn(tree, points, keys, corner); });
-    return static_cast<unsigned>(tree.GetPointCount());
+    {
+        const Octree2 tree(points, keys);
+        Renumber(ids, [&](unsigned corner) { return FindStandIn(tree, points, keys, corner); });
+    }
+    Compact(points, keys);
+    Renumber(ids, [&](unsigned corner) { return keys[corner]; });
+    return {std::exchange(points, {}), std::exchange(ids, {})};
 }
 
 } // namespace kelm::tin::load

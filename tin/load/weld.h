@@ -7,11 +7,20 @@
 
 namespace kelm::tin::load {
 
-/// Welds the corners of a load: corners that agree within the tolerance of the octree become one.
-/// @param points not changed, and not empty @param ids lead to corners; on return to kept ones
-/// @param keys one a corner; on return 1 for a kept corner and 0 for a dropped one
-/// @return the number of kept corners @throw std::bad_alloc; ids and keys are then of no use
-unsigned Weld(std::vector<containers::KeyPoint<double>>& points, std::vector<Triangle_Id>& ids,
-              std::vector<unsigned>& keys);
+/// What is left of the corners of a load when those that agree within the tolerance of the octree
+/// have become one.
+struct Welded {
+    std::vector<containers::KeyPoint<double>> corners; ///< the kept ones, in the order of the load
+    std::vector<Triangle_Id> triangles;                ///< lead to kept corners
+};
+
+/// Welds a list of corners, with the octree where the hash cannot tell.
+/// @param points not empty @param ids lead to points @return both lists are empty afterwards
+/// @throw std::bad_alloc
+Welded Weld(std::vector<containers::KeyPoint<double>>& points, std::vector<Triangle_Id>& ids);
+
+/// Welds by the octree alone. Else as Weld.
+Welded WeldByOctree(std::vector<containers::KeyPoint<double>>& points,
+                    std::vector<Triangle_Id>& ids);
 
 } // namespace kelm::tin::load

@@ -129,7 +129,8 @@ void Survey::FinishWarnings() {
 }
 
 void Survey::AddShape() {
-    TakeWarnings();
+    if (moWalk.GetReader().HasWarnings())
+        TakeWarnings();
     TestCount();
     if (moWalk.GetFacetNumber() == 0)
         AddFeature();
@@ -137,7 +138,7 @@ void Survey::AddShape() {
     const FacetFault fault = ReadFacet(facet, moVertices);
     moKept.Add(moWalk.GetFeature(), moWalk.GetFacetNumber(), fault, moVertices);
     if (fault == FacetFault::None)
-        AddRing(!facet.mpoRing->Is3D());
+        AddRing(facet.mbFlat);
     const FacetFault reason = fault == FacetFault::None ? facet.meFault : fault;
     moRefusals.Add(moWalk.GetFeature(), reason,
                    reason == FacetFault::None ? ComputeArea() : facet.mdfRefusedArea);

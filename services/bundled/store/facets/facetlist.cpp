@@ -2,9 +2,11 @@
 
 #include "services/bundled/store/facets/cutting/takenring.h"
 #include "services/bundled/store/facets/ring.h"
+#include "services/bundled/store/features/vertices.h"
 #include "services/bundled/store/gdal/gdalcall.h"
 
 #include <algorithm>
+#include <array>
 #include <utility>
 
 namespace kelm::store {
@@ -13,9 +15,19 @@ namespace {
 
 /// A triangle that is stored as the library takes it.
 bool IsTriangle(const OGRCurvePolygon& polygon, const OGRSimpleCurve& ring) {
-    return polygon.getNumInteriorRings() == 0 && ring.getNumPoints() == 4 &&
-           ring.getX(0) == ring.getX(3) && ring.getY(0) == ring.getY(3) &&
-           ring.getZ(0) == ring.getZ(3);
+    if (polygon.getNumInteriorRings() != 0 || ring.getNumPoints() != 4)
+        return false;
+    std::array<ZARVertex, 4> vertices;
+    CopyVertices(ring, vertices.data());
+    return IsClosedInSpace(vertices.front(), vertices.back());
+}
+
+/// A facet that is delivered as it is stored.
+Facet CreateFacet(const OGRSimpleCurve& ring) {
+    Facet facet;
+    facet.mpoRing = &ring;
+    facet.mbFlat = !ring.Is3D();
+    return facet;
 }
 
 /// @return the rings that have points
@@ -90,7 +102,7 @@ void FacetList::AddPolygon(const OGRCurvePolygon& polygon) {
         return AddFault(FacetFault::Empty);
     if (!IsTriangle(polygon, *ring->toSimpleCurve()) && !IsWhole(polygon))
         return AddCut(polygon);
-    moFacets.push_back({ring->toSimpleCurve()});
+    moFacets.push_back(CreateFacet(*ring->toSimpleCurve()));
 }
 
 bool FacetList::IsWhole(const OGRCurvePolygon& polygon) {
@@ -108,14 +120,19 @@ void FacetList::AddCut(const OGRCurvePolygon& polygon) {
     const OGRSimpleCurve* ring = polygon.getExteriorRingCurve()->toSimpleCurve();
     const FacetCutter::Polygon rings = CopyRings(polygon);
     if (!std::all_of(rings.begin(), rings.end(), AreFinite))
-        return moFacets.push_back({ring, nullptr, FacetFault::NotFinite, false});
+        return AddFault(FacetFault::NotFinite);
     const FacetFault fault = moCutter.Cut(rings, [&](std::vector<ZARVertex> made) {
         moMade.push_back(std::move(made));
-        moFacets.push_back({ring, &moMade.back()});
+        moFacets.push_back(CreateFacet(*ring));
+        moFacets.back().SetVertices(moMade.back().data(), moMade.back().size());
     });
     if (fault == FacetFault::None)
         return;
-    moFacets.push_back({ring, nullptr, fault, rings.size() == 1, moCutter.GetArea()});
+    Facet facet = CreateFacet(*ring);
+    facet.meFault = fault;
+    facet.mbDelivered = rings.size() == 1;
+    facet.mdfRefusedArea = moCutter.GetArea();
+    moFacets.push_back(facet);
     // The reason was told. Later walks need not look for it again.
     moWhole[mnPolygon - 1] = rings.size() == 1;
 }
@@ -139,15 +156,18 @@ void FacetList::AddParts(const Parts& parts) {
 }
 
 void FacetList::AddFault(FacetFault fault) {
-    moFacets.push_back({nullptr, nullptr, fault, false});
+    Facet facet;
+    facet.meFault = fault;
+    facet.mbDelivered = false;
+    moFacets.push_back(facet);
 }
 
 FacetFault ReadFacet(const Facet& facet, std::vector<ZARVertex>& vertices) {
     if (!facet.mbDelivered)
         return facet.meFault;
-    if (!facet.mpoMade)
+    if (facet.mpVertices == nullptr)
         return ReadRing(*facet.mpoRing, vertices);
-    vertices = *facet.mpoMade;
+    vertices.assign(facet.mpVertices, facet.mpVertices + facet.mnVertices);
     return FacetFault::None;
 }
 

@@ -15,14 +15,21 @@ namespace kelm::store {
 
 /// One facet of a geometry, or what stands in its place.
 struct Facet {
-    const OGRSimpleCurve* mpoRing = nullptr; ///< the outer ring; null if there is none
+    const OGRSimpleCurve* mpoRing = nullptr; ///< the outer ring that is stored, if there is one
     /// What is delivered in place of the ring; null if the ring is delivered as it is stored.
-    const std::vector<ZARVertex>* mpoMade = nullptr;
+    const ZARVertex* mpVertices = nullptr;
+    std::size_t mnVertices = 0;
     /// Why it cannot be used, told in the first walk over the layer. A ring without holes is
     /// delivered all the same, and the library refuses it.
     FacetFault meFault = FacetFault::None;
     bool mbDelivered = true;
     double mdfRefusedArea = 0.0; ///< in plan, of a polygon that cannot be used
+    bool mbFlat = false;         ///< stored without heights
+
+    void SetVertices(const ZARVertex* vertices, std::size_t count) {
+        mpVertices = vertices;
+        mnVertices = count;
+    }
 };
 
 /// The facets of one geometry, in reading order.
@@ -42,6 +49,12 @@ class FacetList {
     /// Goes to the position behind so many polygons that are no triangles: 0 for the layer's first
     /// geometry.
     void Restart(std::size_t polygons);
+    /// Empties the list for a geometry that is a triangle and is not listed here.
+    void SkipTriangle() {
+        if (!moFacets.empty())
+            Clear();
+        mnInFront = mnPolygon;
+    }
     /// @return the polygons of the layer in front of the geometry that are no triangles
     std::size_t GetPolygonsInFront() const { return mnInFront; }
 

@@ -5,6 +5,7 @@ namespace kelm::store {
 void LayerWalk::Restart() {
     moReader.Restart();
     moFacets.Restart(0);
+    mbTriangle = false;
     mnFacet = 0;
     mnShapes = 0;
 }
@@ -12,12 +13,13 @@ void LayerWalk::Restart() {
 void LayerWalk::Restart(const FeatureRun& run) {
     moReader.Restart(run);
     moFacets.Restart(run.mnPolygons);
+    mbTriangle = false;
     mnFacet = 0;
     mnShapes = run.mnShapes;
 }
 
 bool LayerWalk::Advance() {
-    if (mnFacet + 1 < moFacets.GetCount())
+    if (mnFacet + 1 < GetFacetCount())
         ++mnFacet;
     else if (!ReadFeature())
         return false;
@@ -27,13 +29,19 @@ bool LayerWalk::Advance() {
 
 /// @return false behind the last feature
 bool LayerWalk::ReadFeature() {
-    moFacets.Clear();
+    moFacets.SkipTriangle();
     mnFacet = 0;
-    const OGRFeature* feature = moReader.Next();
-    if (!feature)
+    const StoredFeature* stored = moReader.Next();
+    mbTriangle = stored && stored->mbTriangle;
+    if (!stored)
         return false;
-    mnFeature = feature->GetFID();
-    moFacets.Assign(feature->GetGeometryRef());
+    mnFeature = stored->mnId;
+    if (mbTriangle) {
+        moTriangle.SetVertices(stored->maTriangle.data(), stored->maTriangle.size());
+        moTriangle.mbFlat = stored->mbFlat;
+    } else {
+        moFacets.Assign(stored->mpoFeature->GetGeometryRef());
+    }
     return true;
 }
 

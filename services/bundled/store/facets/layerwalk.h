@@ -1,7 +1,7 @@
 #pragma once
 
 #include "services/bundled/store/facets/facetlist.h"
-#include "services/bundled/store/files/featurereader.h"
+#include "services/bundled/store/features/featurereader.h"
 
 #include <cstdint>
 
@@ -23,11 +23,11 @@ class LayerWalk {
     bool Advance();
 
     // Questions about the facet that the last Advance has found.
-    const Facet& GetFacet() const { return moFacets.Get(mnFacet); }
+    const Facet& GetFacet() const { return mbTriangle ? moTriangle : moFacets.Get(mnFacet); }
     /// @return the number of the facet in its feature, from 0
     std::size_t GetFacetNumber() const { return mnFacet; }
     /// @return the number of facets of its feature
-    std::size_t GetFacetCount() const { return moFacets.GetCount(); }
+    std::size_t GetFacetCount() const { return mbTriangle ? 1 : moFacets.GetCount(); }
     /// @return the polygons in front of its feature that are no triangles
     std::size_t GetPolygonsInFront() const { return moFacets.GetPolygonsInFront(); }
     /// @return the id of its feature
@@ -45,6 +45,8 @@ class LayerWalk {
 
     FeatureReader moReader;
     FacetList moFacets;
+    Facet moTriangle;        ///< the only facet of a feature that is a triangle
+    bool mbTriangle = false; ///< the feature is one
     std::size_t mnFacet = 0;
     std::int64_t mnFeature = 0;
     std::int64_t mnShapes = 0;

@@ -9,11 +9,6 @@
 
 namespace kelm::store {
 
-/// Copies the vertices of a ring as they are stored. @param vertices replaced
-void CopyVertices(const OGRSimpleCurve& ring, std::vector<ZARVertex>& vertices);
-
-bool AreFinite(const std::vector<ZARVertex>& vertices);
-
 /// Copies the vertices of a ring in stored order and direction, and closes the ring if it is not
 /// closed in plan. A ring without heights gets 0. @param vertices replaced
 /// @return None, FewCorners or NotFinite

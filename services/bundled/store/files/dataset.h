@@ -26,6 +26,7 @@ class Dataset {
 
     const std::string& GetName() const { return moName; }
     const Format& GetFormat() const { return moFormat; }
+    GDALDataset& GetHandle() { return *mpoHandle; }
     /// @return the layers that have a geometry, in GDAL's order; owned by the dataset
     const std::vector<OGRLayer*>& GetLayers() const { return moLayers; }
     /// @return the stamp of the files as they are now

@@ -44,7 +44,13 @@ void Register(const Format& format) {
 
 const std::vector<Format>& GetFormats() {
     static const std::vector<Format> FORMATS = {
-        {"GPKG", "GeoPackage", RegisterOGRGeoPackage, {nullptr}, FT_Pages, "", ReadRunsByQuery},
+        {"GPKG",
+         "GeoPackage",
+         RegisterOGRGeoPackage,
+         {nullptr},
+         FT_Pages | FT_GeometryBytes,
+         "",
+         ReadRunsByQuery},
         {"ESRI Shapefile",
          "ESRI Shapefile",
          RegisterOGRShape,

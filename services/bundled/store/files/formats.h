@@ -19,7 +19,9 @@ enum FormatTrait : unsigned {
     /// For a feature that it cannot read the driver gives an error and null, and then reads on.
     FT_SkipsDamaged = 4,
     /// The driver reads features ahead, so an error need not belong to the feature that it gives.
-    FT_ReadsAhead = 8
+    FT_ReadsAhead = 8,
+    /// A query of SQL gives geometries as a GeoPackage stores them.
+    FT_GeometryBytes = 16
 };
 
 /// A file format that the store opens.

@@ -1,5 +1,7 @@
 #include "services/bundled/store/runs/runreader.h"
 
+#include "services/bundled/store/runs/sqlname.h"
+
 #include <algorithm>
 #include <string>
 #include <vector>
@@ -25,17 +27,10 @@ class PositionReader final : public RunReader {
     std::int64_t mnLeft = 0;
 };
 
-/// @return an identifier of SQL
-std::string Quote(const char* name) {
-    std::string quoted = "\"";
-    for (; *name != '\0'; ++name)
-        quoted.append(*name == '"' ? 2 : 1, *name);
-    return quoted + '"';
-}
-
 class QueryReader final : public RunReader {
   public:
-    explicit QueryReader(OGRLayer& layer) : moLayer(layer), moColumn(Quote(layer.GetFIDColumn())) {}
+    explicit QueryReader(OGRLayer& layer)
+        : moLayer(layer), moColumn(QuoteName(layer.GetFIDColumn())) {}
     void Start(const FeatureRun& run) override {
         const std::string query = moColumn + " >= " + std::to_string(run.mnFirst) + " AND " +
                                   moColumn + " <= " + std::to_string(run.mnLast);

@@ -1,4 +1,4 @@
-#include "services/bundled/store/files/featurereader.h"
+#include "services/bundled/store/features/featurereader.h"
 
 #include "services/exception.h"
 #include "services/reporting.h"
@@ -9,9 +9,9 @@ namespace kelm::store {
 
 namespace {
 
-constexpr const char* SOURCE = "services/bundled/store/files/featurereader";
+constexpr const char* SOURCE = "services/bundled/store/features/featurereader";
 
-constexpr std::size_t MOST_AHEAD = 64;
+constexpr std::size_t MOST_AHEAD = 256;
 constexpr std::size_t MOST_BYTES_AHEAD = 65536;
 
 /// Tells drivers that can skip attributes and styles to do so: nobody asks for them.
@@ -27,16 +27,17 @@ void IgnoreAttributes(OGRLayer& layer) {
     static_cast<void>(layer.SetIgnoredFields(names.data()));
 }
 
-std::size_t CountBytes(const OGRFeature& feature) {
-    const OGRGeometry* geometry = feature.GetGeometryRef();
-    return geometry ? geometry->WkbSize() : 0;
+std::size_t CountBytes(const StoredFeature& stored) {
+    const OGRGeometry* geometry = stored.mpoFeature ? stored.mpoFeature->GetGeometryRef() : nullptr;
+    return geometry ? geometry->WkbSize() : sizeof(stored.maTriangle);
 }
 
 } // namespace
 
 FeatureReader::FeatureReader(Dataset& dataset, OGRLayer& layer)
     : moDataset(dataset), moLayer(layer),
-      moSubject(FormatString("layer %s of file %s", layer.GetName(), dataset.GetName().c_str())) {
+      moSubject(FormatString("layer %s of file %s", layer.GetName(), dataset.GetName().c_str())),
+      moAhead(MOST_AHEAD) {
     Prepare(ReadCrs());
     PassOn(std::exchange(moWarnings, {}), "The " + moSubject);
 }
@@ -62,6 +63,8 @@ void FeatureReader::Prepare(bool sound) {
     IgnoreAttributes(moLayer);
     if (moDataset.GetFormat().mpfnRuns != nullptr)
         mpoRuns = moDataset.GetFormat().mpfnRuns(moLayer);
+    if (moDataset.GetFormat().Has(FT_GeometryBytes))
+        mpoQuery = GeometryQuery::Create(moDataset.GetHandle(), moLayer);
     if (!sound || moDataset.GetFormat().Has(FT_ExactCount))
         mnKnown = moLayer.GetFeatureCount(sound ? FALSE : TRUE);
     TestFailure(call.TakeFailures());
@@ -81,29 +84,23 @@ void FeatureReader::Restart(const FeatureRun& run) {
 void FeatureReader::Restart() {
     moDataset.EndTurn();
     moRun.reset();
-    moFeatures.clear();
+    mnAhead = 0;
     mnNext = 0;
     mnRead = 0;
     mnSkipped = 0;
     moWarnings.clear();
 }
 
-const OGRFeature* FeatureReader::Next() {
-    if (mnNext == moFeatures.size())
-        ReadAhead();
-    return moFeatures[mnNext++].get();
-}
-
-Warnings FeatureReader::TakeWarnings() {
-    return std::exchange(moWarnings, {});
-}
-
 void FeatureReader::ReadAhead() {
-    moFeatures.clear();
+    mnAhead = 0;
     mnNext = 0;
     moFailure.clear();
     moWarnings.clear();
     GdalCall call(moDataset.GetFormat().mpszRings);
+    if (mpoQuery && !mpoQuery->IsWorthwhile()) {
+        mpoQuery.reset();
+        moDataset.EndTurn();
+    }
     if (!moDataset.IsTurnOf(*this))
         TakeTurn(call);
     FetchBatch(call);
@@ -121,51 +118,77 @@ void FeatureReader::TestFailure(const std::string& failures) const {
 
 void FeatureReader::TakeTurn(GdalCall& call) {
     moDataset.TakeTurn(*this);
-    StartReading();
+    StartReading(call);
     const std::int64_t known = std::exchange(mnRead, 0);
     mnSkipped = 0;
-    while (mnRead < known && Fetch(call) != nullptr)
-        moFeatures.clear();
+    while (mnRead < known && Fetch(call))
+        mnAhead = 0;
+    // What is skipped was warned of when it was read.
+    moWarnings.clear();
+    static_cast<void>(call.TakeWarnings());
 }
 
-void FeatureReader::StartReading() {
+void FeatureReader::StartReading(GdalCall& call) {
+    if (mpoQuery)
+        mpoQuery->Stop();
     if (moRun)
         return mpoRuns->Start(*moRun);
     if (mpoRuns)
         mpoRuns->Stop();
+    if (mpoQuery && mpoQuery->Start())
+        return;
+    mpoQuery.reset();
+    static_cast<void>(call.TakeFailures()); // of the query: the layer has its own
     moLayer.ResetReading();
 }
 
-OGRFeatureUniquePtr FeatureReader::ReadFeature() {
-    return moRun ? mpoRuns->Next() : OGRFeatureUniquePtr(moLayer.GetNextFeature());
+void FeatureReader::ReadFeature(StoredFeature& stored) {
+    if (moRun)
+        stored.Assign(mpoRuns->Next());
+    else if (mpoQuery)
+        mpoQuery->Read(stored);
+    else
+        stored.Assign(OGRFeatureUniquePtr(moLayer.GetNextFeature()));
 }
 
 void FeatureReader::FetchBatch(GdalCall& call) {
-    for (std::size_t bytes = 0; moFeatures.size() < MOST_AHEAD && bytes < MOST_BYTES_AHEAD;) {
-        const OGRFeature* feature = Fetch(call);
-        if (feature == nullptr)
+    for (std::size_t bytes = 0; mnAhead < MOST_AHEAD && bytes < MOST_BYTES_AHEAD;) {
+        if (!Fetch(call))
             return;
-        bytes += CountBytes(*feature);
+        bytes += CountBytes(moAhead[mnAhead - 1]);
     }
 }
 
-/// @return the next feature, which is kept, or null behind the last one or if the reading fails
-const OGRFeature* FeatureReader::Fetch(GdalCall& call) {
-    OGRFeatureUniquePtr feature = ReadFeature();
+/// Reads the next feature, or the end of the layer. @return false at the end or if the reading
+/// fails
+bool FeatureReader::Fetch(GdalCall& call) {
+    StoredFeature& stored = moAhead[mnAhead++];
+    ReadFeature(stored);
+    if (stored.IsEnd() || call.HasFailed())
+        return FetchFailed(call, stored);
+    ++mnRead;
+    if (!stored.mbTriangle)
+        stored.TakeTriangle();
+    return true;
+}
+
+/// Goes on where something has failed, or the layer seems to end. @return as Fetch
+bool FeatureReader::FetchFailed(GdalCall& call, StoredFeature& stored) {
     std::string failures = call.TakeFailures();
-    while (!feature && !failures.empty() && SkipsDamaged()) {
+    while (stored.IsEnd() && !failures.empty() && SkipsDamaged()) {
         ++mnSkipped;
         AddWarning(moWarnings, "a feature cannot be read: " + failures, 1);
-        feature = ReadFeature();
+        ReadFeature(stored);
         failures = call.TakeFailures();
     }
-    mnRead += feature != nullptr;
-    if (!feature)
+    if (stored.IsEnd()) {
         TestEnd(failures);
-    else if (!failures.empty())
-        MarkDamage(*feature, failures);
-    moFeatures.push_back(std::move(feature));
-    return moFeatures.back().get();
+        return false;
+    }
+    ++mnRead;
+    if (!failures.empty())
+        MarkDamage(stored, failures);
+    return true;
 }
 
 /// The number of features bounds the reading: a driver could fail for ever.
@@ -173,13 +196,13 @@ bool FeatureReader::SkipsDamaged() const {
     return moDataset.GetFormat().Has(FT_SkipsDamaged) && mnRead + mnSkipped < mnKnown;
 }
 
-void FeatureReader::MarkDamage(OGRFeature& feature, const std::string& failures) {
-    if (moDataset.GetFormat().Has(FT_ReadsAhead))
+void FeatureReader::MarkDamage(StoredFeature& stored, const std::string& failures) {
+    if (stored.mbTriangle || moDataset.GetFormat().Has(FT_ReadsAhead))
         return AddWarning(moWarnings, failures, 1);
-    feature.SetGeometryDirectly(nullptr);
+    stored.mpoFeature->SetGeometryDirectly(nullptr);
     AddWarning(moWarnings,
-               FormatString("feature %lld cannot be read: %s",
-                            static_cast<long long>(feature.GetFID()), failures.c_str()),
+               FormatString("feature %lld cannot be read: %s", static_cast<long long>(stored.mnId),
+                            failures.c_str()),
                1);
 }
 
