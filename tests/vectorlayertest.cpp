@@ -99,14 +99,15 @@ TEST_F(VectorLayerTest, EachKindOfGeometryIsDeliveredOrRefusedWithAWarning) {
     EXPECT_TRUE(oLow.z == 0 && oHigh.z == 9 && oHigh.x == 9);
 }
 
-TEST_F(VectorLayerTest, TypeComesFromTheGeometriesAndOnlyOfAnEmptyLayerFromTheHeader) {
+TEST_F(VectorLayerTest, TypeComesFromTheGeometriesUnlessTheLayerSaysThatItIsOfPointsOrLines) {
     const std::string point = "POINT Z (0 0 1)", line = "LINESTRING Z (0 0 1,1 1 1)";
     const auto GetType = [&](const LayerText& oText) {
         return ZARGetLayerType(Read(Write(oText)).mpo, 0);
     };
     EXPECT_EQ(GetType({{}, wkbPoint25D}), 1);
     EXPECT_EQ(GetType({{}, wkbMultiLineString25D}), 3);
-    EXPECT_EQ(GetType({{""}, wkbPoint25D}), 1) << "no geometry is no facet";
+    EXPECT_EQ(GetType({{MakeTriangle(0, 0, 0)}, wkbPoint25D}), 1);
+    EXPECT_EQ(GetType({{"", point}}), 1) << "no geometry is no facet";
     EXPECT_EQ(GetType({{point}}), 1);
     EXPECT_EQ(GetType({{point, line}}), 3);
     EXPECT_EQ(GetType({{point, line, MakeTriangle(0, 0, 0)}}), 2);

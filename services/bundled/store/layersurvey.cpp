@@ -218,9 +218,23 @@ void Survey::ReportIds() const {
                                              static_cast<long long>(moIds.GetFactor())));
 }
 
+/// @param type 1 or 3
+LayerSurvey CreateUnread(const LayerWalk& walk, int type) {
+    tellus::Warning::Warn(FormatString("The %s is declared as a layer of %s, so it is not read",
+                                       walk.GetReader().GetSubject().c_str(),
+                                       type == 1 ? "points" : "lines"),
+                          SOURCE, __LINE__);
+    LayerSurvey result;
+    result.mnType = type;
+    return result;
+}
+
 } // namespace
 
 LayerSurvey SurveyLayer(LayerWalk& walk, const ProgressCall& progress) {
+    const int declared = GetDeclaredType(walk.GetReader().GetLayer());
+    if (declared != 2)
+        return CreateUnread(walk, declared);
     return Survey(walk, progress).Run();
 }
 

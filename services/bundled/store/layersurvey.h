@@ -19,10 +19,14 @@ struct LayerSurvey {
     /// Corners of the extents of the deliverable shapes, heights as stored; zero if there is none.
     ZARVertex moLow{};
     ZARVertex moHigh{};
+
+    /// @return false for a layer that the survey has not read, and none is to read
+    bool IsRead() const { return mnType == 2 || mnShapes > 0; }
 };
 
 /// Walks a layer once from its first facet to its last. Warns of the facets that cannot
-/// be used, once a reason, of missing heights and of what GDAL warned of.
+/// be used, once a reason, of missing heights and of what GDAL warned of. A layer that says that it
+/// is of points or lines is not read: a warning tells it, and it counts as one without shapes.
 /// @param progress is told some hundred times
 /// @throw kelm::DataException if the layer cannot be read or holds more shapes than an int counts;
 /// what the progress throws

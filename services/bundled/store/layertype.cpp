@@ -8,6 +8,8 @@ constexpr int POINTS = 1;
 constexpr int FACETS = 2;
 constexpr int LINES = 3;
 
+} // namespace
+
 int GetDeclaredType(OGRLayer& layer) {
     switch (wkbFlatten(layer.GetGeomType())) {
     case wkbPoint:
@@ -23,8 +25,6 @@ int GetDeclaredType(OGRLayer& layer) {
         return FACETS;
     }
 }
-
-} // namespace
 
 void LayerType::Add(FacetFault fault) {
     if (fault == FacetFault::Line)

@@ -22,6 +22,9 @@ class LayerType {
     bool mbPoints = false;
 };
 
+/// @return what a layer says of itself: 1 for points, 3 for lines, 2 for all else
+int GetDeclaredType(OGRLayer& layer);
+
 /// Reads a layer up to its first facet. One that says that it is of points or lines is not read.
 /// @return true if there is a facet. @throw kelm::DataException if the layer cannot be read so far
 bool HoldsFacets(Dataset& dataset, OGRLayer& layer);

@@ -86,6 +86,8 @@ bool StoreLayer::IsUntouched() const {
 }
 
 bool StoreLayer::Advance() {
+    if (!moSurvey.IsRead())
+        return false;
     if (mbKept)
         return moSurvey.moKept.Advance();
     if (!moRuns)
