@@ -166,7 +166,10 @@ TEST_F(KeptFacetsTest, AFileThatWasTouchedIsReadAgainEvenIfItLooksAsItWas) {
 TEST_F(KeptFacetsTest, FacetsComeBackToTheBitOrNotAtAll) {
     const double dfNaN = std::nan("7");
     const std::pair<FacetFault, Vertices> aFacets[] = {
+        {FacetFault::None, {{0, 0, 0}, {-0.0, 0, 0}, {0, 0, 7}, {0, 0, 0}}},
         {FacetFault::None, {{1, 2, 3}, {4, 5, 6}, {7, 8, 9}, {1, 2, 3}}},
+        {FacetFault::None, {{4, 5, 6}, {1, 2, 8}, {7, 8, 9}, {4, 5, 6}}},
+        {FacetFault::None, {{1, 2, 8}, {7, 8, 9}, {4, 5, 6}, {1, 2, 8}}},
         {FacetFault::None, {{0.0, 2, 3}, {4, 5, 6}, {7, 8, dfNaN}, {-0.0, 2, 3}}},
         {FacetFault::Uncut, {}},
         {FacetFault::NoGeometry, {{1, 1, 1}}},
@@ -195,7 +198,7 @@ TEST_F(KeptFacetsTest, FacetsComeBackToTheBitOrNotAtAll) {
                 ASSERT_EQ(oFound.size(), oVertices.size());
                 EXPECT_EQ(std::memcmp(oFound.data(), oVertices.data(), oFound.size() * 24), 0);
             }
-        EXPECT_EQ(oKept.GetShapes(), 6 * nRounds);
+        EXPECT_EQ(oKept.GetShapes(), 9 * nRounds);
         EXPECT_FALSE(oKept.Advance());
         EXPECT_FALSE(oKept.AreWhole());
     }

@@ -1,7 +1,6 @@
 #include "services/bundled/store/facets/keptfacets.h"
 
 #include <algorithm>
-#include <cmath>
 #include <cstring>
 #include <limits>
 #include <new>
@@ -12,49 +11,88 @@ namespace {
 
 constexpr std::size_t BLOCK_BYTES = 2 * memory::LARGE_PAGE;
 
-/// False for a NaN, which is kept as it is.
-bool HasSameBits(double a, double b) {
-    return a == b && std::signbit(a) == std::signbit(b);
+bool HasSameBits(const ZARVertex& a, const ZARVertex& b) {
+    return std::memcmp(&a, &b, sizeof a) == 0;
 }
 
 bool IsTriangle(const std::vector<ZARVertex>& vertices) {
-    if (vertices.size() != 4)
-        return false;
-    const ZARVertex& first = vertices.front();
-    const ZARVertex& last = vertices.back();
-    return HasSameBits(first.x, last.x) && HasSameBits(first.y, last.y) &&
-           HasSameBits(first.z, last.z);
+    return vertices.size() == 4 && HasSameBits(vertices.front(), vertices.back());
 }
 
 } // namespace
 
-std::size_t KeptFacets::CountBytes(const Head& head) {
-    return sizeof(Head) +
-           sizeof(ZARVertex) * static_cast<std::size_t>(std::max(head.mnVertices, 0));
+/// @return the number of those that follow the head
+std::size_t KeptFacets::CountVertices(const Head& head) {
+    if (head.mnKind >= RING)
+        return static_cast<std::size_t>(head.mnKind - RING);
+    std::size_t count = 0;
+    if (head.mnKind >= TRIANGLE)
+        for (unsigned places = static_cast<unsigned>(head.mnKind), k = 0; k < 3; ++k)
+            count += (places >> (2 * k) & ELSEWHERE) == ELSEWHERE;
+    return count;
 }
 
 void KeptFacets::Add(std::int64_t feature, std::size_t number, FacetFault fault,
                      const std::vector<ZARVertex>& vertices) {
-    constexpr std::size_t MOST = std::numeric_limits<std::int32_t>::max();
+    constexpr std::size_t MOST = std::numeric_limits<std::int32_t>::max() - RING;
     if (mbDropped)
         return;
     if (number > MOST || vertices.size() > MOST)
         return Drop();
-    Head head{feature, static_cast<std::int32_t>(number), -static_cast<std::int32_t>(fault)};
+    Head head{feature, static_cast<std::int32_t>(number), static_cast<std::int32_t>(fault)};
+    if (fault == FacetFault::None && IsTriangle(vertices))
+        return AddTriangle(head, vertices);
     if (fault == FacetFault::None)
-        head.mnVertices =
-            IsTriangle(vertices) ? TRIANGLE : static_cast<std::int32_t>(vertices.size());
+        head.mnKind = RING + static_cast<std::int32_t>(vertices.size());
     Append(head, vertices.data());
 }
 
+void KeptFacets::AddTriangle(Head head, const std::vector<ZARVertex>& vertices) {
+    Corners elsewhere;
+    std::size_t count = 0;
+    unsigned places = 0;
+    for (unsigned k = 0; k < 3; ++k) {
+        const unsigned place = FindPlace(vertices[k]);
+        places |= place << (2 * k);
+        if (place == ELSEWHERE)
+            elsewhere.at(count++) = vertices[k];
+    }
+    head.mnKind = TRIANGLE + static_cast<std::int32_t>(places);
+    std::copy_n(vertices.begin(), 3, maTriangle.begin());
+    Append(head, elsewhere.data());
+}
+
+/// @return the place of a corner in the triangle in front
+unsigned KeptFacets::FindPlace(const ZARVertex& corner) const {
+    unsigned place = 0;
+    while (place < ELSEWHERE && !HasSameBits(maTriangle[place], corner))
+        ++place;
+    return place;
+}
+
+/// Makes the present triangle of the one in front.
+void KeptFacets::TakeTriangle() {
+    const Corners front = maTriangle;
+    const unsigned char* next = mpVertices;
+    for (unsigned k = 0; k < 3; ++k) {
+        const unsigned place = static_cast<unsigned>(moHead.mnKind) >> (2 * k) & ELSEWHERE;
+        if (place < ELSEWHERE) {
+            maTriangle[k] = front[place];
+            continue;
+        }
+        std::memcpy(&maTriangle[k], next, sizeof maTriangle[k]);
+        next += sizeof maTriangle[k];
+    }
+}
+
 void KeptFacets::Append(const Head& head, const ZARVertex* vertices) {
-    const std::size_t bytes = CountBytes(head);
-    unsigned char* const room = GetRoom(bytes);
+    const std::size_t bytes = CountVertices(head) * sizeof(ZARVertex);
+    unsigned char* const room = GetRoom(sizeof head + bytes);
     if (room == nullptr)
         return Drop();
     std::memcpy(room, &head, sizeof head);
-    if (bytes > sizeof head)
-        std::memcpy(room + sizeof head, vertices, bytes - sizeof head);
+    if (bytes > 0)
+        std::memcpy(room + sizeof head, vertices, bytes);
 }
 
 /// @return null if there is none. A layer that is not kept is read again, so that is no failure
@@ -81,6 +119,7 @@ void KeptFacets::Drop() {
 void KeptFacets::Restart() {
     mnNext = 0;
     mnShapes = 0;
+    maTriangle = {};
 }
 
 bool KeptFacets::Advance() {
@@ -96,19 +135,23 @@ bool KeptFacets::Advance() {
     const unsigned char* const facet = &moBlocks.front().mpBytes[mnNext];
     std::memcpy(&moHead, facet, sizeof moHead);
     mpVertices = facet + sizeof moHead;
-    mnNext += CountBytes(moHead);
+    mnNext += sizeof moHead + CountVertices(moHead) * sizeof(ZARVertex);
+    if (moHead.mnKind >= TRIANGLE && moHead.mnKind < RING)
+        TakeTriangle();
     ++mnShapes;
     return true;
 }
 
 FacetFault KeptFacets::Read(std::vector<ZARVertex>& vertices) const {
-    if (moHead.mnVertices < 0)
-        return static_cast<FacetFault>(-moHead.mnVertices);
-    const auto count = static_cast<std::size_t>(moHead.mnVertices);
-    vertices.resize(std::max<std::size_t>(count, TRIANGLE + 1));
-    std::memcpy(vertices.data(), mpVertices, count * sizeof(ZARVertex));
-    if (moHead.mnVertices == TRIANGLE)
-        vertices.back() = vertices.front();
+    if (moHead.mnKind < TRIANGLE)
+        return static_cast<FacetFault>(moHead.mnKind);
+    if (moHead.mnKind < RING) {
+        vertices.assign(maTriangle.begin(), maTriangle.end());
+        vertices.push_back(maTriangle.front());
+        return FacetFault::None;
+    }
+    vertices.resize(CountVertices(moHead));
+    std::memcpy(vertices.data(), mpVertices, vertices.size() * sizeof(ZARVertex));
     return FacetFault::None;
 }
 

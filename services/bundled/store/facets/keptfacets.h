@@ -4,6 +4,7 @@
 #include "services/memory/largepages.h"
 #include "services/vectorlayer.h"
 
+#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <deque>
@@ -17,7 +18,7 @@ namespace kelm::store {
 /// would take more than MOST_BYTES is not kept at all.
 class KeptFacets {
   public:
-    /// Most bytes that a layer keeps: three million triangles.
+    /// Most bytes that a layer keeps: three million triangles, or twice as many neighbours.
     static constexpr std::size_t MOST_BYTES = std::size_t{256} << 20;
 
     explicit KeptFacets(std::size_t mostBytes = MOST_BYTES) : mnMostBytes(mostBytes) {}
@@ -50,10 +51,17 @@ class KeptFacets {
     struct Head {
         std::int64_t mnFeature = 0;
         std::int32_t mnNumber = 0;
-        std::int32_t mnVertices = 0; ///< those that follow; of a fault, minus its number
+        /// The number of a fault; TRIANGLE and the places of its corners, 2 bits each; or RING and
+        /// the number of vertices.
+        std::int32_t mnKind = 0;
     };
-    /// A ring of four whose ends are equal to the bit is kept without its end.
-    static constexpr std::int32_t TRIANGLE = 3;
+    /// A ring of four whose ends are equal to the bit. A corner that the triangle in front has,
+    /// too, is kept as its place there, another one as ELSEWHERE: neighbours follow each other in
+    /// most layers, and pages that are not filled need not be fetched.
+    static constexpr std::int32_t TRIANGLE = 64;
+    static constexpr std::int32_t RING = 128;
+    static constexpr unsigned ELSEWHERE = 3;
+    using Corners = std::array<ZARVertex, 3>;
 
     struct Block {
         memory::LargeBlock mpBytes;
@@ -61,9 +69,12 @@ class KeptFacets {
         std::size_t mnUsed = 0;
     };
 
+    void AddTriangle(Head head, const std::vector<ZARVertex>& vertices);
+    unsigned FindPlace(const ZARVertex& corner) const;
+    void TakeTriangle();
     void Append(const Head& head, const ZARVertex* vertices);
     unsigned char* GetRoom(std::size_t bytes);
-    static std::size_t CountBytes(const Head& head);
+    static std::size_t CountVertices(const Head& head);
 
     std::size_t mnMostBytes;
     std::deque<Block> moBlocks;
@@ -72,7 +83,8 @@ class KeptFacets {
     bool mbDropped = false;
     std::size_t mnNext = 0; ///< position of the next facet in the first block that is there
     Head moHead;
-    const unsigned char* mpVertices = nullptr; ///< of the present facet
+    const unsigned char* mpVertices = nullptr; ///< that follow the head
+    Corners maTriangle{};                      ///< the present triangle, or the last one in front
     std::int64_t mnShapes = 0;
 };
 
