@@ -1,6 +1,7 @@
 #include "services/bundled/store/facets/keptfacets.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstring>
 #include <limits>
 #include <new>
@@ -11,8 +12,13 @@ namespace {
 
 constexpr std::size_t BLOCK_BYTES = 2 * memory::LARGE_PAGE;
 
+/// False for a NaN, which is kept as it is.
+bool HasSameBits(double a, double b) {
+    return a == b && std::signbit(a) == std::signbit(b);
+}
+
 bool HasSameBits(const ZARVertex& a, const ZARVertex& b) {
-    return std::memcmp(&a, &b, sizeof a) == 0;
+    return HasSameBits(a.x, b.x) && HasSameBits(a.y, b.y) && HasSameBits(a.z, b.z);
 }
 
 bool IsTriangle(const std::vector<ZARVertex>& vertices) {
