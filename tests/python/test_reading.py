@@ -49,7 +49,7 @@ def test_layers(terrain, write):
     assert layer.shapes == 17619 and layer.refusal == "" and layer.crs == terrain.crs
     assert np.allclose(layer.bounds, terrain.bounds, atol=1e-3) and layer.heights == (286, 996)
     assert terrain.nbytes > 0.5 * layer.surface_nbytes and layer.load_nbytes > layer.surface_nbytes
-    with pytest.warns(kelm_tin.DataWarning, match="points instead of a polygon"):
+    with pytest.warns(kelm_tin.DataWarning, match="declared as a layer of points"):
         (points,) = kelm_tin.layers(write("1 2 3", kind="Point", shape="%s"))
     assert points.number == 1 and "must be defined by polygons" in points.refusal
 
