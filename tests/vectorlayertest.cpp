@@ -1,3 +1,4 @@
+#include "services/bundled/store/features/geometrybytes.h"
 #include "tests/support/filetest.h"
 
 #include <cpl_http.h>
@@ -265,6 +266,19 @@ std::vector<Bytes> MakeBlobs() {
         }
     }
     return blobs;
+}
+
+TEST_F(VectorLayerTest, TheBytesOfATriangleAreReadWithEachEnvelope) {
+    for (const std::uint32_t nType : {3U, 1003U, 0x80000003U})
+        for (const unsigned nFlags : {1U, 3U, 5U, 7U, 9U}) {
+            const Bytes blob = MakeBlob(nFlags, nType);
+            std::array<ZARVertex, 4> oVertices;
+            bool bFlat;
+            ASSERT_TRUE(kelm::store::ReadTriangleBytes(blob.data(), blob.size(), oVertices, bFlat));
+            EXPECT_EQ(bFlat, nType == 3);
+            EXPECT_EQ(oVertices[2].x, 8.0);
+            EXPECT_EQ(oVertices[2].z, bFlat ? 0.0 : 11.0);
+        }
 }
 
 TEST_F(VectorLayerTest, TheBytesOfAGeoPackageGiveWhatItsGeometriesGive) {

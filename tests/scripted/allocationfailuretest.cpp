@@ -8,6 +8,7 @@
 
 #include <omp.h>
 
+#include <cmath>
 #include <cstdio>
 
 namespace {
@@ -54,6 +55,19 @@ TEST_F(AllocationFailureTest, OpeningAndLoadingWithPolygonsAndADatumChange) {
             reader->SetOutputVerticalDatum(DatumType(2001));
             return Summarise(Load(*reader));
         });
+    }
+}
+
+// A tree asks for a node a corner.
+TEST_F(AllocationFailureTest, OnlyNearTwinsAndWildCornersTakeTheOctree) {
+    for (const double near : {0.0, 5e-10, HUGE_VAL}) {
+        script.shapes = CreateStrip(3000, 5);
+        script.shapes[0][1].x += near;
+        const Reader reader = Open();
+        const kelm::tin::test::AllocationCounter counter;
+        const Surface surface = Load(*reader);
+        EXPECT_EQ(surface->GetVertexCount(), near == HUGE_VAL ? 3001U : 3000U);
+        EXPECT_EQ(kelm::tin::test::AllocationCounter::mnRequests > 3000, near != 0.0) << near;
     }
 }
 
