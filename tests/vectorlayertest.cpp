@@ -278,6 +278,11 @@ TEST_F(VectorLayerTest, TheBytesOfATriangleAreReadWithEachEnvelope) {
             EXPECT_EQ(bFlat, nType == 3);
             EXPECT_EQ(oVertices[2].x, 8.0);
             EXPECT_EQ(oVertices[2].z, bFlat ? 0.0 : 11.0);
+            for (std::size_t n = 0; n < blob.size(); ++n) {
+                const std::unique_ptr<unsigned char[]> poCut(new unsigned char[n]);
+                std::copy_n(blob.begin(), n, poCut.get());
+                EXPECT_FALSE(kelm::store::ReadTriangleBytes(poCut.get(), n, oVertices, bFlat));
+            }
         }
 }
 
