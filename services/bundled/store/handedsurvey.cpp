@@ -45,10 +45,10 @@ bool Read(ByteReader& bytes, HandedSurvey& survey) {
     survey.moSurvey.mnType = bytes.Get<int>();
     survey.moSurvey.moLow = ReadVertex(bytes);
     survey.moSurvey.moHigh = ReadVertex(bytes);
-    survey.moSurvey.moIds.Read(bytes);
+    const bool hasIds = survey.moSurvey.moIds.Read(bytes);
     survey.moWhole = bytes.GetBits();
-    const bool sound = survey.moSurvey.moBlocks.Read(bytes, survey.moWhole.size());
-    return sound && !bytes.HasFailed() && bytes.IsAtEnd();
+    const bool hasBlocks = survey.moSurvey.moBlocks.Read(bytes, survey.moWhole.size());
+    return hasIds && hasBlocks && !bytes.HasFailed() && bytes.IsAtEnd();
 }
 
 } // namespace

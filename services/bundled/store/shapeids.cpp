@@ -42,10 +42,11 @@ void ShapeIds::Write(ByteWriter& bytes) const {
     bytes.Put(mnFactor);
 }
 
-void ShapeIds::Read(ByteReader& bytes) {
+bool ShapeIds::Read(ByteReader& bytes) {
     mnLastFeature = bytes.Get<std::int64_t>();
     mnShapes = bytes.Get<std::int64_t>();
     mnFactor = bytes.Get<std::int64_t>();
+    return mnFactor == 0 || (mnFactor > 0 && mnLastFeature < MOST_IDS / mnFactor);
 }
 
 } // namespace kelm::store

@@ -35,7 +35,8 @@ class ShapeIds {
     int GetId(std::int64_t feature, std::size_t facet, std::int64_t shape) const;
 
     void Write(ByteWriter& bytes) const;
-    void Read(ByteReader& bytes);
+    /// @return false if no layer has such ids
+    bool Read(ByteReader& bytes);
 
   private:
     bool mbRising = true;
