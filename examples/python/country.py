@@ -55,12 +55,13 @@ def write_layer(path, nodes, turned):
     crs.ImportFromEPSG(32633)
     layer = file.CreateLayer("terrain", crs, ogr.wkbPolygon25D, options)
     count = 0
+    feature = ogr.Feature(layer.GetLayerDefn())  # one for all: to make one takes a quarter of the time
     file.StartTransaction()
     for first in range(0, len(nodes) - 1, ROWS):
         polygons = make_polygons(nodes, turned, first)
         data = polygons.tobytes()
         for start in range(0, len(data), WKB.itemsize):
-            feature = ogr.Feature(layer.GetLayerDefn())
+            feature.SetFID(ogr.NullFID)
             feature.SetGeometryDirectly(ogr.CreateGeometryFromWkb(data[start : start + WKB.itemsize]))
             layer.CreateFeature(feature)
         count += len(polygons)
