@@ -25,6 +25,7 @@ import statistics
 import subprocess
 import sys
 import time
+import typing
 
 import dask
 import distributed
@@ -135,32 +136,42 @@ def start_workers(count):
         yield client
 
 
+class Run(typing.NamedTuple):
+    """All tiles on some worker processes."""
+
+    wall: float  # seconds
+    work: float  # seconds of the processor, all workers together
+    digests: list
+    peak: int  # bytes that the fullest worker needed beyond its rest
+
+
 def run_cluster(plan, workers):
-    """Wall time, the digests of all tiles, and what the fullest worker needed beyond its rest."""
     with start_workers(workers) as client:
         client.run(lambda: __import__("kelm_tin.tiles"))
         rest = client.run(restart_peak)
         blocks = tiles.raster(plan, CELL).to_delayed().ravel().tolist()
+        before = sum(client.run(time.process_time).values())
         seconds, found = measure(lambda: dask.compute(*[dask.delayed(digest)(block) for block in blocks]))
+        work = sum(client.run(time.process_time).values()) - before
         peaks = client.run(read_memory, "VmHWM")
-        return seconds, list(found), max(peaks[name] - rest[name] for name in peaks)
+        return Run(seconds, work, list(found), max(peaks[name] - rest[name] for name in peaks))
 
 
 def report_cluster(path, processes):
     plan = find_plan(path)
     print(f"{os.path.basename(path)}: {plan.tiles[0]} x {plan.tiles[1]} tiles of {TILE:.0f} m, cells of {CELL:.0f} m.\n")
-    print("| processes | wall time, s | of the first | bits | peak of a worker, MB | estimate and cells, MB |")
-    print("|---|---|---|---|---|---|")
+    print("| processes | wall time, s | of the first | processor time, s | bits | peak of a worker, MB | estimate, MB |")
+    print("|---|---|---|---|---|---|---|")
     first = None
-    bound = plan.estimate + 2 * 4 * FRAME.side**2
+    bound = plan.estimate + 2 * 4 * FRAME.side**2  # and the cells
     for workers in processes:
-        seconds, found, peak = run_cluster(plan, workers)
-        first = first or (seconds, found)
-        same = "equal" if found == first[1] else "DIFFERENT"
-        print(f"| {workers} | {seconds:.1f} | {seconds / first[0]:.2f} | {same} | {peak / 1e6:.0f} | {bound / 1e6:.0f} |",
-              flush=True)
+        run = run_cluster(plan, workers)
+        first = first or run
+        same = "equal" if run.digests == first.digests else "DIFFERENT"
+        print(f"| {workers} | {run.wall:.1f} | {run.wall / first.wall:.2f} | {run.work:.1f} | {same} | "
+              f"{run.peak / 1e6:.0f} | {bound / 1e6:.0f} |", flush=True)
     print()
-    pathlib.Path(path + ".digests").write_text(json.dumps(first[1]))
+    pathlib.Path(path + ".digests").write_text(json.dumps(first.digests))
 
 
 def report_whole(path):
