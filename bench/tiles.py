@@ -38,6 +38,8 @@ PROGRAM = pathlib.Path(__file__).resolve().parents[1] / "examples" / "python" / 
 BASE = (517000.0, 4667000.0)
 TILE, CELL = 2000.0, 2.0
 FRAME = _work.Frame(CELL, round(TILE / CELL), False)
+FULL = round(TILE**2 / 50)
+"""Triangles of a tile without sea: two in ten by ten metres."""
 FORMATS = ("fgb", "gpkg")
 
 
@@ -96,37 +98,61 @@ def digest(cells):
 
 
 def find_inner_tiles(plan, count):
-    """Tiles in the middle of the country, which the sea and the rim do not touch much."""
-    full = plan.tile**2 / 50  # two triangles in ten by ten metres
+    """Some tiles without sea or rim."""
     everywhere = plan.list_tiles()
-    counts = plan.count([plan.box(tile) for tile in everywhere])
-    inner = [tile for tile, found in zip(everywhere, counts) if found > full]
-    return inner[:: max(1, len(inner) // count)][:count]
+    bounds = plan.count([plan.box(tile) for tile in everywhere])
+    likely = [tile for tile, bound in zip(everywhere, bounds) if bound >= FULL]
+    spread = likely[:: max(1, len(likely) // (2 * count))]
+    return [tile for tile in spread if len(_work._load(plan, tile, plan.box(tile)).triangles) >= FULL][:count]
 
 
-def report_tiles(countries):
-    """The processor time of one tile, from the small and from the large layer, in one process."""
+class Cost(typing.NamedTuple):
+    """Processor times of one layer, in seconds."""
+
+    plan: tiles.Plan
+    survey: float
+    tile: float
+
+    def report(self):
+        print("| | a triangle | 10,000,000,000 triangles |")
+        print("|---|---|---|")
+        size = os.path.getsize(self.plan.path) / self.plan.survey.shapes
+        survey, tile = self.survey / self.plan.survey.shapes, self.tile / FULL
+        print(f"| file | {size:.0f} bytes | {size / 100:.1f} TB |")
+        print(f"| survey | {survey * 1e6:.2f} µs | {survey * 1e10 / 3600:.1f} hours of one core |")
+        print(f"| {1e10 / FULL:,.0f} tiles of {FULL:,} triangles | {tile * 1e6:.1f} µs | "
+              f"{tile * 1e10 / 3600:.1f} hours of one core |")
+        print(f"| memory of a worker, by the estimate | | {self.plan.estimate / 1e6:.0f} MB and the interpreter |\n")
+
+
+def measure_cost(path):
+    """Prints the row of a layer."""
+    survey, plan = measure_processor(lambda: make_plan(path))
+    names = find_inner_tiles(plan, 12)
+    opening, tile, reading = (
+        statistics.median(measure_processor(lambda: call(name))[0] for name in names)
+        for call in (
+            lambda name: plan.count([plan.box(name)]),
+            lambda name: _work.fill_cells(plan, FRAME, name),
+            lambda name: _work._load(plan, name, plan.box(name)),
+        )
+    )
+    travels = len(pickle.dumps(plan)) / 1e3
+    print(f"| {os.path.basename(path)} | {plan.survey.shapes:,} | {survey:.1f} | {travels:,.0f} | "
+          f"{opening * 1e3:.1f} | {tile * 1e3:.0f} | {reading * 1e3:.0f} |", flush=True)
+    return Cost(plan, survey, tile)
+
+
+def report_tiles(small, large):
+    """The processor time of one tile, from small and from large layers, in one process."""
     print("| layer | triangles | survey, s | plan, kB | opening, ms | a tile, ms | of these reading, ms |")
     print("|---|---|---|---|---|---|---|")
-    medians = {}
-    for path in countries:
-        seconds, plan = measure_processor(lambda: make_plan(path))
-        names = find_inner_tiles(plan, 12)
-        opening = statistics.median(measure_processor(lambda: plan.count([plan.bounds]))[0] for _ in range(5))
-        times = [measure_processor(lambda: _work.fill_cells(plan, FRAME, tile))[0] for tile in names]
-        reads = [measure_processor(lambda: _work._load(plan, tile, plan.box(tile)))[0] for tile in names]
-        medians[path] = statistics.median(times)
-        print(
-            f"| {os.path.basename(path)} | {plan.survey.shapes:,} | {seconds:.1f} | "
-            f"{len(pickle.dumps(plan)) / 1e3:,.0f} | {opening * 1e3:.1f} | {medians[path] * 1e3:.0f} | "
-            f"{statistics.median(reads) * 1e3:.0f} |",
-            flush=True,
-        )
-    half = len(countries) // 2
-    for small, large in zip(countries[:half], countries[half:]):
-        print(f"\nA tile of {os.path.basename(large)} takes {medians[large] / medians[small]:.2f} "
-              f"of one of {os.path.basename(small)}.")
+    costs = {path: measure_cost(path) for path in [*small, *large]}
+    for a, b in zip(small, large):
+        print(f"\nA tile of {os.path.basename(b)} takes {costs[b].tile / costs[a].tile:.2f} "
+              f"of one of {os.path.basename(a)}.")
     print()
+    costs[large[0]].report()
 
 
 @contextlib.contextmanager
@@ -159,8 +185,9 @@ def run_cluster(plan, workers):
 
 def report_cluster(path, processes):
     plan = find_plan(path)
-    print(f"{os.path.basename(path)}: {plan.tiles[0]} x {plan.tiles[1]} tiles of {TILE:.0f} m, cells of {CELL:.0f} m.\n")
-    print("| processes | wall time, s | of the first | processor time, s | bits | peak of a worker, MB | estimate, MB |")
+    rows, columns = plan.tiles
+    print(f"{os.path.basename(path)}: {rows} x {columns} tiles of {TILE:.0f} m, cells of {CELL:.0f} m.\n")
+    print("| processes | wall time, s | of one | processor time, s | bits | peak of a worker, MB | estimate, MB |")
     print("|---|---|---|---|---|---|---|")
     first = None
     bound = plan.estimate + 2 * 4 * FRAME.side**2  # and the cells
@@ -238,7 +265,7 @@ def main():
     large = find(options.triangles)
     parts = {
         "data": lambda: find(options.small),
-        "tiles": lambda: report_tiles(find(options.small) + large),
+        "tiles": lambda: report_tiles(find(options.small), large),
         "cluster": lambda: [report_cluster(path, options.processes) for path in large],
         "products": lambda: report_products(find_plan(large[0]), options.folder),
         "whole": lambda: [report_whole(path) for path in large],
