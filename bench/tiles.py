@@ -9,7 +9,7 @@ data      writes the made-up countries to the folder unless they are there: some
 tiles     one tile of the small and of the large country
 cluster   all tiles on worker processes: wall time, bits, peak memory
 products  heights at many positions, and a GeoTIFF
-whole     the bits of the part cluster against the whole country in one process, which takes some 10 GB of memory
+whole     the bits of the part cluster against the whole country in one process, which takes some 3 GB of memory
 relief    a picture of the large country, country.png in the folder
 """
 
