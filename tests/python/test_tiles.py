@@ -225,23 +225,50 @@ def test_geotiff(country, tmp_path, monkeypatch, writer):
     assert os.listdir(tmp_path) == ["cells.tif"]
 
 
-def test_estimate_bounds_what_a_worker_needs(country):
-    """In a process of its own, since what a process has freed is not given back at once."""
-    path, _ = country
-    code = """if True:
+def measure_peak(prepare, run, *arguments):
+    """The bytes that `run` needs and what it prints, in a process of its own, since what a process has freed is
+    not given back at once."""
+    code = f"""if True:
         import re, sys
         from kelm_tin import tiles
         from kelm_tin.tiles import _work
         read = lambda name: 1024 * int(re.search(name + r":\\s+(\\d+)", open("/proc/self/status").read())[1])
-        plan = tiles.Plan(sys.argv[1], tile=100000.0)
+        {prepare}
         before = read("VmRSS")
         open("/proc/self/clear_refs", "w").write("5")  # the peak begins anew
-        _work.answer(plan, False, 0, [_work.np.array([plan.bounds[:2]])])
-        print(plan.estimate, read("VmHWM") - before)
+        {run}
+        print(read("VmHWM") - before)
     """
-    run = subprocess.run([sys.executable, "-c", code, path], stdout=subprocess.PIPE, text=True, check=True)
-    estimate, used = map(int, run.stdout.split())
+    command = [sys.executable, "-c", code, *map(str, arguments)]
+    run = subprocess.run(command, stdout=subprocess.PIPE, text=True, check=True)
+    *printed, used = map(int, run.stdout.split())
+    return used, printed
+
+
+def test_estimate_bounds_what_a_worker_needs(country):
+    path, _ = country
+    used, (estimate,) = measure_peak(
+        "plan = tiles.Plan(sys.argv[1], tile=100000.0); print(plan.estimate)",
+        "_work.answer(plan, False, 0, [_work.np.array([plan.bounds[:2]])])",
+        path,
+    )
     assert 0 < used < estimate < 20 * used
+
+
+@pytest.mark.parametrize("writer", ["rasterio", "osgeo.gdal"])
+def test_a_geotiff_takes_the_same_memory_whatever_its_size(tmp_path, writer):
+    pytest.importorskip(writer)
+    pytest.importorskip("osgeo.gdal")
+    used, (before, after) = measure_peak(
+        "import dask.array as da; from osgeo import gdal; print(gdal.GetCacheMax()); "
+        "sys.argv[1] == 'rasterio' or sys.modules.update(rasterio=None)",
+        "tiles.write_geotiff(da.ones((8000, 6000), 'f4', (500, 500)), sys.argv[2], transform=(1, 0, 0, 0, -1, 0)); "
+        "print(gdal.GetCacheMax())",
+        writer,
+        tmp_path / "cells.tif",
+    )
+    assert used < 400_000_000, "600 MB where GDAL may take a twentieth of a machine of 24 GB"
+    assert before == after
 
 
 @pytest.mark.parametrize(

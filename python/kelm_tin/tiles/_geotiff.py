@@ -15,6 +15,8 @@ from ._raster import Transform
 
 GROUP = 8
 """Chunks that are computed together. On a cluster the next group runs while one is written."""
+CACHE = 1 << 26
+"""Bytes of blocks that GDAL may keep, which else keeps a twentieth of the machine's memory."""
 SMALLEST_OVERVIEW = 256
 MOST_BLOCK = 512
 OPTIONS = {"TILED": "YES", "COMPRESS": "DEFLATE", "BIGTIFF": "IF_SAFER"}
@@ -133,7 +135,27 @@ def _compute_in_order(blocks: list[Any]) -> Iterator[Any]:
         yield from client.gather(futures)
 
 
+@contextmanager
+def _small_cache(get: Callable[[], Any], set_to: Callable[[int], Any]) -> Iterator[None]:
+    """The cache of GDAL is the process's: it becomes as large as before in the end."""
+    before = get()
+    set_to(min(before, CACHE))
+    try:
+        yield
+    finally:
+        set_to(before)
+
+
 def _write_by_rasterio(name: str, sheet: Sheet, blocks: Blocks) -> None:
+    import rasterio
+    from rasterio.env import get_gdal_config, set_gdal_config  # type: ignore[import]
+
+    key = "GDAL_CACHEMAX"
+    with rasterio.Env(), _small_cache(lambda: get_gdal_config(key), lambda size: set_gdal_config(key, size)):
+        _write_within_cache(name, sheet, blocks)
+
+
+def _write_within_cache(name: str, sheet: Sheet, blocks: Blocks) -> None:
     import rasterio
     from rasterio.enums import Resampling  # type: ignore[import]
     from rasterio.windows import Window  # type: ignore[import]
@@ -160,7 +182,7 @@ def _write_by_rasterio(name: str, sheet: Sheet, blocks: Blocks) -> None:
 def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
     from osgeo import gdal, gdal_array
 
-    with _exceptions_of(gdal):
+    with _exceptions_of(gdal), _small_cache(gdal.GetCacheMax, gdal.SetCacheMax):
         kind = gdal_array.NumericTypeCodeToGDALTypeCode(sheet.dtype)
         options = [f"{key}={value}" for key, value in sheet.options().items()]
         file = gdal.GetDriverByName("GTiff").Create(name, sheet.columns, sheet.rows, 1, kind, options)
@@ -172,7 +194,8 @@ def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
         if sheet.dtype.kind == "f":
             band.SetNoDataValue(np.nan)
         for row, column, cells in blocks:
-            band.WriteArray(cells, column, row)
+            # GDAL's module crashes on cells that share one place in memory, as constants do.
+            band.WriteArray(np.ascontiguousarray(cells), column, row)
         file.FlushCache()
         file.BuildOverviews("AVERAGE", sheet.overviews())
         del band, file
