@@ -256,7 +256,7 @@ def test_estimate_bounds_what_a_worker_needs(country):
 
 
 @pytest.mark.parametrize("writer", ["rasterio", "osgeo.gdal"])
-def test_a_geotiff_takes_the_same_memory_whatever_its_size(tmp_path, writer):
+def test_a_geotiff_takes_a_bounded_memory(tmp_path, writer):
     pytest.importorskip(writer)
     pytest.importorskip("osgeo.gdal")
     used, (before, after) = measure_peak(
