@@ -1,22 +1,31 @@
 #!/usr/bin/env python3
 """Measures tiles on Dask, and prints the tables of docs/guide/scale.md.
 
-Usage: tiles.py FOLDER [--triangles 20000000] [--small 1000000] [--whole] [--relief PICTURE.png]
+Usage: tiles.py FOLDER [PART ...] [--triangles 20000000] [--small 1000000] [--formats fgb gpkg] [--processes 1 2 4]
 
-The made-up countries are written to the folder unless they are there: some 8 GB for 20 million triangles.
---whole holds the bits against the whole surface in one process, which takes some 10 GB of memory.
+The parts, of which all are run unless some are named:
+
+data      writes the made-up countries to the folder unless they are there: some 8 GB for 20 million triangles
+tiles     one tile of the small and of the large country
+cluster   all tiles on worker processes: wall time, bits, peak memory
+products  heights at many positions, and a GeoTIFF
+whole     the bits of the part cluster against the whole country in one process, which takes some 3 GB of memory
+relief    a picture of the large country, country.png in the folder
 """
 
 import argparse
+import contextlib
 import hashlib
+import json
 import os
 import pathlib
 import pickle
-import resource
+import re
 import statistics
 import subprocess
 import sys
 import time
+import typing
 
 import dask
 import distributed
@@ -29,14 +38,37 @@ PROGRAM = pathlib.Path(__file__).resolve().parents[1] / "examples" / "python" / 
 BASE = (517000.0, 4667000.0)
 TILE, CELL = 2000.0, 2.0
 FRAME = _work.Frame(CELL, round(TILE / CELL), False)
-ENDINGS = (".fgb", ".gpkg")
+FULL = round(TILE**2 / 50)
+"""Triangles of a tile without sea: two in ten by ten metres."""
+FORMATS = ("fgb", "gpkg")
 
 
-def make_country(folder, triangles):
-    paths = [os.path.join(folder, f"country{triangles}{ending}") for ending in ENDINGS]
-    if not all(map(os.path.exists, paths)):
-        subprocess.run([sys.executable, PROGRAM, str(triangles), *paths], check=True, stdout=sys.stderr)
-    return paths
+def find_country(folder, triangles, ending):
+    """The path of a country, which is written unless it is there. A part of a file never has the name."""
+    path = os.path.join(folder, f"country{triangles}.{ending}")
+    if not os.path.exists(path):
+        part = os.path.join(folder, f"part.{ending}")
+        subprocess.run([sys.executable, PROGRAM, str(triangles), part], check=True, stdout=sys.stderr)
+        os.replace(part, path)
+    return path
+
+
+def make_plan(path):
+    """A plan by a new survey, which is kept beside the file."""
+    plan = tiles.Plan(path, tile=TILE, base=BASE)
+    pathlib.Path(path + ".survey").write_bytes(pickle.dumps(plan.survey))
+    return plan
+
+
+def find_plan(path):
+    """A plan by the survey that is kept, if it is one of the file as it is."""
+    try:
+        survey = pickle.loads(pathlib.Path(path + ".survey").read_bytes())
+        plan = tiles.Plan(path, tile=TILE, base=BASE, survey=survey)
+        plan.count([plan.bounds])
+        return plan
+    except (FileNotFoundError, kelm_tin.DataError):
+        return make_plan(path)
 
 
 def measure(call, clock=time.perf_counter):
@@ -50,13 +82,15 @@ def measure_processor(call):
     return measure(call, time.process_time)
 
 
-def get_resident():
-    with open("/proc/self/statm") as file:
-        return int(file.read().split()[1]) * resource.getpagesize()
+def read_memory(name):
+    """Bytes of this process: VmRSS for those it has, VmHWM for the most that it had."""
+    return 1024 * int(re.search(name + r":\s+(\d+)", pathlib.Path("/proc/self/status").read_text())[1])
 
 
-def get_peak():
-    return resource.getrusage(resource.RUSAGE_SELF).ru_maxrss * 1024
+def restart_peak():
+    """The peak is counted anew from the bytes that the process has, which are returned."""
+    pathlib.Path("/proc/self/clear_refs").write_text("5")
+    return read_memory("VmRSS")
 
 
 def digest(cells):
@@ -64,97 +98,149 @@ def digest(cells):
 
 
 def find_inner_tiles(plan, count):
-    """Tiles in the middle of the country, which the sea and the rim do not touch much."""
-    full = plan.tile**2 / 50  # two triangles in ten by ten metres
+    """Some tiles without sea or rim."""
     everywhere = plan.list_tiles()
-    counts = plan.count([plan.box(tile) for tile in everywhere])
-    inner = [tile for tile, found in zip(everywhere, counts) if found > full]
-    return inner[:: max(1, len(inner) // count)][:count]
+    bounds = plan.count([plan.box(tile) for tile in everywhere])
+    likely = [tile for tile, bound in zip(everywhere, bounds) if bound >= FULL]
+    spread = likely[:: max(1, len(likely) // (2 * count))]
+    return [tile for tile in spread if len(_work._load(plan, tile, plan.box(tile)).triangles) >= FULL][:count]
 
 
-def report_tiles(plans):
-    """The processor time of one tile, from the small and from the large layer, in one process."""
+class Cost(typing.NamedTuple):
+    """Processor times of one layer, in seconds."""
+
+    plan: tiles.Plan
+    survey: float
+    tile: float
+
+    def report(self):
+        print("| | a triangle | 10,000,000,000 triangles |")
+        print("|---|---|---|")
+        size = os.path.getsize(self.plan.path) / self.plan.survey.shapes
+        survey, tile = self.survey / self.plan.survey.shapes, self.tile / FULL
+        print(f"| file | {size:.0f} bytes | {size / 100:.1f} TB |")
+        print(f"| survey | {survey * 1e6:.2f} µs | {survey * 1e10 / 3600:.1f} hours of one core |")
+        print(f"| {1e10 / FULL:,.0f} tiles of {FULL:,} triangles | {tile * 1e6:.1f} µs | "
+              f"{tile * 1e10 / 3600:.1f} hours of one core |")
+        print(f"| memory of a worker, by the estimate | | {self.plan.estimate / 1e6:.0f} MB and the interpreter |\n")
+
+
+def measure_cost(path):
+    """Prints the row of a layer."""
+    survey, plan = measure_processor(lambda: make_plan(path))
+    names = find_inner_tiles(plan, 12)
+    opening, tile, reading = (
+        statistics.median(measure_processor(lambda: call(name))[0] for name in names)
+        for call in (
+            lambda name: plan.count([plan.box(name)]),
+            lambda name: _work.fill_cells(plan, FRAME, name),
+            lambda name: _work._load(plan, name, plan.box(name)),
+        )
+    )
+    travels = len(pickle.dumps(plan)) / 1e3
+    print(f"| {os.path.basename(path)} | {plan.survey.shapes:,} | {survey:.1f} | {travels:,.0f} | "
+          f"{opening * 1e3:.1f} | {tile * 1e3:.0f} | {reading * 1e3:.0f} |", flush=True)
+    return Cost(plan, survey, tile)
+
+
+def report_tiles(small, large):
+    """The processor time of one tile, from small and from large layers, in one process."""
     print("| layer | triangles | survey, s | plan, kB | opening, ms | a tile, ms | of these reading, ms |")
     print("|---|---|---|---|---|---|---|")
-    medians = {}
-    for path, plan, seconds in plans:
-        names = find_inner_tiles(plan, 12)
-        opening = statistics.median(measure_processor(lambda: plan.count([plan.bounds]))[0] for _ in range(5))
-        times = [measure_processor(lambda: _work.fill_cells(plan, FRAME, tile))[0] for tile in names]
-        reads = [measure_processor(lambda: _work._load(plan, tile, plan.box(tile)))[0] for tile in names]
-        medians[path] = statistics.median(times)
-        print(
-            f"| {os.path.basename(path)} | {plan.survey.shapes:,} | {seconds:.1f} | "
-            f"{len(pickle.dumps(plan)) / 1e3:,.0f} | {opening * 1e3:.1f} | {medians[path] * 1e3:.0f} | "
-            f"{statistics.median(reads) * 1e3:.0f} |"
-        )
-    for small, large in zip(list(medians)[:2], list(medians)[2:]):
-        print(f"\nA tile of the large layer takes {medians[large] / medians[small]:.2f} of one of the small layer "
-              f"({os.path.splitext(large)[1]}).")
+    costs = {path: measure_cost(path) for path in [*small, *large]}
+    for a, b in zip(small, large):
+        print(f"\nA tile of {os.path.basename(b)} takes {costs[b].tile / costs[a].tile:.2f} "
+              f"of one of {os.path.basename(a)}.")
     print()
+    costs[large[0]].report()
+
+
+@contextlib.contextmanager
+def start_workers(count):
+    options = dict(n_workers=count, threads_per_worker=1, dashboard_address=None)
+    with distributed.LocalCluster(**options) as cluster, distributed.Client(cluster) as client:
+        yield client
+
+
+class Run(typing.NamedTuple):
+    """All tiles on some worker processes."""
+
+    wall: float  # seconds
+    work: float  # seconds of the processor, all workers together
+    digests: list
+    peak: int  # bytes that the fullest worker needed beyond its rest
 
 
 def run_cluster(plan, workers):
-    """Wall time, the digests of all tiles, and what the fullest worker needed beyond its rest."""
-    options = dict(n_workers=workers, threads_per_worker=1, dashboard_address=None)
-    with distributed.LocalCluster(**options) as cluster, distributed.Client(cluster) as client:
+    with start_workers(workers) as client:
         client.run(lambda: __import__("kelm_tin.tiles"))
-        rest = client.run(get_resident)
+        rest = client.run(restart_peak)
         blocks = tiles.raster(plan, CELL).to_delayed().ravel().tolist()
+        before = sum(client.run(time.process_time).values())
         seconds, found = measure(lambda: dask.compute(*[dask.delayed(digest)(block) for block in blocks]))
-        peaks = client.run(get_peak)
-        return seconds, found, max(peaks[name] - rest[name] for name in peaks)
+        work = sum(client.run(time.process_time).values()) - before
+        peaks = client.run(read_memory, "VmHWM")
+        return Run(seconds, work, list(found), max(peaks[name] - rest[name] for name in peaks))
 
 
-def report_cluster(plan, path):
-    print(f"{os.path.basename(path)}: {plan.tiles[0]} x {plan.tiles[1]} tiles of {TILE:.0f} m, cells of {CELL:.0f} m.\n")
-    print("| processes | wall time, s | of one process | bits | peak of a worker, MB | estimate and cells, MB |")
-    print("|---|---|---|---|---|---|")
+def report_cluster(path, processes):
+    plan = find_plan(path)
+    rows, columns = plan.tiles
+    print(f"{os.path.basename(path)}: {rows} x {columns} tiles of {TILE:.0f} m, cells of {CELL:.0f} m.\n")
+    print("| processes | wall time, s | of one | processor time, s | bits | peak of a worker, MB | estimate, MB |")
+    print("|---|---|---|---|---|---|---|")
     first = None
-    bound = plan.estimate + 2 * 4 * FRAME.side**2
-    for workers in (1, 2, 4):
-        seconds, found, peak = run_cluster(plan, workers)
-        first = first or (seconds, found)
-        same = "equal" if found == first[1] else "DIFFERENT"
-        print(f"| {workers} | {seconds:.1f} | {seconds / first[0]:.2f} | {same} | {peak / 1e6:.0f} | {bound / 1e6:.0f} |")
+    bound = plan.estimate + 2 * 4 * FRAME.side**2  # and the cells
+    for workers in processes:
+        run = run_cluster(plan, workers)
+        first = first or run
+        same = "equal" if run.digests == first.digests else "DIFFERENT"
+        print(f"| {workers} | {run.wall:.1f} | {run.wall / first.wall:.2f} | {run.work:.1f} | {same} | "
+              f"{run.peak / 1e6:.0f} | {bound / 1e6:.0f} |", flush=True)
     print()
-    return first[1]
+    pathlib.Path(path + ".digests").write_text(json.dumps(first.digests))
 
 
-def report_whole(plan, path, found):
+def report_whole(path):
+    digests = pathlib.Path(path + ".digests")
+    if not digests.exists():
+        sys.exit(f"{digests} is missing. The part cluster writes it.")
+    plan, expected = find_plan(path), json.loads(digests.read_text())
     seconds, surface = measure(lambda: kelm_tin.read(path, base=BASE))
-    same = True
-    for number, tile in enumerate(np.ndindex(plan.tiles)):
-        xmin, ymin, xmax, ymax = plan.box(tile)
-        same &= digest(surface.raster((xmin, ymin, xmax, ymax), CELL).heights) == found[number]
-    print(f"The whole surface in one process: {seconds:.0f} s to read, peak {get_peak() / 1e9:.1f} GB, "
-          f"bits {'equal' if same else 'DIFFERENT'}.\n")
+    peak = read_memory("VmHWM")
+    found = []
+    rows, columns = plan.tiles
+    for row in range(rows):
+        xmin, ymin, _, ymax = plan.box((row, 0))
+        band = surface.raster((xmin, ymin, xmin + columns * TILE, ymax), CELL).heights
+        found += [digest(cells) for cells in np.hsplit(band, columns)]
+    print(f"{os.path.basename(path)} as a whole in one process: {seconds:.0f} s to read, peak {peak / 1e9:.1f} GB, "
+          f"bits of {len(found)} tiles {'equal' if found == expected else 'DIFFERENT'}.\n", flush=True)
 
 
-def report_products(plan, folder, picture):
-    """Heights at random positions, a GeoTIFF, and the picture."""
-    options = dict(n_workers=2, threads_per_worker=1, dashboard_address=None)
-    with distributed.LocalCluster(**options) as cluster, distributed.Client(cluster):
+def report_products(plan, folder):
+    """Heights at random positions, and a GeoTIFF."""
+    with start_workers(2):
         xmin, ymin, xmax, ymax = plan.bounds
         xy = np.random.default_rng(1).uniform((xmin, ymin), (xmax, ymax), (5_000_000, 2))
         seconds, _ = measure(lambda: tiles.heights(plan, xy).compute())
-        print(f"Two processes: {len(xy):,} heights at random positions in {seconds:.1f} s;", end=" ")
+        print(f"Two processes: {len(xy):,} heights at random positions in {seconds:.1f} s;", end=" ", flush=True)
         name = os.path.join(folder, "country.tif")
+        rest = restart_peak()
         seconds, _ = measure(lambda: tiles.write_geotiff(tiles.raster(plan, CELL), name))
         print(f"a GeoTIFF of {os.path.getsize(name) / 1e6:,.0f} MB in {seconds:.1f} s, "
-              f"by a process whose peak was {get_peak() / 1e6:.0f} MB.")
-        if picture:
-            draw(tiles.raster(plan, 50.0), picture)
+              f"by a process that needed {(read_memory('VmHWM') - rest) / 1e6:.0f} MB for it.\n", flush=True)
 
 
-def draw(cells, picture):
+def draw(plan, picture):
     import matplotlib
 
     matplotlib.use("Agg")
     from matplotlib.colors import LightSource
     from PIL import Image
 
-    heights = cells.compute()
+    with start_workers(2):
+        heights = tiles.raster(plan, 50.0).compute()
     land = np.isfinite(heights)
     rows, columns = (slice(*np.flatnonzero(land.any(axis=axis))[[0, -1]]) for axis in (1, 0))
     heights, land = heights[rows, columns], land[rows, columns]
@@ -166,25 +252,35 @@ def draw(cells, picture):
     image.quantize(64).save(picture, optimize=True)
 
 
-def main():
+def parse_options():
     parser = argparse.ArgumentParser(description=__doc__, formatter_class=argparse.RawTextHelpFormatter)
     parser.add_argument("folder")
+    parser.add_argument("parts", nargs="*", metavar="PART")
     parser.add_argument("--triangles", type=int, default=20_000_000)
     parser.add_argument("--small", type=int, default=1_000_000)
-    parser.add_argument("--whole", action="store_true")
-    parser.add_argument("--relief")
-    options = parser.parse_args()
-    plans = []
-    for count in (options.small, options.triangles):
-        for path in make_country(options.folder, count):
-            seconds, plan = measure_processor(lambda: tiles.Plan(path, tile=TILE, base=BASE))
-            plans.append((path, plan, seconds))
-    report_tiles(plans)
-    for path, plan, _ in plans[2:]:
-        found = report_cluster(plan, path)
-    report_products(plans[2][1], options.folder, options.relief)
-    if options.whole:
-        report_whole(plan, path, found)
+    parser.add_argument("--formats", nargs="+", choices=FORMATS, default=FORMATS)
+    parser.add_argument("--processes", nargs="+", type=int, default=(1, 2, 4))
+    return parser.parse_args()
+
+
+def main():
+    options = parse_options()
+    find = lambda count: [find_country(options.folder, count, ending) for ending in options.formats]
+    large = find(options.triangles)
+    parts = {
+        "data": lambda: find(options.small),
+        "tiles": lambda: report_tiles(find(options.small), large),
+        "cluster": lambda: [report_cluster(path, options.processes) for path in large],
+        "products": lambda: report_products(find_plan(large[0]), options.folder),
+        "whole": lambda: [report_whole(path) for path in large],
+        "relief": lambda: draw(find_plan(large[0]), os.path.join(options.folder, "country.png")),
+    }
+    unknown = set(options.parts) - set(parts)
+    if unknown:
+        sys.exit(f"There is no part {min(unknown)}. The parts are {', '.join(parts)}.")
+    for part in options.parts or parts:
+        seconds, _ = measure(parts[part])
+        print(f"{part}: {seconds:.0f} s", file=sys.stderr)
 
 
 if __name__ == "__main__":

@@ -129,6 +129,8 @@ def read(
         _warn(texts)
     if native is None:
         raise NothingRead(f"{os.fspath(path)}: no polygon of the layer or window gave a triangle")
+    if survey is not None and survey.data:
+        crs = survey.crs
     return Surface._wrap(native, crs, source if output is None else output)
 
 

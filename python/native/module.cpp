@@ -35,13 +35,14 @@ auto Collect(py::list& texts, const Work& work) {
 auto ReadFile(const std::string& file, int layer, DatumType source, DatumType output,
               const std::optional<std::array<double, 4>>& window,
               const std::optional<std::array<double, 2>>& base, double offset, double scale,
-              const std::string& survey, const py::object& progress, py::list warnings) {
+              std::string survey, const py::object& progress, py::list warnings) {
     // Without a survey, opening reads the layer, which is about half of the work.
     const double opened = survey.empty() ? 0.5 : 0.0;
     PythonProgress opening(progress, 0.0, opened);
     PythonProgress loading(progress, opened, 1.0);
-    const ReadOptions options{
-        layer, source, output, window, base, offset, scale, {survey, opening.Get()}, loading.Get()};
+    const ReadOptions options{layer,        source, output, window,
+                              base,         offset, scale,  {std::move(survey), opening.Get()},
+                              loading.Get()};
     return Collect(warnings, [&] { return Read(file, options); });
 }
 
@@ -54,11 +55,11 @@ auto SurveyFile(const std::string& file, int layer, const py::object& progress, 
     return std::pair(std::move(facts), py::bytes(bytes));
 }
 
-auto CountFile(const std::string& file, int layer, const std::string& survey,
+auto CountFile(const std::string& file, int layer, std::string survey,
                const std::vector<std::array<double, 4>>& windows, py::list warnings) {
     ReadOptions options;
     options.mnLayer = layer;
-    options.moOpening.survey = survey;
+    options.moOpening.survey = std::move(survey);
     return Collect(warnings, [&] { return CountShapes(file, options, windows); });
 }
 

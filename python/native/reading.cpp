@@ -120,7 +120,9 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
     std::unique_ptr<tin::Tin> surface(reader->Load(options.moWindow ? &window : nullptr, load));
     if (!surface)
         return {nullptr, std::nullopt};
-    return {std::make_unique<Surface>(std::move(surface)), GetWkt(reader->GetCRSText())};
+    const bool known = !options.moOpening.survey.empty();
+    return {std::make_unique<Surface>(std::move(surface)),
+            known ? std::nullopt : GetWkt(reader->GetCRSText())};
 }
 
 std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,

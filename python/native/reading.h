@@ -41,7 +41,9 @@ struct ReadOptions {
     tin::Progress moLoading;
 };
 
-/// @return the surface, or null if no polygon gave a triangle; and the CRS of the layer as WKT
+/// @return the surface, or null if no polygon gave a triangle; and the CRS of the layer as WKT,
+/// unless a survey was given, whose facts have it: WKT takes milliseconds, as much as a small
+/// window
 /// @throw FileError; kelm::Exception
 std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::string& file,
                                                                      const ReadOptions& options);

@@ -116,6 +116,7 @@ def test_windows_of_one_survey_and_one_base(tmp_path):
     part = kelm_tin.read(path, base=base, window=(*xy.min(axis=0), *xy.max(axis=0)), survey=survey)
     assert len(part.triangles) < len(whole.triangles) / 10
     assert np.array_equal(part.heights(xy), whole.heights(xy), equal_nan=True)
+    assert part.crs == whole.crs is not None
     with pytest.raises(kelm_tin.NothingRead):
         kelm_tin.read(path, window=(xmin, ymin, xmin, ymin), survey=survey)
     os.utime(path, (1, 1))

@@ -15,6 +15,8 @@ from ._raster import Transform
 
 GROUP = 8
 """Chunks that are computed together. On a cluster the next group runs while one is written."""
+CACHE = 1 << 26
+"""Bytes of blocks that GDAL may keep at least. By itself it keeps a twentieth of the machine's memory."""
 SMALLEST_OVERVIEW = 256
 MOST_BLOCK = 512
 OPTIONS = {"TILED": "YES", "COMPRESS": "DEFLATE", "BIGTIFF": "IF_SAFER"}
@@ -28,6 +30,8 @@ class Sheet(NamedTuple):
     rows: int
     columns: int
     dtype: Any
+    chunk: int
+    """Rows of a chunk."""
     side: int
     """Cells on a side of a block in the file."""
     transform: Transform
@@ -37,6 +41,12 @@ class Sheet(NamedTuple):
         predictor = "3" if self.dtype.kind == "f" else "2"
         side = str(self.side)
         return {**OPTIONS, "PREDICTOR": predictor, "BLOCKXSIZE": side, "BLOCKYSIZE": side}
+
+    def cache(self) -> int:
+        """Bytes of blocks that GDAL may keep. A block that lies in two rows of chunks must stay for both: else
+        it is written twice, and takes its place in the file twice."""
+        row = self.chunk * self.columns * int(self.dtype.itemsize)
+        return CACHE if self.chunk % self.side == 0 else CACHE + 2 * row
 
     def overviews(self) -> list[int]:
         levels: list[int] = []
@@ -54,8 +64,8 @@ def write_geotiff(
 ) -> None:
     """Computes a raster chunk by chunk and writes it: tiled, compressed, with overviews.
 
-    Some chunks are in memory at a time, however large the raster is. The file appears under its name when
-    it is whole. Needs rasterio or GDAL's Python module.
+    Some chunks are in memory at a time, at most two rows of them, however large the raster is. The file
+    appears under its name when it is whole. Needs rasterio or GDAL's Python module.
 
     Args:
         array: what `raster` gave, or a dask array of two axes computed from it.
@@ -72,17 +82,17 @@ def write_geotiff(
     if array.ndim != 2 or where is None:
         raise ValueError(f"array: expected two axes and a transform, got shape {array.shape}, {where}")
     crs = getattr(array, "crs", None) if crs is None else crs
-    sheet = Sheet(array.shape[0], array.shape[1], array.dtype, _find_side(array.chunks), where, crs)
+    (rows, columns), chunk = array.shape, array.chunks[0][0]
+    sheet = Sheet(rows, columns, array.dtype, chunk, _find_side(chunk), where, crs)
     write = _find_writer()
     with _whole_or_not_at_all(os.fspath(path)) as name:
         write(name, sheet, _compute_blocks(array))
 
 
-def _find_side(chunks: Any) -> int:
+def _find_side(count: int) -> int:
     """A side of blocks that divides the chunks, so that no block is written twice. Must be a multiple of
     16."""
     sides = range(MOST_BLOCK, 127, -16)
-    count = chunks[0][0]
     return next((side for side in sides if count % side == 0), 256)
 
 
@@ -133,7 +143,28 @@ def _compute_in_order(blocks: list[Any]) -> Iterator[Any]:
         yield from client.gather(futures)
 
 
+@contextmanager
+def _small_cache(most: int, get: Callable[[], Any], set_to: Callable[[int], Any]) -> Iterator[None]:
+    """The cache of GDAL is the process's: it becomes as large as before in the end."""
+    before = get()
+    set_to(min(before, most))
+    try:
+        yield
+    finally:
+        set_to(before)
+
+
 def _write_by_rasterio(name: str, sheet: Sheet, blocks: Blocks) -> None:
+    import rasterio
+    from rasterio.env import get_gdal_config, set_gdal_config  # type: ignore[import]
+
+    key = "GDAL_CACHEMAX"
+    get, set_to = lambda: get_gdal_config(key), lambda size: set_gdal_config(key, size)
+    with rasterio.Env(), _small_cache(sheet.cache(), get, set_to):
+        _write_within_cache(name, sheet, blocks)
+
+
+def _write_within_cache(name: str, sheet: Sheet, blocks: Blocks) -> None:
     import rasterio
     from rasterio.enums import Resampling  # type: ignore[import]
     from rasterio.windows import Window  # type: ignore[import]
@@ -160,7 +191,7 @@ def _write_by_rasterio(name: str, sheet: Sheet, blocks: Blocks) -> None:
 def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
     from osgeo import gdal, gdal_array
 
-    with _exceptions_of(gdal):
+    with _exceptions_of(gdal), _small_cache(sheet.cache(), gdal.GetCacheMax, gdal.SetCacheMax):
         kind = gdal_array.NumericTypeCodeToGDALTypeCode(sheet.dtype)
         options = [f"{key}={value}" for key, value in sheet.options().items()]
         file = gdal.GetDriverByName("GTiff").Create(name, sheet.columns, sheet.rows, 1, kind, options)
@@ -172,7 +203,8 @@ def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
         if sheet.dtype.kind == "f":
             band.SetNoDataValue(np.nan)
         for row, column, cells in blocks:
-            band.WriteArray(cells, column, row)
+            # GDAL's module crashes on cells that share one place in memory, as constants do.
+            band.WriteArray(np.ascontiguousarray(cells), column, row)
         file.FlushCache()
         file.BuildOverviews("AVERAGE", sheet.overviews())
         del band, file

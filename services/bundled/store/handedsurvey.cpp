@@ -17,7 +17,7 @@ std::string GetWriter() {
     constexpr std::uint32_t BYTE_ORDER_MARK = 0x01020304;
     ByteWriter mark;
     mark.Put(BYTE_ORDER_MARK);
-    return "survey 1, GDAL " + std::string(GDALVersionInfo("RELEASE_NAME")) + ", GEOS " +
+    return "survey 2, GDAL " + std::string(GDALVersionInfo("RELEASE_NAME")) + ", GEOS " +
            GEOSversion() + mark.GetBytes();
 }
 
@@ -80,10 +80,12 @@ HandedSurvey ReadSurvey(const std::string& bytes, const std::string& file) {
     const std::string_view writer = framed.GetText();
     const auto sum = framed.Get<std::uint64_t>();
     const std::string_view content = framed.GetText();
-    if (framed.HasFailed() || !framed.IsAtEnd() || sum != ComputeChecksum(content))
+    if (framed.HasFailed() || !framed.IsAtEnd())
         RefuseSurvey(file, "it is damaged");
     if (writer != GetWriter())
         RefuseSurvey(file, "other versions of the libraries made it");
+    if (sum != ComputeChecksum(content))
+        RefuseSurvey(file, "it is damaged");
     ByteReader reader(content);
     HandedSurvey survey;
     if (!Read(reader, survey))

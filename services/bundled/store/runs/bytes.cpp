@@ -43,9 +43,15 @@ std::vector<bool> ByteReader::GetBits() {
 }
 
 std::uint64_t ComputeChecksum(std::string_view bytes) {
+    constexpr std::uint64_t PRIME = 0x100000001b3U;
     std::uint64_t sum = 0xcbf29ce484222325U;
-    for (const char byte : bytes)
-        sum = (sum ^ static_cast<unsigned char>(byte)) * 0x100000001b3U;
+    std::size_t next = 0;
+    for (std::uint64_t word = 0; next + sizeof word <= bytes.size(); next += sizeof word) {
+        std::memcpy(&word, bytes.data() + next, sizeof word);
+        sum = (sum ^ word) * PRIME;
+    }
+    for (; next < bytes.size(); ++next)
+        sum = (sum ^ static_cast<unsigned char>(bytes[next])) * PRIME;
     return sum;
 }
 

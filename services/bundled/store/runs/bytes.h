@@ -63,8 +63,8 @@ class ByteReader {
     bool mbFailed = false;
 };
 
-/// @return a number that any change of a byte changes (FNV-1a of 64 bits). It guards against
-/// accidents, not against intent
+/// @return a number that any change of a byte changes (FNV-1a of 64 bits, by words of eight bytes
+/// and then by bytes). It guards against accidents, not against intent
 std::uint64_t ComputeChecksum(std::string_view bytes);
 
 } // namespace kelm::store
