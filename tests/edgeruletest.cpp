@@ -130,5 +130,54 @@ TEST(EdgeRule, ClosedMissesNoPositionOfAGaplessSheetAndNoneBesideIt) {
     }
 }
 
+/// A triangle with an edge of 50 equal steps, through the origin or not, and a position: one of
+/// those steps, or next to a small part of one from the origin. All are whole numbers, but for that
+/// part.
+Point2 MakeExactEdge(bool isThroughOrigin, Point* poCorners, Random& random) {
+    const auto whole = [&](float most) { return std::floor(random.Between(-most, most)); };
+    const Point2 step{whole(0x1p16F), whole(0x1p16F)};
+    const auto go = [&](const Point2& from, float steps) {
+        return Point2{from.x + steps * step.x, from.y + steps * step.y};
+    };
+    const float along = static_cast<float>(random.Below(51));
+    const Point2 start =
+        isThroughOrigin ? go({0, 0}, -along) : Point2{whole(0x1p22F), whole(0x1p22F)};
+    const Point2 end = go(start, 50);
+    poCorners[0] = {start.x, start.y, random.Between(0, 50)};
+    poCorners[1] = {end.x, end.y, 9};
+    poCorners[2] = {whole(0x1p22F), whole(0x1p22F), random.Between(0, 50)};
+    if (!isThroughOrigin)
+        return go(start, along);
+    Point2 p = go({0, 0}, std::exp2(-static_cast<float>(random.Below(60))));
+    const float sides[] = {p.x, LOWEST, -LOWEST};
+    p.x = std::nextafter(p.x, sides[random.Below(3)]);
+    return p;
+}
+
+// Where `double` does not tell: positions on an edge, or beside it by less than it resolves.
+TEST(EdgeRule, ClosedHoldsWhatOneTriangleHoldsByExactArithmetic) {
+    Random random;
+    unsigned lost[2] = {0, 0};
+    for (unsigned n = 0; n < 30000; ++n) {
+        const bool isThroughOrigin = n % 2 == 0;
+        Point corners[3];
+        const Point2 p = MakeExactEdge(isThroughOrigin, corners, random);
+        Mesh mesh;
+        mesh.Add(corners[n % 3], corners[(n + 1) % 3], corners[(n + 2) % 3]);
+        const OpenTin tin = mesh.MakeTin();
+        float h = UNTOUCHED, closed = UNTOUCHED;
+        Rational exact;
+        const bool isFound = tin.GetHeight(p.x, p.y, h, nullptr);
+        const bool isHeld = IsHeld(*tin.GetTriangle(0), p, exact);
+        ASSERT_EQ(tin.GetHeight(p.x, p.y, closed, nullptr, ER_Closed), isFound || isHeld)
+            << p.x << ", " << p.y;
+        if (isFound || !isHeld)
+            continue;
+        ++lost[isThroughOrigin];
+        EXPECT_TRUE(IsNearest(closed, exact)) << closed << ", not " << exact;
+    }
+    EXPECT_TRUE(lost[0] > 1000 && lost[1] > 1000) << lost[0] << ", " << lost[1];
+}
+
 } // namespace
 } // namespace kelm::tin::test
