@@ -127,13 +127,38 @@ Segment MakeSegment(const OpenTin& tin, Random& random) {
     return kinds[random.Below(std::size(kinds))];
 }
 
+/// A segment past a corner or an edge of the first triangle, so near that rounding decides: through
+/// it, to it, or nearly along an axis. Each of its components has a size of its own.
+Segment MakeGrazing(const OpenTin& tin, Random& random) {
+    const Triangle& one = *tin.GetTriangle(0);
+    const int k = static_cast<int>(random.Below(3));
+    const Point rim = Between(*one.GetVertex(k), *one.GetVertex((k + 1) % 3),
+                              random.Below(2) == 0 ? 0 : random.Between(0, 1));
+    const auto any = [&](float least, float most) {
+        return std::exp2(random.Between(least, most)) * (random.Below(2) == 0 ? 1.0F : -1.0F);
+    };
+    const auto beside = [&](const Point& d, float t) {
+        return Point{rim.x + t * d.x, rim.y + t * d.y, rim.z + t * d.z};
+    };
+    const Point through{any(-24, 8), any(-24, 8), any(-24, 8)};
+    const Point along{any(-16, 4), any(-6, 8), any(-6, 8)};
+    const Point tiny{any(-40, -18), any(-40, -18), any(-40, -18)};
+    const Segment kinds[] = {
+        {beside(through, random.Between(-1, 0)), beside(through, random.Between(0, 1))},
+        {beside(through, 1), beside(tiny, 1)},
+        {beside(along, -1), beside(along, 1)},
+        {beside({along.y, along.x, along.z}, -1), beside({along.y, along.x, along.z}, 1)}};
+    return kinds[random.Below(std::size(kinds))];
+}
+
 /// Asks both ways, one by one and as a batch. @return how many segments have a crossing
-unsigned Compare(const OpenTin& tin, const CrossingTree& tree, unsigned count, Random& random) {
+unsigned Compare(const OpenTin& tin, const CrossingTree& tree, unsigned count, Random& random,
+                 Segment (*makeSegment)(const OpenTin&, Random&) = MakeSegment) {
     std::vector<point3_t<double>> batch;
     std::vector<float> wanted;
     unsigned found = 0;
     for (unsigned i = 0; i < count; ++i) {
-        const Segment s = MakeSegment(tin, random);
+        const Segment s = makeSegment(tin, random);
         float h = UNTOUCHED, expected = UNTOUCHED;
         const bool isFound = tin.GetLineIntersectHeight(s.a, s.b, expected, nullptr);
         EXPECT_EQ(tree.GetLineIntersectHeight(s.a, s.b, h), isFound);
@@ -154,12 +179,18 @@ unsigned Compare(const OpenTin& tin, const CrossingTree& tree, unsigned count, R
     return found;
 }
 
+/// A team for each small scan would only cost time.
+struct OneThread {
+    OneThread() { omp_set_num_threads(1); }
+    ~OneThread() { omp_set_num_threads(most); }
+    int most = omp_get_max_threads();
+};
+
 TEST(CrossingTreeTest, AnswersAsAScanOfAllTriangles) {
+    const OneThread oneThread;
     Random random;
     const char* effort = std::getenv("TIN_TEST_EFFORT");
     const unsigned count = effort == nullptr ? 400 : unsigned(std::atoi(effort));
-    const int threads = omp_get_max_threads();
-    omp_set_num_threads(1); // a team for each small scan only costs time
     unsigned found = 0, asked = 0;
     for (const OddSurface& odd : MakeSurfaces(random)) {
         if (odd.oMesh.ids.empty())
@@ -175,7 +206,27 @@ TEST(CrossingTreeTest, AnswersAsAScanOfAllTriangles) {
         Compare(tin, CrossingTree(tin), count / 5, random);
     }
     EXPECT_GT(found, asked / 5);
-    omp_set_num_threads(threads);
+}
+
+// A triangle alone in its box is asked for where the box ends. Beside a large corner a small one is
+// lost in the differences, and far from the origin so are the margins.
+TEST(CrossingTreeTest, LosesNoCrossingAtTheFacesOfABox) {
+    const OneThread oneThread;
+    Random random;
+    unsigned found = 0;
+    for (unsigned n = 0; n < 3000; ++n) {
+        const float origin = n % 3 == 0 ? 1000 : 0;
+        const auto corner = [&] {
+            const float size = std::exp2(random.Between(-8, 8));
+            return Point{origin + size * random.Between(-1, 1),
+                         origin + size * random.Between(-1, 1), size * random.Between(-1, 1)};
+        };
+        Mesh mesh;
+        mesh.Add(corner(), corner(), corner());
+        const OpenTin tin = mesh.MakeTin();
+        found += Compare(tin, CrossingTree(tin), 200, random, MakeGrazing);
+    }
+    EXPECT_GT(found, 100000U);
 }
 
 /// Sheets side by side, so many that a build divides its work, with some walls in each.

@@ -18,7 +18,7 @@ class Batch {
     std::size_t Answer(std::size_t first, std::size_t last);
 
   private:
-    static constexpr unsigned TURNS = 8;
+    static constexpr unsigned TURNS = 6;
     /// Nodes of blocks from which on walks take turns. Where all is in the cache anyway they would
     /// only get in the way of each other.
     static constexpr unsigned LARGE = 512;

@@ -52,7 +52,8 @@ void Walk::Start(const Index& index, const point3_t<float>& a, const point3_t<fl
     moFilter = Filter(a, b, reach.isFilterable);
     moHighest = {};
     mnPending = 0;
-    mnMet = 0;
+    moGroups = {};
+    moBlocks = {};
     for (const unsigned root : index.roots)
         Push(root);
     for (const StaleTriangle& stale : index.stale) {
@@ -64,33 +65,41 @@ void Walk::Start(const Index& index, const point3_t<float>& a, const point3_t<fl
     }
 }
 
+/// Blocks wait until no node can be tested, and nodes of blocks until no upper node can: so the
+/// memory of all that wait is fetched at the same time.
 void Walk::Step() {
-    if (mnMet != 0) {
-        TestBlock(mnGroup * WIDTH + FindLowestBit(mnMet));
-        mnMet &= mnMet - 1;
-        return;
-    }
-    const unsigned item = manPending[--mnPending];
-    if (item < mpoIndex->groups)
-        return SetGroup(item);
-    const UpperNode& node = mpoIndex->upperNodes[item - mpoIndex->groups];
+    if (CanTestUpperNode())
+        while (CanTestUpperNode())
+            TestUpperNode(mpoIndex->upperNodes[manPending[--mnPending] - mpoIndex->groups]);
+    else if (CanTestGroup())
+        while (CanTestGroup())
+            TestGroup(moGroups.Take());
+    else
+        while (!moBlocks.IsEmpty())
+            TestBlock(moBlocks.Take());
+}
+
+void Walk::TestUpperNode(const UpperNode& node) {
     ForEachBit(Test(node.boxes), [&](unsigned k) { Push(node.children[k]); });
 }
 
-void Walk::SetGroup(unsigned group) {
-    mnGroup = group;
-    mnMet = Test(mpoIndex->nodes[group]);
-    for (unsigned met = mnMet; met != 0; met &= met - 1)
-        PrefetchAll(mpoIndex->blocks[group * WIDTH + FindLowestBit(met)]);
+void Walk::TestGroup(unsigned group) {
+    ForEachBit(Test(mpoIndex->nodes[group]), [&](unsigned k) {
+        const unsigned block = group * WIDTH + k;
+        moBlocks.Add(block);
+        PrefetchAll(mpoIndex->blocks[block]);
+    });
 }
 
 void Walk::Push(unsigned node) {
-    assert(mnPending < MOST_PENDING);
-    manPending[mnPending++] = node;
-    if (node < mpoIndex->groups)
+    if (node < mpoIndex->groups) {
+        moGroups.Add(node);
         PrefetchAll(mpoIndex->nodes[node]);
-    else
+    } else {
+        assert(mnPending < MOST_PENDING);
+        manPending[mnPending++] = node;
         PrefetchAll(mpoIndex->upperNodes[node - mpoIndex->groups]);
+    }
 }
 
 unsigned Walk::Test(const Node& node) const {

@@ -32,15 +32,31 @@ class Highest {
     unsigned mnId = 0;
 };
 
-/// The search for the highest crossing of one segment, in steps of a node or its blocks, so that
-/// several can take turns while memory is fetched.
+/// A few numbers that wait their turn.
+class Queue {
+  public:
+    bool IsEmpty() const { return mnFirst == mnLast; }
+    /// Is there room for all children of a node?
+    bool HasRoom() const { return mnLast - mnFirst <= SIZE - WIDTH; }
+    void Add(unsigned number) { manNumbers[mnLast++ % SIZE] = number; }
+    unsigned Take() { return manNumbers[mnFirst++ % SIZE]; }
+
+  private:
+    static constexpr unsigned SIZE = 2 * WIDTH;
+    unsigned manNumbers[SIZE];
+    unsigned mnFirst = 0;
+    unsigned mnLast = 0;
+};
+
+/// The search for the highest crossing of one segment, in steps of some nodes or some blocks, so
+/// that several can take turns while memory is fetched.
 class Walk {
   public:
     Walk() = default;
 
     /// @param a,b ends of the segment, surface-local; it meets the box of the surface
     void Start(const Index& index, const point3_t<float>& a, const point3_t<float>& b);
-    bool IsDone() const { return mnPending == 0 && mnMet == 0; }
+    bool IsDone() const { return mnPending == 0 && moGroups.IsEmpty() && moBlocks.IsEmpty(); }
     void Step();
     const Highest& GetHighest() const { return moHighest; }
 
@@ -52,7 +68,10 @@ class Walk {
 
     void Push(unsigned node);
     unsigned Test(const Node& node) const;
-    void SetGroup(unsigned group);
+    bool CanTestUpperNode() const { return mnPending != 0 && moGroups.HasRoom(); }
+    bool CanTestGroup() const { return !moGroups.IsEmpty() && moBlocks.HasRoom(); }
+    void TestUpperNode(const UpperNode& node);
+    void TestGroup(unsigned group);
     void TestBlock(unsigned number);
     void TestLane(const Block& block, unsigned lane, const unsigned& id);
     /// @param id read only where it decides
@@ -66,8 +85,8 @@ class Walk {
     bool mbBounded = false;
     Filter moFilter;
     Highest moHighest;
-    unsigned mnGroup = 0; ///< the node of blocks at hand
-    unsigned mnMet = 0;   ///< a bit for each of its blocks that is to be tested
+    Queue moGroups; ///< nodes of blocks whose memory is being fetched
+    Queue moBlocks; ///< blocks whose memory is being fetched
     unsigned mnPending = 0;
     unsigned manPending[MOST_PENDING];
 };
