@@ -1,5 +1,7 @@
 #include "tin/heightgrid/batch/positionblock.h"
 
+#include "tin/rules/frame.h"
+
 #include <algorithm>
 #include <limits>
 
