@@ -64,6 +64,28 @@ void TestGridHeight(const Opened& surface, const HeightGrid& grid, float x, floa
     }
 }
 
+/// The same in a batch: a run of positions from one to another.
+void TestGridRun(const Opened& surface, const HeightGrid& grid, const Point& a, const Point& b,
+                 unsigned count) {
+    std::vector<point2_t<double>> positions;
+    for (unsigned i = 0; i < count; ++i) {
+        const double step = i / double(count);
+        positions.push_back({1000.0 + double(a.x) + (double(b.x) - double(a.x)) * step,
+                             double(a.y) - 2000.0 + (double(b.y) - double(a.y)) * step});
+    }
+    std::vector<float> heights(count);
+    for (const auto rule : {kelm::tin::ER_Float, kelm::tin::ER_Closed}) {
+        grid.GetHeights(positions.data(), count, heights.data(), 1, rule);
+        for (unsigned i = 0; i < count; ++i) {
+            float wanted = 0.5F;
+            const bool isFound =
+                surface.GetHeight(positions[i].x, positions[i].y, wanted, nullptr, rule);
+            Require(isFound ? std::memcmp(&wanted, &heights[i], sizeof wanted) == 0
+                            : std::isnan(heights[i]));
+        }
+    }
+}
+
 /// Does the segment stay on the rim of the triangle's box, where rounding decides? Out of range it
 /// always may, and the boxes of the tree leave out a coordinate that is NaN.
 bool IsGrazed(const Triangle& triangle, const Point& a, const Point& b) {
@@ -182,6 +204,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         const Point b{coordinates.Take(), coordinates.Take(), coordinates.Take()};
         TestPoint(*surface, tree, a.x, a.y);
         TestGridHeight(*surface, grid, a.x, a.y);
+        TestGridRun(*surface, grid, a, b, 2 + triangles % 8);
         TestLine(*surface, tree, a, b);
         TestCrossing(*surface, crossings, a, b);
         BBox<float, point2_t<float>> region;

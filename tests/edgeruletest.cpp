@@ -96,6 +96,18 @@ bool IsNearest(float height, const Rational& exact) {
            height <= static_cast<float>(near + ROUNDINGS);
 }
 
+/// A batch of a position between others close by, which is a run in a cell.
+void ExpectRun(const HeightGrid& grid, const Point2& p, EdgeRule rule, bool isFound, float h) {
+    std::vector<point2_t<double>> positions;
+    for (const float step : {0.0F, -1e-6F, 0.0F, 1e-6F, 0.0F})
+        positions.push_back({double(p.x * (1 + step)), double(p.y * (1 + step))});
+    float heights[5];
+    grid.GetHeights(positions.data(), 5, heights, 1, rule);
+    for (const unsigned i : {0U, 2U, 4U})
+        EXPECT_TRUE(isFound ? IsSameBits(heights[i], h) : std::isnan(heights[i]))
+            << p.x << ", " << p.y << ", rule " << rule;
+}
+
 // TIN_TEST_POSITIONS sets how many positions are tried on each sheet.
 TEST(EdgeRule, ClosedMissesNoPositionOfAGaplessSheetAndNoneBesideIt) {
     Random random;
@@ -112,6 +124,8 @@ TEST(EdgeRule, ClosedMissesNoPositionOfAGaplessSheetAndNoneBesideIt) {
             float h = UNTOUCHED, closed = UNTOUCHED, byTree = UNTOUCHED;
             const bool isFound = grid.GetHeight(p.x, p.y, h);
             const bool isClosed = grid.GetHeight(p.x, p.y, closed, ER_Closed);
+            ExpectRun(grid, p, ER_Float, isFound, h);
+            ExpectRun(grid, p, ER_Closed, isClosed, closed);
             EXPECT_EQ(tin.GetHeight(p.x, p.y, byTree, &tree, ER_Closed), isClosed);
             EXPECT_TRUE(IsSameBits(closed, byTree) && (!isFound || IsSameBits(closed, h)));
             if (isFound)

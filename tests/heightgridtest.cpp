@@ -22,6 +22,43 @@ void ExpectScan(const OpenTin& tin, const HeightGrid& grid, Random& random, unsi
     }
 }
 
+/// Positions of a batch in runs of 1 to 80: all over the surface, and close to each other in a row.
+std::vector<Point2> MakeRuns(const OpenTin& tin, Random& random, std::size_t count) {
+    std::vector<Point2> positions;
+    while (positions.size() < count) {
+        const Point2 p = MakePosition(tin, random), q = MakePosition(tin, random);
+        const float steps[] = {0, 1e-6F, 1e-3F, 0.01F, 0.1F};
+        const float dx = (q.x - p.x) * steps[random.Below(5)];
+        const float dy = (q.y - p.y) * steps[random.Below(5)];
+        const unsigned length = random.Below(8) == 0 ? 80 : 1 + random.Below(10);
+        for (unsigned i = 0; i < length; ++i)
+            positions.push_back({p.x + float(i) * dx, p.y + float(i) * dy});
+    }
+    return positions;
+}
+
+/// Puts positions to an index in one batch, and to the scan, by both rules.
+void ExpectScanOfRuns(const OpenTin& tin, const HeightGrid& grid, Random& random) {
+    const std::vector<Point2> positions = MakeRuns(tin, random, 1 + random.Below(500));
+    std::vector<point2_t<double>> map;
+    for (const Point2& p : positions)
+        map.push_back({double(p.x), double(p.y)});
+    for (const EdgeRule rule : {ER_Float, ER_Closed}) {
+        std::vector<float> heights(positions.size(), UNTOUCHED);
+        std::size_t found = grid.GetHeights(map.data(), map.size(), heights.data(), 1, rule);
+        for (std::size_t i = 0; i < positions.size() && !testing::Test::HasFailure(); ++i) {
+            const auto [x, y] = positions[i];
+            float wanted = UNTOUCHED;
+            const bool isFound = tin.GetHeight(x, y, wanted, nullptr, rule);
+            EXPECT_TRUE(isFound ? IsSameBits(heights[i], wanted) : std::isnan(heights[i]))
+                << heights[i] << ", not " << wanted << " at " << x << ", " << y << ", rule " << rule
+                << ", place " << i;
+            found -= isFound ? 1 : 0;
+        }
+        EXPECT_EQ(found, 0U);
+    }
+}
+
 TEST(HeightGrid, AnswersAsTheScanToTheBitOnOddSurfacesInAnyMemory) {
     Random random;
     for (const OddSurface& odd : MakeOddSurfaces(random)) {
@@ -33,6 +70,7 @@ TEST(HeightGrid, AnswersAsTheScanToTheBitOnOddSurfacesInAnyMemory) {
             options.bytesPerTriangle = bytes;
             const HeightGrid grid(tin, options);
             ExpectScan(tin, grid, random, 400);
+            ExpectScanOfRuns(tin, grid, random);
             const std::uint64_t most = std::max(bytes, 110U);
             EXPECT_LT(grid.GetObjBytes(), most * tin.GetTriangleCount() + 25000);
         }

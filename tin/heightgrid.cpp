@@ -1,12 +1,11 @@
 #include "tin/heightgrid.h"
 
-#include "tin/heightgrid/cells.h"
+#include "tin/heightgrid/batch/positionblock.h"
 #include "tin/parallel/parallelbatch.h"
 #include "tin/rules/frame.h"
 #include "tin/tin.h"
 
 #include <algorithm>
-#include <array>
 #include <atomic>
 #include <limits>
 #include <utility>
@@ -16,6 +15,7 @@ namespace kelm::tin {
 namespace {
 
 using heightgrid::Cells;
+using heightgrid::PositionBlock;
 
 constexpr float NOT_A_NUMBER = std::numeric_limits<float>::quiet_NaN();
 /// Positions that are worth a thread.
@@ -27,13 +27,6 @@ BBox<float, point2_t<float>> MakeNowhere() {
     box.min = {NOT_A_NUMBER, NOT_A_NUMBER};
     return box;
 }
-
-/// A position on its way: its record has been asked for.
-struct Approached {
-    float x;
-    float y;
-    const heightgrid::Record* poRecord; ///< null outside the surface's box
-};
 
 } // namespace
 
@@ -80,29 +73,24 @@ std::size_t HeightGrid::GetHeights(const point2_t<double>* positions, std::size_
     return found;
 }
 
-/// Records are asked for well before they are read: a miss to memory takes longer than an answer.
 std::size_t HeightGrid::FindBlock(const point2_t<double>* positions, std::size_t count,
                                   float* heights, EdgeRule eRule) const {
-    constexpr std::size_t AHEAD = 24;
-    const rules::Frame frame(mdfXBase, mdfYBase);
-    std::array<Approached, AHEAD> approached;
-    const auto approach = [&](std::size_t i) {
-        const point2_t<float> p = frame.ToLocal(positions[i]);
-        const bool isInside = TestInside(moBBox, p.x, p.y);
-        return Approached{p.x, p.y, isInside ? &mpoCells->Approach(p.x, p.y) : nullptr};
+    constexpr std::size_t LENGTH = PositionBlock::LENGTH;
+    if (mpoCells == nullptr) {
+        std::fill(heights, heights + count, NOT_A_NUMBER);
+        return 0;
+    }
+    const heightgrid::Ground ground{mdfXBase, mdfYBase, moBBox, mpoCells->GetFrame()};
+    PositionBlock blocks[] = {PositionBlock(ground), PositionBlock(ground)};
+    const auto take = [&](std::size_t block) {
+        const std::size_t first = std::min(block * LENGTH, count);
+        blocks[block % 2].Take(positions + first, std::min(LENGTH, count - first));
     };
-    for (std::size_t i = 0; i < std::min(AHEAD, count); ++i)
-        approached[i] = approach(i);
+    take(0);
     std::size_t found = 0;
-    for (std::size_t i = 0, slot = 0; i < count; ++i, slot = slot + 1 == AHEAD ? 0 : slot + 1) {
-        const Approached p = approached[slot];
-        if (i + AHEAD < count)
-            approached[slot] = approach(i + AHEAD);
-        rules::Highest highest;
-        if (p.poRecord != nullptr)
-            highest = mpoCells->Find(*p.poRecord, p.x, p.y, eRule);
-        heights[i] = highest.IsFound() ? highest.Get() : NOT_A_NUMBER;
-        found += highest.IsFound() ? 1 : 0;
+    for (std::size_t i = 0; i * LENGTH < count; ++i) {
+        take(i + 1);
+        found += blocks[i % 2].Find(*mpoCells, blocks[(i + 1) % 2], heights + i * LENGTH, eRule);
     }
     return found;
 }

@@ -72,13 +72,12 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
         add("sheet", mesh, leave);
     add("empty", {}, leave);
     add("patches", MakePatches(random), leave);
-    Mesh thin = MakeSheet(3, random), small = thin, large = thin, zeros = thin;
+    Mesh thin = MakeSheet(3, random), small = thin, large = thin, zeros = MakeSheet(0, random);
     StretchSheet(thin, 1, 1e-6F);
     StretchSheet(small, 1e-25F, 1e-22F);
     StretchSheet(large, 2e16F, 1e19F);
     for (Point& vertex : zeros.vertices)
         vertex.z = vertex.z > 40 ? -1.0F : vertex.z > 20 ? 0.0F : -0.0F;
-    zeros.ids.insert(zeros.ids.end(), zeros.ids.rbegin(), zeros.ids.rend());
     add("thin", thin, leave);
     add("small", small, leave);
     add("large", large, leave);

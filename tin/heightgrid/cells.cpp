@@ -160,6 +160,39 @@ void Cells::Join(const Tin& tin, const Attempt& attempt, const std::vector<CellB
     moCrowd = Crowd(tin, crowd);
 }
 
+#ifdef __SSE2__
+void Cells::FindLongRun(const Record& record, const Run& run, float* heights,
+                        EdgeRule eRule) const {
+    if (record.eKind == KIND_FRAME)
+        return DivideRun(record, run, heights, eRule);
+    const float none = rules::Highest().Get();
+    std::fill(heights, heights + run.nCount + Run::BEYOND, none);
+    RunProbe probe(run);
+    ForEachOfList(record, [&](const Record& list) { probe.Ask(list, heights); });
+    if (eRule == ER_Float || std::find(heights, heights + run.nCount, none) == heights + run.nCount)
+        return;
+    for (std::size_t i = 0; i < run.nCount; ++i)
+        if (heights[i] == none)
+            heights[i] = FindClosed(record, {run.pfX[i], run.pfY[i]}).Get();
+}
+
+/// Runs of the cells of a cell.
+void Cells::DivideRun(const Record& record, const Run& run, float* heights, EdgeRule eRule) const {
+    const index::CellFrame frame = record.GetFrame();
+    std::size_t first = 0;
+    std::size_t cell = frame.Find(run.pfX[0], run.pfY[0]);
+    while (first < run.nCount) {
+        const std::size_t own = cell;
+        std::size_t last = first + 1;
+        while (last < run.nCount && (cell = frame.Find(run.pfX[last], run.pfY[last])) == own)
+            ++last;
+        FindRun(Record::At(moLines.Get() + record.nNext + own * Record::LINES),
+                {run.pfX + first, run.pfY + first, last - first}, heights + first, eRule);
+        first = last;
+    }
+}
+#endif
+
 rules::Highest Cells::FindFurther(const Record& record, float x, float y, EdgeRule eRule) const {
     const Record* found = &record;
     while (found->eKind == KIND_FRAME)
@@ -171,15 +204,24 @@ rules::Highest Cells::FindFurther(const Record& record, float x, float y, EdgeRu
         return eRule == ER_Float || highest.IsFound() ? highest : moCrowd.Find(x, y, eRule);
     }
     const RecordProbe probe(x, y);
-    const auto forEach = [&](const auto& ask) {
-        for (const Record* next = found; next != nullptr;
-             next = next->nNext == 0 ? nullptr : &Record::At(moLines.Get() + next->nNext))
-            ask(*next);
-    };
-    forEach([&](const Record& list) { probe.Ask(list, highest); });
-    if (eRule == ER_Closed && !highest.IsFound())
-        forEach([&](const Record& list) { probe.AskClosed(list, highest); });
+    ForEachOfList(*found, [&](const Record& list) { probe.Ask(list, highest); });
+    return eRule == ER_Float || highest.IsFound() ? highest : FindClosed(*found, probe);
+}
+
+rules::Highest Cells::FindClosed(const Record& list, const RecordProbe& probe) const {
+    rules::Highest highest;
+    ForEachOfList(list, [&](const Record& part) { probe.AskClosed(part, highest); });
     return highest;
+}
+
+template <typename Ask>
+void Cells::ForEachOfList(const Record& list, const Ask& ask) const {
+    const Record* next = &list;
+    ask(*next);
+    while (next->nNext != 0) {
+        next = &Record::At(moLines.Get() + next->nNext);
+        ask(*next);
+    }
 }
 
 } // namespace kelm::tin::heightgrid

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "tin/heightgrid/batch/edges4.h"
 #include "tin/heightgrid/record.h"
 #include "tin/rules/barycentric.h"
 #include "tin/rules/exactplan.h"
@@ -7,10 +8,6 @@
 
 #include <algorithm>
 #include <cstdint>
-
-#ifdef __SSE2__
-#include <emmintrin.h>
-#endif
 
 namespace kelm::tin::heightgrid {
 
@@ -21,19 +18,25 @@ class RecordProbe {
 
     /// Adds the heights of the triangles of a list that hold the position, in the list's order.
     void Ask(const Record& record, rules::Highest& highest) const {
-        std::uint64_t left = FindCandidates(record);
-        for (; left != 0; left &= left - 1)
-            AskTriangle(record, static_cast<unsigned>(__builtin_ctzll(left)), highest);
+#ifdef __SSE2__
+        AskGroups(record, highest);
+#else
+        for (unsigned i = 0; i < record.nTriangles; ++i)
+            AskTriangle(record, i, highest);
+#endif
     }
     /// The same by the closed rule.
     void AskClosed(const Record& record, rules::Highest& highest) const {
-        for (unsigned i = 0; i < record.nTriangles; ++i) {
-            const Corners corners(record, i);
-            float h;
-            if (IsInBox(corners) &&
-                rules::GetClosedHeight(corners.v0, corners.v1, corners.v2, {mfX, mfY}, h))
-                highest.Add(h);
-        }
+#ifdef __SSE2__
+        std::uint64_t left = FindCandidates(record, [](const Corners4& c, __m128 x, __m128 y) {
+            return _mm_andnot_ps(MakeEdges(c).Exclude(x, y), MakeBoxes(c).Holds(x, y));
+        });
+        for (; left != 0; left &= left - 1)
+            AskTriangleClosed(record, static_cast<unsigned>(__builtin_ctzll(left)), highest);
+#else
+        for (unsigned i = 0; i < record.nTriangles; ++i)
+            AskTriangleClosed(record, i, highest);
+#endif
     }
 
   private:
@@ -54,6 +57,68 @@ class RecordProbe {
                std::max({c.v0.y, c.v1.y, c.v2.y}) >= mfY;
     }
 
+    void AskTriangleClosed(const Record& record, unsigned triangle, rules::Highest& highest) const {
+        const Corners corners(record, triangle);
+        float h;
+        if (IsInBox(corners) &&
+            rules::GetClosedHeight(corners.v0, corners.v1, corners.v2, {mfX, mfY}, h))
+            highest.Add(h);
+    }
+
+#ifdef __SSE2__
+    /// One bit a triangle, by a test that makes a mask of four of them.
+    template <typename Test>
+    std::uint64_t FindCandidates(const Record& record, const Test& test) const {
+        const __m128 x = _mm_set1_ps(mfX);
+        const __m128 y = _mm_set1_ps(mfY);
+        std::uint64_t found = 0;
+        const unsigned groups = record.GetGroupCount();
+        for (unsigned i = 0; i < groups; ++i) {
+            const auto bits =
+                static_cast<unsigned>(_mm_movemask_ps(test(Corners4(record, i), x, y)));
+            found |= std::uint64_t{bits} << (4 * i);
+        }
+        const unsigned unused = 64U - record.nTriangles;
+        return unused < 64U ? found << unused >> unused : 0;
+    }
+
+    /// Most triangles are told by their numerators, which the others need again.
+    void AskGroups(const Record& record, rules::Highest& highest) const {
+        Group groups[Record::MOST_TRIANGLES / 4];
+        Group* group = groups;
+        std::uint64_t found =
+            FindCandidates(record, [&group](const Corners4& corners, __m128 x, __m128 y) {
+                const Edges4 edges = MakeEdges(corners);
+                *group = {edges.Weigh(x, y), edges.size};
+                const __m128 isHeld = TestWeights(group->oWeights, GetMostOfSum(edges.size));
+                ++group;
+                return _mm_andnot_ps(edges.IsFlat(), isHeld);
+            });
+        for (; found != 0; found &= found - 1) {
+            const auto triangle = static_cast<unsigned>(__builtin_ctzll(found));
+            AddWeighted(record, triangle, groups[triangle / 4], highest);
+        }
+    }
+
+    struct Group {
+        Weights4 oWeights;
+        __m128 size;
+    };
+    void AddWeighted(const Record& record, unsigned triangle, const Group& group,
+                     rules::Highest& highest) const {
+        const Corners c(record, triangle);
+        if (!IsInBox(c))
+            return;
+        const auto get = [&](const __m128& v) {
+            return rules::Widen(reinterpret_cast<const float*>(&v)[triangle % 4]);
+        };
+        double l0 = get(group.oWeights.w0);
+        double l1 = get(group.oWeights.w1);
+        double l2;
+        if (rules::DivideWeights(get(group.size), l0, l1, l2))
+            highest.Add(rules::GetWeightedHeight(c.v0.z, c.v1.z, c.v2.z, l0, l1, l2));
+    }
+#else
     void AskTriangle(const Record& record, unsigned triangle, rules::Highest& highest) const {
         const Corners corners(record, triangle);
         rules::Barycentric barycentric(corners.v0, corners.v1, corners.v2);
@@ -66,69 +131,6 @@ class RecordProbe {
         if (barycentric.GetWeights(mfX, l0, l1, l2))
             highest.Add(
                 rules::GetWeightedHeight(corners.v0.z, corners.v1.z, corners.v2.z, l0, l1, l2));
-    }
-
-#ifdef __SSE2__
-    /// One bit a triangle. Left out are those that the inside rule certainly refuses: the
-    /// numerators of its weights, which are computed here as there, to the bit, are compared with
-    /// the determinant instead of divided by it.
-    std::uint64_t FindCandidates(const Record& record) const {
-        const __m128 x = _mm_set1_ps(mfX);
-        const __m128 y = _mm_set1_ps(mfY);
-        std::uint64_t found = 0;
-        const unsigned groups = record.GetGroupCount();
-        for (unsigned i = 0; i < groups; ++i)
-            found |= static_cast<std::uint64_t>(TestGroup(record, i, x, y)) << (4 * i);
-        const unsigned unused = 64U - record.nTriangles;
-        return unused < 64U ? found << unused >> unused : 0;
-    }
-
-    struct Plan {
-        __m128 x;
-        __m128 y;
-    };
-    static __m128 LoadPair(const Record& record, std::uint8_t a, std::uint8_t b) {
-        const auto* first = reinterpret_cast<const __m64*>(record.GetValues(a));
-        const auto* second = reinterpret_cast<const __m64*>(record.GetValues(b));
-        return _mm_loadh_pi(_mm_loadl_pi(_mm_setzero_ps(), first), second);
-    }
-    static Plan Load(const Record& record, unsigned group, unsigned corner) {
-        const std::uint8_t* places = record.GetPlaces(group, corner);
-        const __m128 low = LoadPair(record, places[0], places[1]);
-        const __m128 high = LoadPair(record, places[2], places[3]);
-        return {_mm_shuffle_ps(low, high, _MM_SHUFFLE(2, 0, 2, 0)),
-                _mm_shuffle_ps(low, high, _MM_SHUFFLE(3, 1, 3, 1))};
-    }
-    static unsigned TestGroup(const Record& record, unsigned group, __m128 x, __m128 y) {
-        const Plan v0 = Load(record, group, 0);
-        const Plan v1 = Load(record, group, 1);
-        const Plan v2 = Load(record, group, 2);
-        const __m128 x02 = _mm_sub_ps(v0.x, v2.x);
-        const __m128 y02 = _mm_sub_ps(v0.y, v2.y);
-        const __m128 x12 = _mm_sub_ps(v1.x, v2.x);
-        const __m128 y12 = _mm_sub_ps(v1.y, v2.y);
-        const __m128 px = _mm_sub_ps(x, v2.x);
-        const __m128 py = _mm_sub_ps(y, v2.y);
-        const __m128 det = _mm_sub_ps(_mm_mul_ps(x02, y12), _mm_mul_ps(x12, y02));
-        const __m128 n0 = _mm_sub_ps(_mm_mul_ps(px, y12), _mm_mul_ps(x12, py));
-        const __m128 n1 = _mm_sub_ps(_mm_mul_ps(py, x02), _mm_mul_ps(y02, px));
-        return TestWeights(det, n0, n1);
-    }
-    /// A NaN fails each comparison and so stays.
-    static unsigned TestWeights(__m128 det, __m128 n0, __m128 n1) {
-        const __m128 sign = _mm_and_ps(det, _mm_set1_ps(-0.0F));
-        const __m128 size = _mm_xor_ps(det, sign);
-        const __m128 w0 = _mm_xor_ps(n0, sign);
-        const __m128 w1 = _mm_xor_ps(n1, sign);
-        const __m128 most = _mm_mul_ps(size, _mm_set1_ps(1.0F + 0x1p-20F));
-        const __m128 refused = _mm_or_ps(
-            _mm_or_ps(_mm_cmplt_ps(w0, _mm_setzero_ps()), _mm_cmplt_ps(w1, _mm_setzero_ps())),
-            _mm_cmpgt_ps(_mm_add_ps(w0, w1), most));
-        return static_cast<unsigned>(_mm_movemask_ps(refused)) ^ 0xFU;
-    }
-#else
-    std::uint64_t FindCandidates(const Record& record) const {
-        return record.nTriangles == 0 ? 0 : ~std::uint64_t{0} >> (64U - record.nTriangles);
     }
 #endif
 

@@ -22,6 +22,15 @@ inline float GetWeightedHeight(float z0, float z1, float z2, double l0, double l
     return static_cast<float>((Widen(z1) * l1 + Widen(z0) * l0) + Widen(z2) * l2);
 }
 
+/// The inside rule, of numerators whose signs are changed if that of the determinant is.
+/// @param l0,l1 numerators, and then the weights
+inline bool DivideWeights(double det, double& l0, double& l1, double& l2) {
+    l0 /= det;
+    l1 /= det;
+    l2 = (1.0 - l0) - l1;
+    return !(l0 > 1.0 || 0.0 > l0 || l1 > 1.0 || 0.0 > l1 || l2 > 1.0 || 0.0 > l2);
+}
+
 /// The inside rule: barycentric weights of positions in one triangle, in plan, row by row.
 ///
 /// Differences, products and numerators are `float`, so that what a triangle and a row share is
