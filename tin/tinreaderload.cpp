@@ -140,7 +140,8 @@ Tin* TinReader::Load(const Window* poWindow, const LoadOptions& oOptions) {
         return nullptr;
     const ScopedLock lock(moMutex);
     const ToldWindow told(mpLayer, poWindow);
-    load::Welder corners(mnShapeCount);
+    const bool isPart = poWindow != nullptr;
+    load::Welder corners(isPart ? EstimateShapeCount(*poWindow) : mnShapeCount, isPart);
     ReadMeter meter(oOptions.progress, mnShapeCount);
     for (int id = ZARGetNext(mpLayer, -1); id != -1; id = ZARGetNext(mpLayer, id)) {
         meter.Count();

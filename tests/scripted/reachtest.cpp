@@ -64,6 +64,44 @@ TEST(ReachTest, MeetsEveryBoxThatCanHoldACrossing) {
     }
 }
 
+// Boxes at all distances, which the segment misses by the margin less what the test itself may
+// lose.
+TEST(ReachTest, MeetsEveryCrowdedBoxThatCanHoldACrossing) {
+    constexpr double U = 0x1p-24;
+    constexpr float INF = std::numeric_limits<float>::infinity();
+    Random random;
+    const auto any = [&] {
+        return std::exp2(random.Between(-60, 10)) * (random.Below(2) == 0 ? 1.0F : -1.0F);
+    };
+    unsigned missed = 0;
+    for (unsigned n = 0; n < 100000 && !HasFailure(); ++n) {
+        const Point a{any(), any(), 0}, b{a.x + any(), a.y + any(), 0};
+        Node node;
+        for (unsigned lane = 0; lane < WIDTH; ++lane) {
+            const double t = std::exp2(double(random.Between(-40, 0)));
+            float planes[6] = {0, 0, 0, 0, 0, 0};
+            const auto setAxis = [&](unsigned axis, float from, float to) {
+                const double at = double(from) + t * (double(to) - double(from));
+                const double most = 26.0 * U * std::fabs(at - double(from));
+                const auto beside =
+                    static_cast<float>(random.Below(2) == 0 ? at - most : at + most);
+                const auto near = static_cast<float>(at);
+                const bool isBeside = std::fabs(double(beside) - at) <= most;
+                missed += isBeside && double(beside) != at;
+                planes[axis] = isBeside ? beside : std::nextafter(near, -INF);
+                planes[axis + 3] = isBeside ? beside : std::nextafter(near, INF);
+            };
+            setAxis(0, a.x, b.x);
+            setAxis(1, a.y, b.y);
+            SetBox(node, lane, planes);
+        }
+        PlanProbe probe;
+        probe.Set(a, b);
+        EXPECT_EQ(probe.Test(node), 0xFFU) << a.x << " " << a.y << " to " << b.x << " " << b.y;
+    }
+    EXPECT_GT(missed, 100000U);
+}
+
 /// The height of the plane of a triangle.
 double GetPlaneHeight(const Triangle& t, const Point2& p) {
     const Point &v0 = *t.GetVertex(0), &v1 = *t.GetVertex(1), &v2 = *t.GetVertex(2);

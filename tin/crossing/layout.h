@@ -87,6 +87,9 @@ struct Index {
     float extent = 0.0F; ///< the longest side of a triangle's box in space
     float low = 0.0F;    ///< height range of the triangles
     float high = 0.0F;
+    /// Are so many triangles small against the surface that margins of its size would hold them
+    /// all?
+    bool isCrowded = false;
     std::vector<unsigned> roots; ///< numbers of nodes
     unsigned groups = 0;         ///< nodes of blocks
     Array<Node> nodes;

@@ -55,6 +55,56 @@ class SlabProbe {
     Axis maoAxes[3];
 };
 
+/// A segment to be tested against boxes in plan, with a margin that is a share of the distance of a
+/// box from the start of the segment. So boxes that crowd near the start are told apart, however
+/// small they are. A test costs more than that of SlabProbe.
+class PlanProbe {
+  public:
+    void Set(const point3_t<float>& a, const point3_t<float>& b) {
+        SetAxis(0, a.x, b.x - a.x);
+        SetAxis(1, a.y, b.y - a.y);
+    }
+
+    /// @return as above
+    unsigned Test(const Node& node) const { return TestFour(node, 0) | TestFour(node, 4) << 4; }
+
+  private:
+    /// docs/guide/exactness.md proves it.
+    static constexpr float MARGIN = 0x1p-19F;
+    static constexpr float LEAST = 0x1p-100F; ///< so that no margin underflows
+
+    struct Axis {
+        Float4 origin;
+        Float4 inverse;
+        bool isBackward;
+    };
+
+    void SetAxis(unsigned axis, float origin, float direction) {
+        const float inverse = 1.0F / direction;
+        maoAxes[axis] = {Fill4(origin), Fill4(inverse), 0.0F > inverse};
+    }
+
+    unsigned TestFour(const Node& node, unsigned lane) const {
+        Float4 first = Fill4(0.0F);
+        Float4 last = Fill4(1.0F);
+        Mask4 isMissed = Load4(node.planes[0] + lane) > Load4(node.planes[3] + lane); // no child
+        for (unsigned i = 0; i < 2; ++i) {
+            const Axis& axis = maoAxes[i];
+            const Float4 low = Load4(node.planes[i] + lane) - axis.origin;
+            const Float4 high = Load4(node.planes[i + 3] + lane) - axis.origin;
+            const Float4 margin = Fill4(MARGIN) * Greatest(Size(low), Size(high)) + Fill4(LEAST);
+            const Float4 from = low - margin;
+            const Float4 to = high + margin;
+            // A NaN must leave the interval open, as in SlabProbe.
+            first = Greatest((axis.isBackward ? to : from) * axis.inverse, first);
+            last = Least((axis.isBackward ? from : to) * axis.inverse, last);
+        }
+        return GetBits(isMissed | (first > last)) ^ 0xFU;
+    }
+
+    Axis maoAxes[2];
+};
+
 /// A segment to be tested by its box in plan alone, by the comparisons that open the rule itself.
 /// So it needs no margin, and holds for ends that are infinite or NaN.
 class BoxProbe {

@@ -46,7 +46,10 @@ void Walk::Start(const Index& index, const point3_t<float>& a, const point3_t<fl
     mpoIndex = &index;
     moA = a;
     moB = b;
-    moSlabs.Set(reach, a, b);
+    if (index.isCrowded)
+        moPlan.Set(a, b);
+    else
+        moSlabs.Set(reach, a, b);
     moBox = BoxProbe(a, b);
     mbBounded = reach.isBounded;
     moFilter = Filter(a, b, reach.isFilterable);
@@ -103,7 +106,9 @@ void Walk::Push(unsigned node) {
 }
 
 unsigned Walk::Test(const Node& node) const {
-    return mbBounded ? moSlabs.Test(node) : moBox.Test(node);
+    if (!mbBounded)
+        return moBox.Test(node);
+    return mpoIndex->isCrowded ? moPlan.Test(node) : moSlabs.Test(node);
 }
 
 void Walk::TestBlock(unsigned number) {

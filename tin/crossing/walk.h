@@ -81,6 +81,7 @@ class Walk {
     point3_t<float> moA;
     point3_t<float> moB;
     SlabProbe moSlabs;
+    PlanProbe moPlan;
     BoxProbe moBox;
     bool mbBounded = false;
     Filter moFilter;

@@ -1,7 +1,11 @@
 #include "tin/heightgrid/crowd.h"
 
 #include "tin/index/leafwalk.h"
+#include "tin/index/prefetch.h"
 #include "tin/rules/exactplan.h"
+
+#include <array>
+#include <cstddef>
 
 namespace kelm::tin::heightgrid {
 
@@ -41,11 +45,58 @@ class FirstHighest {
     unsigned mnId = 0;
 };
 
+/// Triangles of some leaves, whose memory is fetched together: leaves that follow each other go
+/// back in memory, which no processor foresees.
+class Candidates {
+  public:
+    Candidates(const Tin& surface, float x, float y, EdgeRule eRule)
+        : mrSurface(surface), mfX(x), mfY(y), meRule(eRule) {}
+
+    void Add(unsigned id) {
+        const auto* triangle = reinterpret_cast<const char*>(mrSurface.GetTriangle(id));
+        index::Prefetch(triangle);
+        index::Prefetch(triangle + sizeof(Triangle) - 1);
+        maWaiting[mnWaiting++] = id;
+        if (mnWaiting == maWaiting.size())
+            Ask();
+    }
+    /// Puts the position to all that wait.
+    void Ask();
+    const rules::Highest& GetHighest() const { return moHighest.Get(); }
+
+  private:
+    const Tin& mrSurface;
+    float mfX;
+    float mfY;
+    EdgeRule meRule;
+    FirstHighest moHighest;
+    std::array<unsigned, 64> maWaiting;
+    std::size_t mnWaiting = 0;
+};
+
 bool GetHeight(const Triangle& triangle, float x, float y, EdgeRule eRule, float& h) {
     if (eRule == ER_Float)
         return triangle.GetHeight(x, y, h);
     return rules::GetClosedHeight(*triangle.GetVertex(0), *triangle.GetVertex(1),
                                   *triangle.GetVertex(2), {x, y}, h);
+}
+
+void Candidates::Ask() {
+    std::size_t near = 0;
+    for (std::size_t i = 0; i < mnWaiting; ++i) {
+        const Triangle& triangle = *mrSurface.GetTriangle(maWaiting[i]);
+        if (!TestInside(triangle.GetBBox(), mfX, mfY))
+            continue;
+        for (int k = 0; k < 3; ++k)
+            index::Prefetch(triangle.GetVertex(k));
+        maWaiting[near++] = maWaiting[i];
+    }
+    for (std::size_t i = 0; i < near; ++i) {
+        float h;
+        if (GetHeight(*mrSurface.GetTriangle(maWaiting[i]), mfX, mfY, meRule, h))
+            moHighest.Add(h, maWaiting[i]);
+    }
+    mnWaiting = 0;
 }
 
 } // namespace
@@ -63,22 +114,19 @@ Crowd::Crowd(const Tin& tin, const std::vector<unsigned>& ids) {
 }
 
 rules::Highest Crowd::Find(float x, float y, EdgeRule eRule) const {
-    FirstHighest highest;
     if (mpoTree == nullptr)
-        return highest.Get();
+        return {};
+    Candidates candidates(*mpoSurface, x, y, eRule);
     const auto holds = [=](const BBox<float, point2_t<float>>& box) {
         return TestInside(box, x, y);
     };
-    const auto ask = [&](const std::vector<unsigned>& leaves) {
-        for (const unsigned id : leaves) {
-            const Triangle& triangle = *mpoSurface->GetTriangle(id);
-            float h;
-            if (holds(triangle.GetBBox()) && GetHeight(triangle, x, y, eRule, h))
-                highest.Add(h, id);
-        }
-    };
-    index::VisitLeaves(static_cast<const AabbNode*>(mpoTree->GetRoot()), holds, ask);
-    return highest.Get();
+    index::VisitLeaves(static_cast<const AabbNode*>(mpoTree->GetRoot()), holds,
+                       [&](const std::vector<unsigned>& leaves) {
+                           for (const unsigned id : leaves)
+                               candidates.Add(id);
+                       });
+    candidates.Ask();
+    return candidates.GetHighest();
 }
 
 std::uint64_t Crowd::GetBytes() const {

@@ -70,7 +70,7 @@ std::uint32_t GetTag(std::uint64_t hash) {
 
 CornerHash::CornerHash(std::size_t corners) {
     // A sheet keeps a sixth of its corners and those of its rim; other layers make the table grow.
-    std::size_t slots = 64;
+    std::size_t slots = 1024;
     while (slots < corners / 3 + corners / 100)
         slots *= 2;
     moSlots = memory::CreateLargeList(slots, Slot{NONE, 0});

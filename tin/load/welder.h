@@ -20,8 +20,8 @@ namespace kelm::tin::load {
 /// welds them at the end.
 class Welder {
   public:
-    /// @param shapeCount shapes of the layer, 0 or more
-    explicit Welder(int shapeCount);
+    /// @param shapeCount shapes that may come, 0 or more @param isPart can it be far fewer?
+    Welder(int shapeCount, bool isPart);
 
     /// Adds the triangle of a shape's first three vertices.
     /// @throw std::length_error beyond 2147483647 corners; std::bad_alloc

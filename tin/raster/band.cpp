@@ -3,6 +3,7 @@
 #include "tin/rules/exactplan.h"
 
 #include <algorithm>
+#include <cmath>
 #include <limits>
 
 namespace kelm::tin::raster {
@@ -69,9 +70,16 @@ std::size_t Band::Fill(EdgeRule eRule) const {
     VisitTriangles([&](const Triangle& triangle, std::size_t first, std::size_t last) {
         AddTriangle(triangle, first, last);
     });
-    if (eRule == ER_Closed)
-        Close(CountMissed());
-    return Finish();
+    std::size_t found = 0;
+    std::vector<Gaps> gaps;
+    for (std::size_t row = mnFirst; row < mnLast; ++row) {
+        const std::size_t foundHere = Finish(row);
+        found += foundHere;
+        if (eRule == ER_Closed)
+            gaps.push_back(FindGaps(row, foundHere));
+    }
+    const bool isMissed = found < (mnLast - mnFirst) * mrSheet.oCols.GetCount();
+    return eRule == ER_Closed && isMissed ? found + Close(gaps) : found;
 }
 
 void Band::AddTriangle(const Triangle& triangle, std::size_t first, std::size_t last) const {
@@ -97,59 +105,59 @@ void Band::AddTriangle(const Triangle& triangle, std::size_t first, std::size_t 
     addRows([&](float y, const auto& add) { VisitParts(clip, xs, y, cols.first, cols.last, add); });
 }
 
-/// @return for each row of the band the cells without a height; empty if there are none at all
-std::vector<std::size_t> Band::CountMissed() const {
-    std::vector<std::size_t> counts;
-    bool isAnyMissed = false;
-    for (std::size_t row = mnFirst; row < mnLast; ++row) {
-        const float* cells = mrSheet.GetRow(row);
-        const auto missed = std::count(cells, cells + mrSheet.oCols.GetCount(), NONE);
-        counts.push_back(static_cast<std::size_t>(missed));
-        isAnyMissed |= missed > 0;
+/// Marks the cells of a row that have no height. @return the number of the others
+std::size_t Band::Finish(std::size_t row) const {
+    float* cells = mrSheet.GetRow(row);
+    std::size_t found = 0;
+    for (std::size_t col = 0; col < mrSheet.oCols.GetCount(); ++col) {
+        const bool isFound = cells[col] > NONE;
+        found += isFound ? 1 : 0;
+        cells[col] = isFound ? cells[col] : std::numeric_limits<float>::quiet_NaN();
     }
-    return isAnyMissed ? counts : std::vector<std::size_t>();
+    return found;
 }
 
-void Band::FindClosed(const Triangle& triangle, std::size_t row,
+Band::Gaps Band::FindGaps(std::size_t row, std::size_t found) const {
+    const float* cells = mrSheet.GetRow(row);
+    const std::size_t count = mrSheet.oCols.GetCount();
+    Gaps gaps{0, count, false};
+    while (gaps.left < count && std::isnan(cells[gaps.left]))
+        ++gaps.left;
+    while (gaps.right > gaps.left && std::isnan(cells[gaps.right - 1]))
+        --gaps.right;
+    gaps.isInside = gaps.right - gaps.left > found;
+    return gaps;
+}
+
+void Band::FindClosed(const Triangle& triangle, std::size_t row, Axis::Range cols,
                       std::vector<Closed>& rFound) const {
-    const BBox<float, point2_t<float>> box = mrSheet.GetBox(triangle);
-    const Axis::Range cols = mrSheet.oCols.Find(box.min.x, box.max.x);
     float* cells = mrSheet.GetRow(row);
     for (std::size_t col = cols.first; col < cols.last; ++col) {
         const point2_t<float> centre{mrSheet.oCols.GetValues()[col],
                                      mrSheet.oRows.GetValues()[row]};
         float h;
-        if (cells[col] == NONE &&
+        if (std::isnan(cells[col]) &&
             rules::GetClosedHeight(*triangle.GetVertex(0), *triangle.GetVertex(1),
-                                   *triangle.GetVertex(2), centre, h))
+                                   *triangle.GetVertex(2), centre, h) &&
+            h > NONE)
             rFound.push_back({&cells[col], h});
     }
 }
 
-/// Puts the cells that the weights have left to the closed rule.
-void Band::Close(const std::vector<std::size_t>& missed) const {
-    if (missed.empty())
-        return;
-    std::vector<Closed> found;
+/// Puts the cells that the weights have left to the closed rule. @return those that get a height
+std::size_t Band::Close(const std::vector<Gaps>& gaps) const {
+    std::vector<Closed> closed;
     VisitTriangles([&](const Triangle& triangle, std::size_t first, std::size_t last) {
+        const BBox<float, point2_t<float>> box = mrSheet.GetBox(triangle);
+        const Axis::Range cols = mrSheet.oCols.Find(box.min.x, box.max.x);
         for (std::size_t row = first; row < last; ++row)
-            if (missed[row - mnFirst] > 0)
-                FindClosed(triangle, row, found);
+            if (gaps[row - mnFirst].AreMet(cols))
+                FindClosed(triangle, row, cols, closed);
     });
-    for (const Closed& closed : found)
-        if (closed.fHeight > *closed.pfCell)
-            *closed.pfCell = closed.fHeight;
-}
-
-std::size_t Band::Finish() const {
     std::size_t found = 0;
-    for (std::size_t row = mnFirst; row < mnLast; ++row) {
-        float* cells = mrSheet.GetRow(row);
-        for (std::size_t col = 0; col < mrSheet.oCols.GetCount(); ++col) {
-            const bool isFound = cells[col] > NONE;
-            found += isFound ? 1 : 0;
-            cells[col] = isFound ? cells[col] : std::numeric_limits<float>::quiet_NaN();
-        }
+    for (const auto& [cell, height] : closed) {
+        found += std::isnan(*cell) ? 1 : 0;
+        *cell = std::isnan(*cell) ? height : std::max(*cell, height);
     }
     return found;
 }

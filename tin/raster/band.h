@@ -42,13 +42,25 @@ class Band {
         float fHeight;
     };
 
+    /// Where the cells of a row are that have no height. Most rows have some at both ends alone.
+    struct Gaps {
+        std::size_t left = 0;  ///< cells without one at the start of the row
+        std::size_t right = 0; ///< the first of those at its end
+        bool isInside = false; ///< are there others?
+
+        bool AreMet(const Axis::Range& cols) const {
+            return isInside || cols.first < left || cols.last > right;
+        }
+    };
+
     template <typename Visit>
     void VisitTriangles(const Visit& visit) const;
     void AddTriangle(const Triangle& triangle, std::size_t first, std::size_t last) const;
-    std::vector<std::size_t> CountMissed() const;
-    void FindClosed(const Triangle& triangle, std::size_t row, std::vector<Closed>& rFound) const;
-    void Close(const std::vector<std::size_t>& missed) const;
-    std::size_t Finish() const;
+    void FindClosed(const Triangle& triangle, std::size_t row, Axis::Range cols,
+                    std::vector<Closed>& rFound) const;
+    std::size_t Close(const std::vector<Gaps>& gaps) const;
+    std::size_t Finish(std::size_t row) const;
+    Gaps FindGaps(std::size_t row, std::size_t found) const;
 
     const Sheet& mrSheet;
     std::size_t mnFirst;

@@ -24,10 +24,19 @@ class RowWalk {
     /// @param box of the triangle, as far as it lies in that of the surface
     RowWalk(const Triangle& triangle, const BBox<float, point2_t<float>>& box)
         : mrV0(*triangle.GetVertex(0)), mrV1(*triangle.GetVertex(1)), mrV2(*triangle.GetVertex(2)),
-          moBarycentric(mrV0, mrV1, mrV2), mfLow(box.min.x), mfHigh(box.max.x) {}
+          moBarycentric(mrV0, mrV1, mrV2), mfLow(box.min.x), mfHigh(box.max.x) {
+#ifdef __SSE2__
+        mfDeterminant = static_cast<float>(moBarycentric.GetDeterminant());
+        mbFinite = IsFinite();
+#endif
+    }
 
-    bool IsFlat() const { return moBarycentric.IsFlat(); }
-    bool IsFinite() const { return std::isfinite(moBarycentric.GetDeterminant()); }
+    bool IsFlat() const {
+        return moBarycentric.IsFlat();
+    }
+    bool IsFinite() const {
+        return std::isfinite(moBarycentric.GetDeterminant());
+    }
 
     void SetRow(float y) {
         moBarycentric.SetRow(y);
@@ -77,12 +86,21 @@ class RowWalk {
             _mm_add_ps(_mm_mul_ps(_mm_set1_ps(mrV2.y - mrV0.y), right), _mm_set1_ps(mfRow1));
         const __m128 inBox =
             _mm_and_ps(_mm_cmpge_ps(x, _mm_set1_ps(mfLow)), _mm_cmple_ps(x, _mm_set1_ps(mfHigh)));
+        if (mbFinite &&
+            _mm_movemask_ps(_mm_andnot_ps(_mm_or_ps(IsNegative(n0), IsNegative(n1)), inBox)) == 0)
+            return;
         const __m128 heights = _mm_movelh_ps(
             GetHeights(_mm_cvtps_pd(n0), _mm_cvtps_pd(n1)),
             GetHeights(_mm_cvtps_pd(_mm_movehl_ps(n0, n0)), _mm_cvtps_pd(_mm_movehl_ps(n1, n1))));
         const __m128 before = _mm_loadu_ps(cells);
         const __m128 higher = _mm_and_ps(inBox, _mm_cmpgt_ps(heights, before));
         _mm_storeu_ps(cells, _mm_or_ps(_mm_and_ps(higher, heights), _mm_andnot_ps(higher, before)));
+    }
+    /// @return mask of the weights that are below 0, for a finite determinant: a quotient has the
+    /// sign that those of its parts tell, and is 0 only if the numerator is
+    __m128 IsNegative(__m128 numerator) const {
+        const __m128 sign = _mm_and_ps(_mm_set1_ps(mfDeterminant), _mm_set1_ps(-0.0F));
+        return _mm_cmplt_ps(_mm_xor_ps(numerator, sign), _mm_setzero_ps());
     }
     /// @return two heights in the low half; NaN, which is above nothing, outside the triangle
     __m128 GetHeights(__m128d n0, __m128d n1) const {
@@ -104,6 +122,8 @@ class RowWalk {
 
     float mfRow0 = 0.0F;
     float mfRow1 = 0.0F;
+    float mfDeterminant;
+    bool mbFinite;
 #endif
 
     const point3_t<float>& mrV0;

@@ -82,6 +82,7 @@ void Builder::Gather() {
     moIndex.extent = GetLongest(all.sides);
     moIndex.low = GetZ(all.bounds.low);
     moIndex.high = GetZ(all.bounds.high);
+    moIndex.isCrowded = IsCrowded(all);
     Reference* const end = moReferences.GetData() + count;
     Reference* const loose = SortOut(moReferences.GetData(), end, K_Tight, all);
     AddTree(moReferences.GetData(), loose);
@@ -89,6 +90,24 @@ void Builder::Gather() {
     Reference* const stale = SortOut(loose, end, K_Loose, all);
     AddTree(loose, stale);
     AddStale(stale, SortOut(stale, end, K_Stale, all));
+}
+
+/// Looks at some thousands of the references.
+bool Builder::IsCrowded(const Summary& summary) const {
+    constexpr float SMALL = 0x1p-17F;
+    constexpr std::size_t SOME = 4096;
+    float sides[4];
+    summary.bounds.GetSides(sides);
+    const float small = SMALL * std::max(sides[0], sides[1]);
+    const std::size_t count = mrSurface.GetTriangleCount();
+    const std::size_t step = count / SOME + 1;
+    std::size_t seen = 0;
+    std::size_t found = 0;
+    for (std::size_t i = 0; i < count; i += step, ++seen) {
+        const Reference& r = moReferences[i];
+        found += r.kind <= K_Loose && std::max(r.high[0] - r.low[0], r.high[1] - r.low[1]) < small;
+    }
+    return found > seen / 8;
 }
 
 Summary Builder::GatherPart(std::size_t first, std::size_t last) const {
@@ -147,7 +166,7 @@ std::vector<Builder::Range> Builder::DivideTop() const {
                 parts[2 * i] = range;
                 if (range.count < WORTH_A_THREAD)
                     continue;
-                const std::size_t left = Divide(range.first, range.count);
+                const std::size_t left = Divide(range.first, range.count, GetAxes());
                 moLefts[range.place] = static_cast<unsigned>(left / GROUP);
                 range.Split(left, parts[2 * i], parts[2 * i + 1]);
             }
@@ -162,7 +181,7 @@ std::vector<Builder::Range> Builder::DivideTop() const {
 
 void Builder::FillBelow(Range range) const {
     while (range.count > GROUP) {
-        const std::size_t left = Divide(range.first, range.count);
+        const std::size_t left = Divide(range.first, range.count, GetAxes());
         moLefts[range.place] = static_cast<unsigned>(left / GROUP);
         Range small;
         Range rest;
@@ -178,10 +197,10 @@ void Builder::FillBelow(Range range) const {
 namespace {
 
 /// Sorts the references of one group into blocks.
-void SortIntoBlocks(Reference* first, std::size_t count) {
+void SortIntoBlocks(Reference* first, std::size_t count, unsigned axes) {
     while (count > WIDTH) {
-        const std::size_t left = Divide(first, count);
-        SortIntoBlocks(first, left);
+        const std::size_t left = Divide(first, count, axes);
+        SortIntoBlocks(first, left, axes);
         first += left;
         count -= left;
     }
@@ -191,7 +210,7 @@ void SortIntoBlocks(Reference* first, std::size_t count) {
 
 void Builder::FillGroup(const Range& range) const {
     constexpr float INFINITE = std::numeric_limits<float>::infinity();
-    SortIntoBlocks(range.first, range.count);
+    SortIntoBlocks(range.first, range.count, GetAxes());
     Node& node = moIndex.nodes[range.group];
     for (unsigned k = 0; k < WIDTH; ++k) {
         const std::size_t from = std::min<std::size_t>(std::size_t{k} * WIDTH, range.count);

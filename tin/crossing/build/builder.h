@@ -55,6 +55,9 @@ class Builder {
 
     void Gather();
     Summary GatherPart(std::size_t first, std::size_t last) const;
+    bool IsCrowded(const Summary& summary) const;
+    /// A crowded surface is searched by boxes in plan.
+    unsigned GetAxes() const { return moIndex.isCrowded ? 2 : 3; }
     void AddTree(Reference* first, Reference* last);
     void AddStale(const Reference* first, const Reference* last);
     void FillAll();

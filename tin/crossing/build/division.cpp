@@ -26,10 +26,11 @@ struct Less {
     }
 };
 
-/// The axis on which the centres spread most, and how they fall into bins on it.
+/// The axis on which the centres spread most, of the first two or all three, and how they fall into
+/// bins on it.
 class Spread {
   public:
-    Spread(const Reference* first, std::size_t count) {
+    Spread(const Reference* first, std::size_t count, unsigned axes) {
         Bounds centers;
         for (const Reference* r = first; r != first + count; ++r) {
             const float* values = reinterpret_cast<const float*>(r);
@@ -38,7 +39,7 @@ class Spread {
         }
         float sides[4];
         centers.GetSides(sides);
-        mnAxis = static_cast<unsigned>(std::max_element(sides, sides + 3) - sides);
+        mnAxis = static_cast<unsigned>(std::max_element(sides, sides + axes) - sides);
         float low[4];
         Store4(low, centers.low);
         mfLow = low[mnAxis];
@@ -66,17 +67,19 @@ struct Bin {
         bounds.Add(other.bounds);
         count += other.count;
     }
-    /// What a visit costs: the surface of the box by the number of triangles.
-    float GetCost() const {
+    /// What a visit costs: the surface of the box by the number of triangles; in plan its sides.
+    float GetCost(unsigned axes) const {
         float s[4];
         bounds.GetSides(s);
-        return (s[0] * s[1] + s[1] * s[2] + s[2] * s[0]) * static_cast<float>(count);
+        const float size = axes == 2 ? s[0] + s[1] : s[0] * s[1] + s[1] * s[2] + s[2] * s[0];
+        return size * static_cast<float>(count);
     }
 };
 
 /// @return the number of references below the border of bins where both sides cost least together;
 /// the half if no border lies within the middle
-std::size_t FindCut(const Reference* first, std::size_t count, const Spread& spread) {
+std::size_t FindCut(const Reference* first, std::size_t count, const Spread& spread,
+                    unsigned axes) {
     std::array<Bin, BINS> bins;
     for (const Reference* r = first; r != first + count; ++r) {
         Bin& bin = bins[spread.GetBin(*r)];
@@ -87,14 +90,14 @@ std::size_t FindCut(const Reference* first, std::size_t count, const Spread& spr
     Bin behind;
     for (unsigned i = BINS - 1; i > 0; --i) {
         behind.Add(bins[i]);
-        right[i] = behind.GetCost();
+        right[i] = behind.GetCost(axes);
     }
     std::size_t cut = count / 2;
     float least = std::numeric_limits<float>::max();
     Bin before;
     for (unsigned i = 1; i < BINS; ++i) {
         before.Add(bins[i - 1]);
-        const float cost = before.GetCost() + right[i];
+        const float cost = before.GetCost(axes) + right[i];
         if (cost < least && before.count >= count / 4 && before.count <= count - count / 4) {
             least = cost;
             cut = before.count;
@@ -105,10 +108,10 @@ std::size_t FindCut(const Reference* first, std::size_t count, const Spread& spr
 
 } // namespace
 
-std::size_t Divide(Reference* first, std::size_t count) {
+std::size_t Divide(Reference* first, std::size_t count, unsigned axes) {
     const std::size_t step = count > GROUP ? GROUP : WIDTH;
-    const Spread spread(first, count);
-    const std::size_t cut = count > GROUP ? FindCut(first, count, spread) : count / 2;
+    const Spread spread(first, count, axes);
+    const std::size_t cut = count > GROUP ? FindCut(first, count, spread, axes) : count / 2;
     const std::size_t left =
         std::clamp((cut + step / 2) / step * step, step, (count - 1) / step * step);
     std::nth_element(first, first + left, first + count, Less{spread.GetAxis()});
