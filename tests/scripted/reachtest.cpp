@@ -86,7 +86,9 @@ TEST(ReachTest, MeetsEveryCrowdedBoxThatCanHoldACrossing) {
                 const auto beside =
                     static_cast<float>(random.Below(2) == 0 ? at - most : at + most);
                 const auto near = static_cast<float>(at);
-                const bool isBeside = std::fabs(double(beside) - at) <= most;
+                // `at` must be exact enough to be missed on purpose.
+                const bool isBeside = std::fabs(double(beside) - at) <= most &&
+                                      std::fabs(at - double(from)) > 0x1p-20 * std::fabs(at);
                 missed += isBeside && double(beside) != at;
                 planes[axis] = isBeside ? beside : std::nextafter(near, -INF);
                 planes[axis + 3] = isBeside ? beside : std::nextafter(near, INF);
