@@ -98,6 +98,10 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
         const float e = i * 1e34F;
         return Trio{{{LOWEST, e, -LOWEST}, {LOWEST * -1, LOWEST, 1}, {e, LOWEST, 2}}};
     });
+    addEach("infinite determinants", 60, [](float i) {
+        const float e = 2e19F + i * 1e17F;
+        return Trio{{{std::fmod(i, 2.0F) < 1 ? e : -e, 0, 1}, {0, e, 2}, {0, -e, i}}};
+    });
     addEach("crowded corner", 700, [](float i) {
         const float at = std::exp2(std::floor(i / 2) - 125), x = std::fmod(i, 2.0F) * at;
         return Trio{{{x, at - x, 1}, {x * 1.25F, at - x, i}, {x, (at - x) * 1.25F, 1}}};
