@@ -26,8 +26,7 @@ void MakeRoom(std::vector<T>& list, std::size_t count, std::size_t step) {
 /// Room that is reserved costs nothing until it is used, but a table of the hash is filled at once.
 /// That of a part grows with it.
 Welder::Welder(int shapeCount, bool isPart)
-    : mpoHash(
-          std::make_unique<CornerHash>(isPart ? 0 : 3 * static_cast<std::size_t>(shapeCount))) {
+    : mpoHash(std::make_unique<CornerHash>(isPart ? 0 : 3 * static_cast<std::size_t>(shapeCount))) {
     memory::ReserveLarge(moIds, static_cast<std::size_t>(shapeCount));
 }
 
