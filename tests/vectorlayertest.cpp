@@ -299,10 +299,11 @@ TEST_F(VectorLayerTest, TheBytesOfAGeoPackageGiveWhatItsGeometriesGive) {
             for (const Bytes& blob : MakeBlobs())
                 for (int n = 0; n <= nTriangles; ++n) {
                     const Bytes& row = n == 0 ? blob : MakeBlob(1, 1003);
-                    const CPLString hex(CPLBinaryToHex(static_cast<int>(row.size()), row.data()));
+                    const std::unique_ptr<char, decltype(&CPLFree)> hex(
+                        CPLBinaryToHex(static_cast<int>(row.size()), row.data()), CPLFree);
                     poDataset->ExecuteSQL(
-                        ("INSERT INTO facets (geom) VALUES (x'" + hex + "')").c_str(), nullptr,
-                        nullptr);
+                        FormatString("INSERT INTO facets (geom) VALUES (x'%s')", hex.get()).c_str(),
+                        nullptr, nullptr);
                 }
             poDataset->CommitTransaction();
         }
