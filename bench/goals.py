@@ -27,7 +27,8 @@ CAUSES = {
                   "three million corners, and writes vertices and triangles",
     "closed": "What is missed has its price. The rows hold positions beside the terrain, which the "
               "exact rule must refuse: 0.3 % (100k), 0.9 % (10k) and 5.4 % (jacksboro) of them. "
-              "Where next to nothing is missed, at random on 1M and 4M, the bound holds",
+              "At random on 1M and 4M, where next to nothing is missed, the bound holds. Why "
+              "scanlines there cost 3 % is not known",
     "raster-call": "The time is that of the inside rule in double for each cell, two cells an "
                    "instruction: 10k triangles take five sixths of the time of 100k for the same "
                    "cells. The divisions alone are no more than a twentieth: with products in "
@@ -38,6 +39,17 @@ CAUSES = {
                       "place at a time",
     "crossing-moon": "As for short segments: 615 instead of 1,140 ns if a hundred segments are "
                      "repeated. What Embree's wider instructions add was not measured",
+    "threads": "The processor time of crossings on 4M grows by a fifth, evenly in both threads: "
+               "they wait for the same memory. Builds of 10k take a millisecond, and most of it "
+               "stays on one thread: fewer than 20,000 triangles are not worth another. A single "
+               "build of 100k, as here, pays for waking the second thread: repeated in one "
+               "process it takes 1.78 (HeightGrid), 1.74 (CrossingTree) and 1.69 (AabbTree), and "
+               "a HeightGrid of 1M 1.58",
+    "index-build": "On 10k a HeightGrid takes as long a triangle as on 100k and 1M, while Embree "
+                   "gains from the cache. On jacksboro, by perf beside a regular terrain of the "
+                   "same size, the search for corners that triangles of a cell share takes 46 "
+                   "instead of 21 ns a triangle, and all else the same",
+    "threads-total": "Both threads wait for the same memory: their shares are equal",
     "growth": "At 100k all that a build or a height visits is in the cache, at 4M almost nothing "
               "is. At equal density of the positions, in the row `fine`, a height grows less",
 }
@@ -136,8 +148,9 @@ def get_goals(results):
                   "30 % (Shapefile)")
     for driver, bound in (("FlatGeobuf", 0.03), ("GPKG", 0.03), ("ESRI Shapefile", 0.3)):
         for row in results.get_rows("window/" + driver):
-            window.at_most(f"{driver} {row}",
-                           invert(ratio("window/" + driver, row, "whole layer")), bound)
+            part, whole = (results.get_time("window/" + driver, row, who)
+                           for who in ("window of 1 %", "whole layer"))
+            window.at_most(f"{driver} {row}", part / whole if part and whole else None, bound)
     return (goals + [load, again, window, get_growth_goal(results)] + get_height_goals(results)
             + get_line_goals(results) + get_thread_goals(results) + get_python_goals(results))
 

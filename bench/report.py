@@ -8,6 +8,7 @@ index and our scan disagree.
 """
 
 import math
+import os
 import platform
 import subprocess
 import sys
@@ -17,9 +18,14 @@ from results import Results, get_count
 from subjects import SUBJECTS
 
 
-TILES = """## Tiles on Dask
+PAGE = os.path.join(os.path.dirname(__file__), "..", "docs", "benchmarks.md")
+TILES = "## Tiles on Dask"
 
-`scripts/bench tiles` measures them. The figures stand in [A country at once](guide/scale.md#measured)."""
+
+def get_tiles():
+    """The section of the tiles as it stands: `scripts/bench tiles` prints its tables."""
+    with open(PAGE, encoding="utf-8") as page:
+        return TILES + page.read().partition(TILES)[2].rstrip()
 
 
 def format_figure(value):
@@ -199,7 +205,7 @@ def main(paths):
     ]
     parts += [format_subject(results, title, key, factor, unit, words)
               for title, key, (factor, unit), words in SUBJECTS]
-    parts += [format_growth(results), TILES]
+    parts += [format_growth(results), get_tiles()]
     print("\n\n".join(part for part in parts if part))
 
 
