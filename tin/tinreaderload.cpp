@@ -56,8 +56,9 @@ class ToldWindow {
     ZARLayer_t* mpLayer = nullptr; ///< null if nothing was told
 };
 
-// Shares of a load that is done when the shapes are read, and when they are welded.
-constexpr double READ = 0.6;
+// Shares of a load that is done when the shapes are read, and when they are welded. Most layers are
+// welded while they are read.
+constexpr double READ = 0.8;
 constexpr double WELDED = 0.9;
 
 /// Tells the progress of the walk over shapes. A window leaves some of them out, so the walk may

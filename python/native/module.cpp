@@ -36,8 +36,8 @@ auto ReadFile(const std::string& file, int layer, DatumType source, DatumType ou
               const std::optional<std::array<double, 4>>& window,
               const std::optional<std::array<double, 2>>& base, double offset, double scale,
               std::string survey, const py::object& progress, py::list warnings) {
-    // Without a survey, opening reads the layer, which is about half of the work.
-    const double opened = survey.empty() ? 0.5 : 0.0;
+    // Without a survey, opening reads the layer, which is most of the work.
+    const double opened = survey.empty() ? 0.8 : 0.0;
     PythonProgress opening(progress, 0.0, opened);
     PythonProgress loading(progress, opened, 1.0);
     const ReadOptions options{layer,        source, output, window,

@@ -123,6 +123,8 @@ void FeatureReader::TakeTurn(GdalCall& call) {
     mnSkipped = 0;
     while (mnRead < known && Fetch(call))
         mnAhead = 0;
+    if (known == 0)
+        return;
     // What is skipped was warned of when it was read.
     moWarnings.clear();
     static_cast<void>(call.TakeWarnings());
