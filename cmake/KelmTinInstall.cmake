@@ -33,7 +33,8 @@ install(EXPORT kelm-tin NAMESPACE kelm:: FILE kelm-tin-targets.cmake DESTINATION
 configure_package_config_file(${here}/kelm-tin-config.cmake.in kelm-tin-config.cmake
                               INSTALL_DESTINATION ${package_dir}
                               NO_SET_AND_CHECK_MACRO)
-# 0.2 may break what was built for 0.1, and the soname tells; a program's source seldom.
+# Until 1.0 a minor version may break what was built for the one before, and the soname tells; a
+# program's source seldom.
 write_basic_package_version_file(kelm-tin-config-version.cmake COMPATIBILITY SameMajorVersion)
 install(FILES ${PROJECT_BINARY_DIR}/kelm-tin-config.cmake
               ${PROJECT_BINARY_DIR}/kelm-tin-config-version.cmake
