@@ -83,6 +83,21 @@ TEST(TriangleTest, SumsInItsOrderAndLetsNotANumberPass) {
     EXPECT_EQ(huge.GetGridPointsNum(4, 4), 16U);
 }
 
+TEST(TriangleTest, ADeterminantCountsFromEpsilonOnInEitherSense) {
+    float h;
+    for (const float leg : {0x1p-26F, 0x1.fffffep-27F}) // times 2^-26: 2^-52, and the next below
+        for (const float sign : {1.0F, -1.0F}) {
+            const bool counts = leg == 0x1p-26F;
+            const OwnTriangle t({{0, 0, 5}, {sign * 0x1p-26F, 0, 5}, {0, leg, 5}});
+            EXPECT_EQ(t.GetHeight(0, 0, h), counts);
+            EXPECT_EQ(t.GetLineIntersectHeight({0, 0, 5.5F}, {0, 0, 4.5F}, h),
+                      counts ? IR_Inside : IR_Disjoint);
+            // Too thin to hold a position: only its edges can be crossed.
+            const OwnTriangle thin({{0, 0, 0}, {0, leg / 16, 0}, {sign * 0x1p-23F, 0, 0}});
+            EXPECT_EQ(thin.IsIntersectedLine(-0x1p-23F, leg / 32, 0x1p-23F, leg / 32), counts);
+        }
+}
+
 TEST(TriangleTest, VectorsAreSummedAndScaledByComponents) {
     const auto is = [](const Vector3& v, double x, double y, double z) {
         return v._x() == x && v._y() == y && v._z() == z;
@@ -138,6 +153,22 @@ TEST(TriangleGridTest, ListsTheCellsThatExactArithmeticFinds) {
         t.GetGridPointsCR(cells.data(), cols, rows);
         ASSERT_EQ(cells, expected) << i;
     }
+}
+
+// From column 2^25 on only each fourth one is a float: the last column rounds beyond the grid.
+TEST(TriangleGridTest, EndsAtTheLastColumnWhereColumnsAreNoFloats) {
+    constexpr int LAST = 33554435;
+    const OwnTriangle t({{0x1p25F - 8, 0, 1}, {0x1p25F + 64, 0, 1}, {0x1p25F - 8, 2, 1}});
+    std::vector<int> expected, cells(24);
+    for (int col = LAST - 11; col <= LAST; ++col)
+        expected.insert(expected.end(), {col, 1});
+    ASSERT_EQ(t.GetGridPointsNum(LAST + 1, 2), 12U);
+    t.GetGridPointsCR(cells.data(), LAST + 1, 2);
+    EXPECT_EQ(cells, expected);
+    std::vector<float> heights;
+    cells.clear();
+    EXPECT_EQ(t.GetGridPoints(LAST + 1, 2, cells, heights), 12U);
+    EXPECT_EQ(cells, expected);
 }
 
 } // namespace

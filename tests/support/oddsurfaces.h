@@ -102,6 +102,10 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
         const float e = 2e19F + i * 1e17F;
         return Trio{{{std::fmod(i, 2.0F) < 1 ? e : -e, 0, 1}, {0, e, 2}, {0, -e, i}}};
     });
+    addEach("determinants of epsilon and the next below", 60, [](float i) {
+        const float leg = std::fmod(i, 2.0F) < 1 ? 0x1p-26F : 0x1.fffffep-27F, x = i * 0x1p-20F;
+        return Trio{{{x, 0, i}, {x + 0x1p-26F, 0, 1}, {x, std::fmod(i, 3.0F) < 1 ? leg : -leg, 2}}};
+    });
     addEach("crowded corner", 700, [](float i) {
         const float at = std::exp2(std::floor(i / 2) - 125), x = std::fmod(i, 2.0F) * at;
         return Trio{{{x, at - x, 1}, {x * 1.25F, at - x, i}, {x, (at - x) * 1.25F, 1}}};
