@@ -1,4 +1,5 @@
 #include "services/bundled/store/features/geometrybytes.h"
+#include "services/bundled/store/gdal/warnings.h"
 #include "tests/support/filetest.h"
 
 #include <cpl_http.h>
@@ -358,6 +359,16 @@ TEST_F(VectorLayerTest, TheHostGetsBackItsStateOfGdal) {
     CPLHTTPPopFetchCallback();
     for (const auto& [pszKey, pszValue] : options)
         CPLSetThreadLocalConfigOption(pszKey, nullptr);
+}
+
+TEST_F(VectorLayerTest, TextsOfWarningsBeyondAThousandAreCountedTogether) {
+    kelm::store::Warnings warnings;
+    for (const int nRound : {1, 2})
+        for (int n = 0; n < 1002; ++n)
+            kelm::store::AddWarning(warnings, std::to_string(n), nRound);
+    EXPECT_EQ(warnings.size(), 1001U);
+    EXPECT_EQ(warnings["further warnings"], 6);
+    EXPECT_EQ(warnings["999"], 3);
 }
 
 } // namespace

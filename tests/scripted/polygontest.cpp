@@ -60,6 +60,9 @@ TEST(PolygonTest, ARingIsTurnedUnlessItIsAsAskedAndItsBoxHoldsRepeats) {
     EXPECT_EQ(Make({{0, 0}, {2, 0}, {2 + 5e-10, 0}, {0, 2}}).GetBBox().max.x, 2 + 5e-10);
     EXPECT_TRUE(Make(SQUARE).IsPointInside(2, 1)) << "a point on an edge is left of it";
     EXPECT_FALSE(Make(SQUARE).IsPointInside(0, 1));
+    for (const PolygonOrient orient : {PO_CounterClockwise, PO_Clockwise})
+        for (const double x : {-1, 1, 3}) // at the height of two corners
+            EXPECT_EQ(Make({{1, 0}, {2, 1}, {1, 2}, {0, 1}}, orient).IsPointInside(x, 1), x == 1);
 }
 
 // A comb blocks almost every ear, again and again. All pairs of so many edges would take minutes.
