@@ -4,7 +4,8 @@
 //     terrain_heights terrain.gpkg --source orthometric --output ellipsoidal --at 745000,4052000
 //     terrain_heights terrain.gpkg --stdin < positions.csv > heights.txt
 //
-// Heights go to standard output, one line for each position. All else goes to standard error.
+// Heights go to standard output, one line for each position, in the unit of the stored heights
+// times the scale. "off the surface" stands where there is none. All else goes to standard error.
 
 #include "command.h"
 #include "terrain.h"
@@ -138,7 +139,10 @@ void Run(const Layer& layer, const Options& options) {
 int main(int argc, char** argv) {
     Layer layer;
     Options options;
-    CLI::App app("Heights of a terrain at map positions.", "terrain_heights");
+    CLI::App app(
+        "Heights of a terrain at map positions, a line each, in the unit of the layer times the "
+        "scale. The vertical datum of the layer is \"other\" unless --source names it.",
+        "terrain_heights");
     AddLayerOptions(app, layer);
     DefineOptions(app, options);
     return RunCommand(app, argc, argv, [&] { Run(layer, options); });

@@ -8,6 +8,8 @@ import sys
 import kelm_tin
 import pandas
 
+if len(sys.argv) != 4:
+    sys.exit(__doc__)
 terrain, positions, heights = sys.argv[1:]
 table = pandas.read_csv(positions)
 surface = kelm_tin.read(terrain)

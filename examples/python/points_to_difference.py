@@ -10,6 +10,8 @@ import sys
 import kelm_tin
 import numpy as np
 
+if len(sys.argv) != 2:
+    sys.exit(__doc__)
 terrain = kelm_tin.read(sys.argv[1])
 random = np.random.default_rng(1)
 xmin, ymin, xmax, ymax = 744000.0, 4050000.0, 745000.0, 4051000.0

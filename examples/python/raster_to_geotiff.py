@@ -9,6 +9,8 @@ import kelm_tin
 import numpy as np
 import rasterio
 
+if len(sys.argv) != 4:
+    sys.exit(__doc__)
 terrain, name, cell = sys.argv[1:]
 surface = kelm_tin.read(terrain)
 cells, transform = surface.raster(cell=float(cell), closed=True)

@@ -9,6 +9,8 @@ import kelm_tin
 import numpy as np
 import pandas
 
+if len(sys.argv) != 4:
+    sys.exit(__doc__)
 terrain, places, mast = sys.argv[1:]
 surface = kelm_tin.read(terrain)
 table = pandas.read_csv(places)

@@ -131,7 +131,15 @@ def read(
         raise NothingRead(f"{os.fspath(path)}: no polygon of the layer or window gave a triangle")
     if survey is not None and survey.data:
         crs = survey.crs
-    return Surface._wrap(native, crs, source if output is None else output)
+    datum = source if output is None else output
+    return Surface._wrap(native, find_crs(crs, source, datum, offset, scale), datum)
+
+
+def find_crs(crs: Optional[str], source: str, output: str, offset: float, scale: float) -> Optional[str]:
+    """What of a layer's CRS holds of the answers: the horizontal part alone if heights are not as stored."""
+    if crs is None or (output, offset, scale) == (source, 0, 1):
+        return crs
+    return _native.flatten_crs(crs)
 
 
 def survey(path: Path, layer: Optional[int] = None, *, progress: Optional[Progress] = None) -> Survey:

@@ -140,7 +140,8 @@ class Surface:
 
     @property
     def crs(self) -> Optional[str]:
-        """CRS of the layer as WKT; None if it has none, or if the surface is made from arrays."""
+        """CRS of the layer as WKT; None if it has none, or if the surface is made from arrays. It has no
+        vertical part if the heights are not as stored: after a change of datum, an offset or a scale."""
         return self._crs
 
     @property

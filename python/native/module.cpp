@@ -119,6 +119,7 @@ void AddFiles(py::module_& module) {
     module.def("read", &ReadFile);
     module.def("survey", &SurveyFile);
     module.def("count", &CountFile);
+    module.def("flatten_crs", &FlattenCrs);
     module.def("layers", &ListFile);
 }
 

@@ -46,17 +46,22 @@ std::unique_ptr<TinReader> OpenReader(const std::string& file, const ReadOptions
     }
 }
 
+using SpatialReference = std::unique_ptr<void, decltype(&OSRDestroySpatialReference)>;
+
+/// @return null if the text is empty or tells no CRS
+SpatialReference ReadCrs(const std::string& definition) {
+    SpatialReference crs(OSRNewSpatialReference(nullptr), OSRDestroySpatialReference);
+    if (definition.empty() || OSRSetFromUserInput(crs.get(), definition.c_str()) != OGRERR_NONE)
+        crs.reset();
+    return crs;
+}
+
 /// @return the CRS as WKT 2; none if there is none or if it cannot be told as WKT
-std::optional<std::string> GetWkt(const std::string& definition) {
-    if (definition.empty())
-        return std::nullopt;
-    const std::unique_ptr<void, decltype(&OSRDestroySpatialReference)> crs(
-        OSRNewSpatialReference(nullptr), OSRDestroySpatialReference);
+std::optional<std::string> GetWkt(const SpatialReference& crs) {
     const char* options[] = {"FORMAT=WKT2_2019", nullptr};
     char* text = nullptr;
     std::optional<std::string> wkt;
-    if (OSRSetFromUserInput(crs.get(), definition.c_str()) == OGRERR_NONE &&
-        OSRExportToWktEx(crs.get(), &text, options) == OGRERR_NONE)
+    if (crs && OSRExportToWktEx(crs.get(), &text, options) == OGRERR_NONE)
         wkt = text;
     CPLFree(text);
     return wkt;
@@ -74,7 +79,7 @@ LayerFacts GetFacts(const TinReader& reader) {
     const auto& box = reader.GetBBox();
     facts.mnShapes = reader.GetShapeCount();
     facts.moBox = {box.min.x, box.min.y, box.min.z, box.max.x, box.max.y, box.max.z};
-    facts.moCrs = GetWkt(reader.GetCRSText());
+    facts.moCrs = GetWkt(ReadCrs(reader.GetCRSText()));
     facts.mnLoadBytes = reader.EstimateLoadBytes();
     facts.mnSurfaceBytes = reader.EstimateObjBytes_Tin();
     return facts;
@@ -122,7 +127,7 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
         return {nullptr, std::nullopt};
     const bool known = !options.moOpening.survey.empty();
     return {std::make_unique<Surface>(std::move(surface)),
-            known ? std::nullopt : GetWkt(reader->GetCRSText())};
+            known ? std::nullopt : GetWkt(ReadCrs(reader->GetCRSText()))};
 }
 
 std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,
@@ -131,6 +136,15 @@ std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,
     LayerFacts facts = GetFacts(*reader);
     facts.mnNumber = options.mnLayer;
     return {std::move(facts), reader->GetSurvey()};
+}
+
+std::optional<std::string> FlattenCrs(const std::string& wkt) {
+    const SpatialReference crs = ReadCrs(wkt);
+    if (crs) {
+        OSRStripVertical(crs.get());
+        OSRDemoteTo2D(crs.get(), nullptr);
+    }
+    return GetWkt(crs);
 }
 
 std::vector<int> CountShapes(const std::string& file, const ReadOptions& options,

@@ -52,6 +52,9 @@ std::pair<std::unique_ptr<Surface>, std::optional<std::string>> Read(const std::
 /// @return its facts, and the survey as bytes @throw FileError; kelm::Exception
 std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file, const ReadOptions& options);
 
+/// @return the horizontal part of a CRS, both as WKT
+std::optional<std::string> FlattenCrs(const std::string& wkt);
+
 /// Counts without a walk; of the options, layer and survey count.
 /// @return for each window a bound on the number of shapes that meet it @throw as Read
 std::vector<int> CountShapes(const std::string& file, const ReadOptions& options,

@@ -1,5 +1,6 @@
 """Files: what is read, warned of and refused."""
 
+import dataclasses
 import os
 import pickle
 import shutil
@@ -117,6 +118,12 @@ def test_windows_of_one_survey_and_one_base(tmp_path):
     assert len(part.triangles) < len(whole.triangles) / 10
     assert np.array_equal(part.heights(xy), whole.heights(xy), equal_nan=True)
     assert part.crs == whole.crs is not None
+    compound, how = dataclasses.replace(survey, crs="EPSG:32616+5773"), dict(source="orthometric")
+    assert kelm_tin.read(path, survey=compound, **how).crs == compound.crs
+    for moved in (dict(output="ellipsoidal"), dict(offset=1.0), dict(scale=2.0)):
+        flat = kelm_tin.read(path, survey=compound, **how, **moved).crs
+        assert "UTM zone 16N" in flat and "EGM96" not in flat
+        assert kelm_tin.tiles.Plan(path, tile=2000, survey=compound, **how, **moved).crs == flat
     with pytest.raises(kelm_tin.NothingRead):
         kelm_tin.read(path, window=(xmin, ymin, xmin, ymin), survey=survey)
     os.utime(path, (1, 1))

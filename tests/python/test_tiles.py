@@ -212,7 +212,14 @@ def test_geotiff(country, tmp_path, monkeypatch, writer):
     name.write_text("to be replaced")
     with dask.config.set(scheduler="sync" if writer == "rasterio" else None):
         tiles.write_geotiff(cells, name)
+    seen = np.arange(12).reshape(3, 4) % 2 == 0
+    tiles.write_geotiff(seen, mask := tmp_path / "seen.tif", transform=(5, 0, 10, 0, -5, 20), nodata=255)
     monkeypatch.undo()
+    with rasterio.open(mask) as file:
+        assert (file.read(1) == seen).all() and file.dtypes == ("uint8",) and file.nodata == 255
+    with pytest.raises(ValueError, match=r"transform: expected \(side, 0, left, 0, -side, top\), got \(10, 5"):
+        tiles.write_geotiff(seen, mask, transform=(10, 5, 0, 20, 0, -5))
+    mask.unlink()
     with rasterio.open(name) as file:
         assert file.read(1).tobytes() == cells_of(whole, plan, 2.0).tobytes()
         assert tuple(file.transform)[:6] == cells.transform and file.crs.to_epsg() == 32633

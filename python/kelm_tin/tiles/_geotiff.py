@@ -36,6 +36,7 @@ class Sheet(NamedTuple):
     """Cells on a side of a block in the file."""
     transform: Transform
     crs: Optional[str]
+    nodata: Optional[float]
 
     def options(self) -> dict[str, str]:
         predictor = "3" if self.dtype.kind == "f" else "2"
@@ -47,6 +48,10 @@ class Sheet(NamedTuple):
         it is written twice, and takes its place in the file twice."""
         row = self.chunk * self.columns * int(self.dtype.itemsize)
         return CACHE if self.chunk % self.side == 0 else CACHE + 2 * row
+
+    def resampling(self) -> str:
+        """How overviews are made. Whole numbers can be kinds, of which there is no mean."""
+        return "average" if self.dtype.kind == "f" else "nearest"
 
     def overviews(self) -> list[int]:
         levels: list[int] = []
@@ -61,6 +66,7 @@ def write_geotiff(
     *,
     transform: Optional[Transform] = None,
     crs: Optional[str] = None,
+    nodata: Optional[float] = None,
 ) -> None:
     """Computes a raster chunk by chunk and writes it: tiled, compressed, with overviews.
 
@@ -68,12 +74,17 @@ def write_geotiff(
     appears under its name when it is whole. Needs rasterio or GDAL's Python module.
 
     Args:
-        array: what `raster` gave, or a dask array of two axes computed from it.
+        array: what `raster` gave, or a dask or numpy array of two axes computed from it. Truth values are
+            written as 0 and 1.
         path: the file; one that is there is replaced.
-        transform, crs: where the cells lie; None for those of the array.
+        transform, crs: where the cells lie; None for those of the array. A transform is
+            (side, 0, western edge, 0, -side, northern edge), as `raster` gives it and as rasterio's
+            `Affine` has it. GDAL's order is another one.
+        nodata: value of cells that hold nothing; None for NaN in an array of floats, and for none in others.
 
     Raises:
-        ValueError: the array has not two axes, or it is not known where its cells lie.
+        ValueError: the array has not two axes, or it is not known where its cells lie; the transform is
+            rotated, as one in GDAL's order seems to be.
         TileError: a tile could not be answered. No file is left.
         ImportError: neither rasterio nor GDAL's Python module is there.
         OSError: the file cannot be written.
@@ -81,12 +92,26 @@ def write_geotiff(
     where = getattr(array, "transform", None) if transform is None else transform
     if array.ndim != 2 or where is None:
         raise ValueError(f"array: expected two axes and a transform, got shape {array.shape}, {where}")
+    if where[1] != 0 or where[3] != 0:
+        raise ValueError(f"transform: expected (side, 0, left, 0, -side, top), got {tuple(where)}")
     crs = getattr(array, "crs", None) if crs is None else crs
+    array = _to_chunks(array)
+    if nodata is None and array.dtype.kind == "f":
+        nodata = np.nan
     (rows, columns), chunk = array.shape, array.chunks[0][0]
-    sheet = Sheet(rows, columns, array.dtype, chunk, _find_side(chunk), where, crs)
+    sheet = Sheet(rows, columns, array.dtype, chunk, _find_side(chunk), where, crs, nodata)
     write = _find_writer()
     with _whole_or_not_at_all(os.fspath(path)) as name:
         write(name, sheet, _compute_blocks(array))
+
+
+def _to_chunks(array: Any) -> Any:
+    """A dask array of numbers that a GeoTIFF can hold."""
+    if not hasattr(array, "chunks"):
+        import dask.array
+
+        array = dask.array.from_array(array, chunks=4 * MOST_BLOCK)
+    return array.astype(np.uint8) if array.dtype == bool else array
 
 
 def _find_side(count: int) -> int:
@@ -179,13 +204,13 @@ def _write_within_cache(name: str, sheet: Sheet, blocks: Blocks) -> None:
         dtype=sheet.dtype.name,
         crs=sheet.crs,
         transform=rasterio.Affine(*sheet.transform),
-        nodata=np.nan if sheet.dtype.kind == "f" else None,
+        nodata=sheet.nodata,
         **sheet.options(),
     ) as file:
         for row, column, cells in blocks:
             file.write(cells, 1, window=Window(column, row, cells.shape[1], cells.shape[0]))
     with rasterio.open(name, "r+") as file:
-        file.build_overviews(sheet.overviews(), Resampling.average)
+        file.build_overviews(sheet.overviews(), Resampling[sheet.resampling()])
 
 
 def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
@@ -200,13 +225,13 @@ def _write_by_gdal(name: str, sheet: Sheet, blocks: Blocks) -> None:
         if sheet.crs is not None:
             file.SetProjection(sheet.crs)
         band = file.GetRasterBand(1)
-        if sheet.dtype.kind == "f":
-            band.SetNoDataValue(np.nan)
+        if sheet.nodata is not None:
+            band.SetNoDataValue(sheet.nodata)
         for row, column, cells in blocks:
             # GDAL's module crashes on cells that share one place in memory, as constants do.
             band.WriteArray(np.ascontiguousarray(cells), column, row)
         file.FlushCache()
-        file.BuildOverviews("AVERAGE", sheet.overviews())
+        file.BuildOverviews(sheet.resampling(), sheet.overviews())
         del band, file
 
 

@@ -11,7 +11,7 @@ import numpy as np
 from numpy.typing import ArrayLike, NDArray
 
 from .._arrays import FloatArray, to_position, to_positive
-from .._reading import Path, Survey, count_shapes, survey, to_datum
+from .._reading import Path, Survey, count_shapes, find_crs, survey, to_datum
 
 Tile = tuple[int, int]
 """Row from the north on, column from the west on."""
@@ -103,8 +103,8 @@ class Plan:
 
     @property
     def crs(self) -> Optional[str]:
-        """CRS of the layer as WKT; None if it has none."""
-        return self._survey.crs
+        """CRS of the answers as WKT; None if the layer has none. See `Surface.crs`."""
+        return find_crs(self._survey.crs, self.source, self.output or self.source, self.offset, self.scale)
 
     @property
     def origin(self) -> tuple[float, float]:

@@ -20,6 +20,13 @@ PjPtr GetEllipsoid(ProjSession& session, const PJ* crs) {
     return PjPtr(proj_get_ellipsoid(session.Get(), crs));
 }
 
+/// @return the unit of a projected CRS's positions; metres of any other
+HeightUnit GetMapUnit(ProjSession& session, const PJ* map) {
+    if (proj_get_type(map) == PJ_TYPE_BOUND_CRS)
+        return GetMapUnit(session, PjPtr(proj_get_source_crs(session.Get(), map)).get());
+    return proj_get_type(map) == PJ_TYPE_PROJECTED_CRS ? GetHeightUnit(session, map) : HeightUnit{};
+}
+
 } // namespace
 
 bool IsGeocentricEllipsoid(ProjSession& session, const PJ* crs) {
@@ -52,6 +59,22 @@ void WarnOfEllipsoid(const std::string& map, const std::string& ellipsoid,
                                        "%s",
                                        map.c_str(), operation.moName.c_str(), meaning.c_str()),
                           SOURCE, __LINE__);
+}
+
+void WarnOfUnit(ProjSession& session, const CRSText& text, const PJ* map, const HeightUnit& unit) {
+    const HeightUnit ofMap = GetMapUnit(session, map);
+    if (unit.mdfMetres != 1.0)
+        tellus::Warning::Warn(
+            FormatString("Heights of '%s' have the unit %s of its height axis in the change of "
+                         "datum; offset and scale of a load come before it",
+                         text.moName.c_str(), unit.moName.c_str()),
+            SOURCE, __LINE__);
+    else if (text.moVertical.empty() && text.moEllipsoidal.empty() && ofMap.mdfMetres != 1.0)
+        tellus::Warning::Warn(
+            FormatString("'%s' has the unit %s and no height axis: heights count as metres in the "
+                         "change of datum",
+                         text.moName.c_str(), ofMap.moName.c_str()),
+            SOURCE, __LINE__);
 }
 
 } // namespace kelm::ogc

@@ -1,5 +1,6 @@
 #pragma once
 
+#include "services/bundled/reference/proj/heightunit.h"
 #include "services/bundled/reference/proj/projoperation.h"
 #include "services/bundled/reference/proj/projsession.h"
 #include "services/bundled/reference/projcrs.h"
@@ -20,5 +21,9 @@ std::string FindOldEllipsoid(ProjSession& session, const PJ* crs);
 /// name, see FindOldEllipsoid
 void WarnOfEllipsoid(const std::string& map, const std::string& ellipsoid,
                      const ProjOperation& operation);
+
+/// Warns if the heights of a layer may be taken for another unit than the change of datum takes:
+/// it goes by the height axis, and by metres without one. @param map the map CRS as PROJ has it
+void WarnOfUnit(ProjSession& session, const CRSText& text, const PJ* map, const HeightUnit& unit);
 
 } // namespace kelm::ogc

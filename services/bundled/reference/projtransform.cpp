@@ -81,7 +81,7 @@ ProjTransform::ProjTransform(const ProjCRS& source, const ProjCRS& target)
     : moOperations(ListOperations(moSession, source, target)) {
     ReportOperations();
     const PjPtr map = moSession.CreateFromText(source.GetMap().GetText().moDefinition);
-    ReportUnit(target);
+    ReportUnit(source.GetMap().GetText(), map.get(), target);
     if (source.GetDatum() == cs::VD_Ellipsoidal || target.GetDatum() == cs::VD_Ellipsoidal)
         moEllipsoid = FindOldEllipsoid(moSession, map.get());
     moMapName = source.GetMap().GetText().moName;
@@ -104,10 +104,11 @@ void ProjTransform::ReportOperations() const {
             operation.IsUsable() ? "" : "; not usable without ", operation.moMissingGrids.c_str()));
 }
 
-void ProjTransform::ReportUnit(const ProjCRS& crs) {
-    const PjPtr object = moSession.CreateFromText(crs.GetText().moDefinition);
-    tellus::Report::AddInfo(FormatString("Unit of the heights: %s",
-                                         GetHeightUnit(moSession, object.get()).moName.c_str()));
+void ProjTransform::ReportUnit(const CRSText& text, const PJ* map, const ProjCRS& compound) {
+    const PjPtr object = moSession.CreateFromText(compound.GetText().moDefinition);
+    const HeightUnit unit = GetHeightUnit(moSession, object.get());
+    tellus::Report::AddInfo(FormatString("Unit of the heights: %s", unit.moName.c_str()));
+    WarnOfUnit(moSession, text, map, unit);
 }
 
 bool ProjTransform::TransformPoints(const double* source, double* target, unsigned int nCount) {

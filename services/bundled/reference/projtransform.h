@@ -27,7 +27,7 @@ class ProjTransform final : public ct::IMathTransform {
 
   private:
     void ReportOperations() const;
-    void ReportUnit(const ProjCRS& crs);
+    void ReportUnit(const CRSText& text, const PJ* map, const ProjCRS& compound);
     const ProjOperation& ChooseOperation(const double* source, unsigned int count);
     std::size_t FindCommon(const double* source, unsigned int count);
     std::vector<double> ConvertToDegrees(const double* source, unsigned int count);

@@ -14,18 +14,20 @@
 
 using kelm::DataException;
 
-struct _iobuf {
-    std::vector<std::vector<ZARVertex>> rings; ///< each closed: its last vertex repeats the first
-    ZARLayer_t layer{};
-    ZARShape shape{};
-};
-
 namespace {
 
-/// The library passes only the layer to some functions. They find the file here.
-_iobuf* theFile = nullptr;
+/// The library passes only the layer to some functions. They find the file behind it.
+struct Layer : ZARLayer_t {
+    _iobuf* file = nullptr;
+};
 
 } // namespace
+
+struct _iobuf {
+    std::vector<std::vector<ZARVertex>> rings; ///< each closed: its last vertex repeats the first
+    Layer layer;
+    ZARShape shape{};
+};
 
 _iobuf* ZAROpen(const char* name, const char*) {
     if (std::string(name) != "memory")
@@ -33,13 +35,14 @@ _iobuf* ZAROpen(const char* name, const char*) {
     auto file = std::make_unique<_iobuf>();
     file->rings = {{{0, 0, 10}, {100, 0, 20}, {100, 100, 30}, {0, 0, 10}},
                    {{0, 0, 10}, {100, 100, 30}, {0, 100, 20}, {0, 0, 10}}};
-    file->layer = {static_cast<int>(file->rings.size()), 1};
-    return theFile = file.release();
+    file->layer.shapeCount = static_cast<int>(file->rings.size());
+    file->layer.shapeCountValid = 1;
+    file->layer.file = file.get();
+    return file.release();
 }
 
 void ZARClose(_iobuf* file) {
     delete file;
-    theFile = nullptr;
 }
 
 int ZARSegCount(_iobuf*, int) {
@@ -74,14 +77,15 @@ int ZARGetNext(ZARLayer_t* layer, int id) {
     return id + 1 < layer->shapeCount ? id + 1 : -1;
 }
 
-ZARShape* ZARGetShapeRef(ZARLayer_t*, int id) {
-    std::vector<ZARVertex>& ring = theFile->rings.at(static_cast<std::size_t>(id));
-    theFile->shape = {ring.data(), static_cast<int>(ring.size())};
-    return &theFile->shape;
+_iobuf* ZARLayer2fp(ZARLayer_t* layer) {
+    return static_cast<Layer*>(layer)->file;
 }
 
-_iobuf* ZARLayer2fp(ZARLayer_t*) {
-    return theFile;
+ZARShape* ZARGetShapeRef(ZARLayer_t* layer, int id) {
+    _iobuf& file = *ZARLayer2fp(layer);
+    std::vector<ZARVertex>& ring = file.rings.at(static_cast<std::size_t>(id));
+    file.shape = {ring.data(), static_cast<int>(ring.size())};
+    return &file.shape;
 }
 
 namespace kelm::ogc {
@@ -135,8 +139,11 @@ ct::IMathTransform* utils::CreateCRSTransform(const cs::ICRS*, const cs::ICRS*, 
 std::string FormatString(const char* format, ...) {
     va_list arguments;
     va_start(arguments, format);
-    char text[1024];
-    std::vsnprintf(text, sizeof text, format, arguments);
+    va_list measured;
+    va_copy(measured, arguments);
+    std::string text(static_cast<std::size_t>(std::vsnprintf(nullptr, 0, format, measured)), '\0');
+    va_end(measured);
+    std::vsnprintf(text.data(), text.size() + 1, format, arguments);
     va_end(arguments);
     return text;
 }
