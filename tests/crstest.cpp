@@ -6,7 +6,9 @@
 
 #include <ogr_srs_api.h>
 #include <proj.h>
+#include <proj_experimental.h>
 
+#include <algorithm>
 #include <cmath>
 
 using namespace kelm::ogc;
@@ -14,6 +16,7 @@ using namespace kelm::ogc;
 namespace {
 
 using CRSPtr = std::unique_ptr<cs::ICRS>;
+using TransformPtr = std::unique_ptr<ct::IMathTransform>;
 using PjPtr = std::unique_ptr<PJ, decltype(&proj_destroy)>;
 using Points = std::vector<double>;
 
@@ -63,22 +66,50 @@ CRSPtr MakeCompound(const CRSPtr& poMap, cs::DatumType eDatum) {
     return CRSPtr(utils::CreateCompoundCS(poMap->GetHorizontalCRS(), eDatum, cs::LU_Default));
 }
 
-/// @return the points with their heights converted, and one more
-Points Transform(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
-                 cs::DatumType eTo = kOrtho, bool bWkt = true) {
+TransformPtr MakeTransform(const std::string& crs, cs::DatumType eFrom = kEllips,
+                           cs::DatumType eTo = kOrtho, bool bWkt = true) {
     const CRSPtr poMap = ReadCRS(crs, bWkt);
     const CRSPtr poFrom = MakeCompound(poMap, eFrom), poTo = MakeCompound(poMap, eTo);
     EXPECT_EQ(poMap->GetDimension() + 1, poFrom->GetDimension()) << crs;
+    return TransformPtr(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
+}
+
+/// @return the points with their heights converted, and one more
+Points Transform(const TransformPtr& poTransform, const Points& points) {
     Points target(points.size() + 3);
-    std::unique_ptr<ct::IMathTransform>(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0))
-        ->TransformPoints(points.data(), target.data(), static_cast<unsigned>(points.size() / 3));
+    poTransform->TransformPoints(points.data(), target.data(),
+                                 static_cast<unsigned>(points.size() / 3));
     return target;
+}
+
+/// @return the height of a point by the operation of this name among those that PROJ lists
+double AskProj(const std::string& crs, const std::string& name, const Points& points) {
+    const PjPtr poMap(proj_create(nullptr, crs.c_str()), proj_destroy),
+        poFrom(proj_crs_promote_to_3D(nullptr, nullptr, poMap.get()), proj_destroy),
+        poTo(proj_create(nullptr, (crs + "+5773").c_str()), proj_destroy);
+    const std::unique_ptr<PJ_OPERATION_FACTORY_CONTEXT,
+                          decltype(&proj_operation_factory_context_destroy)>
+        poFactory(proj_create_operation_factory_context(nullptr, nullptr),
+                  proj_operation_factory_context_destroy);
+    proj_operation_factory_context_set_spatial_criterion(
+        nullptr, poFactory.get(), PROJ_SPATIAL_CRITERION_PARTIAL_INTERSECTION);
+    const std::unique_ptr<PJ_OBJ_LIST, decltype(&proj_list_destroy)> poList(
+        proj_create_operations(nullptr, poFrom.get(), poTo.get(), poFactory.get()),
+        proj_list_destroy);
+    for (int n = 0; n < proj_list_get_count(poList.get()); ++n) {
+        const PjPtr po(proj_list_get(nullptr, poList.get(), n), proj_destroy);
+        const PjPtr poOurs(proj_normalize_for_visualization(nullptr, po.get()), proj_destroy);
+        const PJ_COORD oPoint = proj_coord(points[0], points[1], points[2], HUGE_VAL);
+        if (proj_get_name(po.get()) == name)
+            return proj_trans(poOurs.get(), PJ_FWD, oPoint).xyz.z;
+    }
+    return std::nan("");
 }
 
 /// @return the height of the first point
 template <typename... Arguments>
 double Convert(const std::string& crs, const Points& points, Arguments... arguments) {
-    return Transform(crs, points, arguments...)[2];
+    return Transform(MakeTransform(crs, arguments...), points)[2];
 }
 
 const std::string kFromUtm = "+inv +proj=utm +zone=16 +ellps=WGS84 ";
@@ -105,6 +136,10 @@ const struct {
     // Of 17 ways to WGS 84 and back, most for one state, none moves a height or needs its grid.
     {"EPSG:26916", 738669, 4e6, kFromUtm},
     {"EPSG:4269", -86.8, 36.5, kFromDegrees}, // on the border of two states
+    {"EPSG:4807", 2, 54,                      // grades east of Paris
+     "+proj=unitconvert +xy_in=grad +xy_out=rad +step +inv +proj=longlat +ellps=clrk80ign "
+     "+pm=paris +step +proj=cart +ellps=clrk80ign +step +proj=helmert +x=-168 +y=-60 +z=320 "
+     "+step +inv +proj=cart +ellps=WGS84 "},
     // Of these two, one operation shifts positions alone and the other points in space.
     {"EPSG:31467", 3513000, 5403000,
      "+inv +proj=tmerc +lon_0=9 +x_0=3500000 +ellps=bessel +step +proj=hgridshift "
@@ -114,6 +149,33 @@ const struct {
      "+y_0=463000 +ellps=bessel +step +proj=cart +ellps=bessel +step +proj=helmert +x=565.4171 "
      "+y=50.3319 +z=465.5524 +rx=0.398957388243134 +ry=-0.343987817378283 +rz=1.87740163998045 "
      "+s=4.0725 +convention=coordinate_frame +step +inv +proj=cart +ellps=WGS84 "}};
+
+/// Longitudes, latitudes and heights: each pair of braces is a call.
+const struct {
+    const char* mpszCRS;
+    std::vector<Points> moCalls;
+} kChoices[] = {
+    // Operations of 5 m, 7 m (beyond the 180th meridian, too), 10 m for all, and 11 m.
+    {"EPSG:4284",
+     {{50, 42, 9},
+      {37, 55, 9, 50, 42, 9},
+      {-170, 65, 9},
+      {190, 65, 9},
+      {24, 57, 9},
+      {44.5, 40, 9},
+      {44.5, 40, 9, 45, 40, 9, 37, 55, 9},
+      {-160, 65, 9, 37, 55, 9, 0, 55, 9}}},
+    {"EPSG:4740",
+     {{37, 55, 9}, {0, 0, 9}, {37, 55, 9, 0, 0, 9}}}, // one of the world is the coarser
+    // The shifts for Czechia and Slovakia, equally accurate in plan, are 45 m apart in height.
+    {"EPSG:4156",
+     {{14, 50, 9}, {17.5, 49, 9}, {14, 50, 9, 17.5, 49, 9}, {20, 48.5, 9, 14, 50, 9}, {14, 48, 9}}},
+    {"EPSG:4283",
+     {{151, -33, 9}, {95, -33, 9}}}, // of three equals, that of the smallest area lacks its grid
+    {"EPSG:4272", {}},
+    {"EPSG:4176", {{100, -80, 9}, {20, -80, 9}}},
+    // Of two zones only the southern has its grid; beside all, in the area of the CRS.
+    {"EPSG:32616+5703", {{738669, 4745105, 9}, {5e5, 6.65e6, 9}}}};
 
 const struct {
     const char* mpszCRS;
@@ -126,19 +188,19 @@ const struct {
     {"EPSG:32616+3855", {}},
     {"+proj=utm +zone=16 +datum=WGS84 +geoidgrids=no.gtx +type=crs", {}},
     {"+proj=utm +zone=16 +ellps=WGS84 +type=crs", {}},
-    {"EPSG:32616+5703", {738669, 4745105, 250}}, // of two zones only the southern has its grid
-    // The shifts for Czechia and Slovakia, equally accurate in plan, are 45 m apart in height.
-    {"EPSG:5514", {-5e5, -1.26e6, 300, -7.5e5, -1.04e6, 300}},
     {"EPSG:4131", {}},
     {"EPSG:4301", {139, 36, 100}}, // a shift of 4 m for Korea, and none below 9 m for Japan
     {"EPSG:4326", {10, 50, 1, 10, 150, 2, 10, 151, 3}},
-    {"EPSG:4326", {10, 50, 1, 11, 50, std::nan(""), 10, 50, -3.4e38}},
-    {"EPSG:2193", {1748735, 5427916, 1, 1748735, 9e6, 2}}};
+    {"EPSG:4326", {10, 50, 1, 11, 50, std::nan(""), 10, 50, -3.4e38}}};
 
 } // namespace
 
 TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
     bool bWkt = false;
+    std::string told;
+    const auto CountLines = [](const std::string& text) {
+        return std::count(text.begin(), text.end(), '\n');
+    };
     for (const auto& [pszCRS, x, y, steps, dfUnit] : kConversions) {
         bWkt = !bWkt;
         const std::string geoid = "+step +inv +proj=vgridshift +grids=egm96_15.gtx +multiplier=1";
@@ -147,12 +209,51 @@ TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
         const PJ_COORD oSource = proj_coord(x, y, 300 * dfUnit, HUGE_VAL);
         const double dfHeight = Convert(pszCRS, {x, y, 300}, kEllips, kOrtho, bWkt);
         EXPECT_NEAR(dfHeight * dfUnit, proj_trans(po.get(), PJ_FWD, oSource).xyz.z, 1e-6) << pszCRS;
+        const std::string there = moTranscript.Take();
         EXPECT_NEAR(Convert(pszCRS, {x, y, dfHeight}, kOrtho, kEllips), 300, 2e-4) << pszCRS;
+        const std::string back = moTranscript.Take(); // the same of the inverse
+        EXPECT_EQ(CountLines(back), CountLines(there)) << back;
+        told += there;
     }
+    moTranscript.moLines = told;
     const double dfMetres = Convert("EPSG:32616+5703", {738669, 4045105, 300});
     EXPECT_NEAR(dfMetres, 330.5, 1.5) << "NAD83";
     EXPECT_NEAR(Convert("EPSG:32616+6360", {738669, 4045105, 300}) - 300,
                 (dfMetres - 300) / 1200 * 3937, 1e-6);
+}
+
+TEST_F(CRSTest, TheMostAccurateOperationThatHoldsAllPointsOfACallServes) {
+    for (const auto& [pszCRS, oCalls] : kChoices)
+        moTranscript.Refuses([&] {
+            const TransformPtr poTransform = MakeTransform(pszCRS);
+            for (const Points& points : oCalls) {
+                Points target;
+                const std::size_t nTold = moTranscript.moLines.size();
+                if (moTranscript.Refuses([&] { target = Transform(poTransform, points); }))
+                    continue;
+                const std::string& lines = moTranscript.moLines;
+                const std::size_t nName = lines.find('\'', nTold) + 1;
+                const std::string name = lines.substr(nName, lines.find('\'', nName) - nName);
+                EXPECT_NEAR(target[2], AskProj(pszCRS, name, points), 1e-9) << pszCRS;
+            }
+        });
+}
+
+TEST_F(CRSTest, AnAreaOfUseServesAHundredthOfADegreeBesideIt) {
+    for (const char* pszCRS : {"EPSG:4167", "EPSG:4258"}) { // the first crosses the 180th meridian
+        const PjPtr po(proj_create(nullptr, pszCRS), proj_destroy);
+        double w, s, e, n;
+        proj_get_area_of_use(nullptr, po.get(), &w, &s, &e, &n, nullptr);
+        const TransformPtr poTransform = MakeTransform(pszCRS);
+        for (const double d : {-0.012, -0.008, 0.008, 0.012})
+            for (const Points& point : {Points{w - d, s + 9, 9},
+                                        {e + d + 360, s + 9, 9},
+                                        {w + 9, s - d, 9},
+                                        {w + 9, n + d, 9}})
+                EXPECT_EQ(moTranscript.Refuses([&] { Transform(poTransform, point); }), d > 0.01)
+                    << pszCRS << ' ' << point[0] << ' ' << point[1];
+    }
+    moTranscript.moLines.clear();
 }
 
 TEST_F(CRSTest, DataIsFoundWhereTheHostsGdalFindsIt) {
@@ -186,7 +287,8 @@ TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
         ASSERT_LE(nNodes, 900000U); // as long as a walk over a million triangles
         Points nodes(std::size_t{3} * nNodes), centres;
         oGrid.GetGridPositions(nodes.data());
-        const Points heights = Transform(pszCRS, nodes);
+        const TransformPtr poTransform = MakeTransform(pszCRS);
+        const Points heights = Transform(poTransform, nodes);
         for (std::size_t i = 0; i < nNodes; ++i)
             oGrid.GetArray()[i] = static_cast<double>(static_cast<float>(heights[3 * i + 2]));
         std::size_t nRow = 3;
@@ -196,7 +298,7 @@ TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
             if (nodes[i] > x)
                 centres.insert(centres.end(),
                                {(nodes[j] + nodes[i]) / 2, (nodes[j + 1] + nodes[i + 1]) / 2, 755});
-        const Points expected = Transform(pszCRS, centres);
+        const Points expected = Transform(poTransform, centres);
         for (std::size_t i = 0; i < centres.size(); i += 3) {
             double dfFound = 0;
             oGrid.GetVal(centres[i], centres[i + 1], centres[i + 2], &dfFound);
