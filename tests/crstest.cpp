@@ -87,23 +87,21 @@ double AskProj(const std::string& crs, const std::string& name, const Points& po
     const PjPtr poMap(proj_create(nullptr, crs.c_str()), proj_destroy),
         poFrom(proj_crs_promote_to_3D(nullptr, nullptr, poMap.get()), proj_destroy),
         poTo(proj_create(nullptr, (crs + "+5773").c_str()), proj_destroy);
-    const std::unique_ptr<PJ_OPERATION_FACTORY_CONTEXT,
-                          decltype(&proj_operation_factory_context_destroy)>
-        poFactory(proj_create_operation_factory_context(nullptr, nullptr),
-                  proj_operation_factory_context_destroy);
+    auto* const poSearch = proj_create_operation_factory_context(nullptr, nullptr);
     proj_operation_factory_context_set_spatial_criterion(
-        nullptr, poFactory.get(), PROJ_SPATIAL_CRITERION_PARTIAL_INTERSECTION);
-    const std::unique_ptr<PJ_OBJ_LIST, decltype(&proj_list_destroy)> poList(
-        proj_create_operations(nullptr, poFrom.get(), poTo.get(), poFactory.get()),
-        proj_list_destroy);
-    for (int n = 0; n < proj_list_get_count(poList.get()); ++n) {
-        const PjPtr po(proj_list_get(nullptr, poList.get(), n), proj_destroy);
+        nullptr, poSearch, PROJ_SPATIAL_CRITERION_PARTIAL_INTERSECTION);
+    auto* const poList = proj_create_operations(nullptr, poFrom.get(), poTo.get(), poSearch);
+    double dfHeight = std::nan("");
+    for (int n = 0; n < proj_list_get_count(poList); ++n) {
+        const PjPtr po(proj_list_get(nullptr, poList, n), proj_destroy);
         const PjPtr poOurs(proj_normalize_for_visualization(nullptr, po.get()), proj_destroy);
         const PJ_COORD oPoint = proj_coord(points[0], points[1], points[2], HUGE_VAL);
         if (proj_get_name(po.get()) == name)
-            return proj_trans(poOurs.get(), PJ_FWD, oPoint).xyz.z;
+            dfHeight = proj_trans(poOurs.get(), PJ_FWD, oPoint).xyz.z;
     }
-    return std::nan("");
+    proj_list_destroy(poList);
+    proj_operation_factory_context_destroy(poSearch);
+    return dfHeight;
 }
 
 /// @return the height of the first point
