@@ -157,10 +157,8 @@ const struct {
     {"EPSG:4284",
      {{50, 42, 9},
       {37, 55, 9, 50, 42, 9},
-      {-170, 65, 9},
-      {190, 65, 9},
-      {24, 57, 9},
-      {44.5, 40, 9},
+      {37, 55, 9, -170, 65, 9, 190, 65, 9, 24, 57, 9},
+      {44.5, 40, 9, 45, 40, 9},
       {44.5, 40, 9, 45, 40, 9, 37, 55, 9},
       {-160, 65, 9, 37, 55, 9, 0, 55, 9}}},
     {"EPSG:4740",
@@ -176,6 +174,14 @@ const struct {
     // Better ones for places in the same latitudes, farther west and farther east.
     {"EPSG:4630", {{-139.5, -8.9, 9}}},
     {"EPSG:4230", {{-13, 36, 9}, {-3, 40, 9}, {9, 56, 9}}},
+    {"EPSG:8996", {{175, -40, 9}, {130, -25, 9}}}, // drifts with a time that is not known
+    // A failure, of which the next call knows nothing, and what is no place of a vertex.
+    {"EPSG:4326",
+     {{10, 50, 1, 10, 150, 2, 10, 151, 3},
+      {10, 50, 9},
+      {10, 50, 1e8, NAN, 50, 9, 10, NAN, 9, 10, 50, NAN, 10, 50, -1.1e8, 10, 50, 1.1e8}}},
+    {"EPSG:4301", {{139, 36, 9}}}, // a shift of 4 m for Korea, and none below 9 m for Japan
+    {"+proj=longlat +datum=GGRS87 +type=crs", {{0, 0, 9}}}, // the area of the CRS is not known
     {"EPSG:4176", {{100, -80, 9}, {20, -80, 9}}},
     // Of two zones only the southern has its grid; beside all, in the area of the CRS.
     {"EPSG:32616+5703", {{738669, 4745105, 9}, {5e5, 6.65e6, 9}}}};
@@ -192,9 +198,8 @@ const struct {
     {"+proj=utm +zone=16 +datum=WGS84 +geoidgrids=no.gtx +type=crs", {}},
     {"+proj=utm +zone=16 +ellps=WGS84 +type=crs", {}},
     {"EPSG:4131", {}},
-    {"EPSG:4301", {139, 36, 100}}, // a shift of 4 m for Korea, and none below 9 m for Japan
-    {"EPSG:4326", {10, 50, 1, 10, 150, 2, 10, 151, 3}},
-    {"EPSG:4326", {10, 50, 1, 11, 50, std::nan(""), 10, 50, -3.4e38}}};
+    {"EPSG:8252", {0, 0, 9}}, // an area without a name
+};
 
 } // namespace
 
@@ -236,10 +241,11 @@ TEST_F(CRSTest, TheMostAccurateOperationThatHoldsAllPointsOfACallServes) {
                 const std::size_t nTold = moTranscript.moLines.size();
                 if (moTranscript.Refuses([&] { target = Transform(poTransform, points); }))
                     continue;
-                const std::string& lines = moTranscript.moLines;
+                std::string& lines = moTranscript.moLines;
                 const std::size_t nName = lines.find('\'', nTold) + 1;
                 const std::string name = lines.substr(nName, lines.find('\'', nName) - nName);
                 EXPECT_NEAR(target[2], AskProj(pszCRS, name, points), 1e-9) << pszCRS;
+                lines.resize(lines.find('\n', nTold) + 1); // the warning is told above
             }
         });
 }
@@ -334,10 +340,10 @@ TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {
 }
 
 TEST_F(CRSTest, HeightsOfTheSameKindNeedNoChange) {
-    const CRSPtr poFrom = MakeCompound(ReadCRS("EPSG:4326"), kOrtho),
-                 poTo = MakeCompound(ReadCRS("EPSG:9057"), kOrtho);
+    const CRSPtr poFrom = MakeCompound(ReadCRS("EPSG:4619"), kOrtho),
+                 poTo = MakeCompound(ReadCRS("EPSG:4258"), kOrtho);
     const TransformPtr poTransform(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
-    EXPECT_EQ(Transform(poTransform, {10, 50, 0.3})[2], 0.3);
+    EXPECT_EQ(Transform(poTransform, {15, 60, 0.3})[2], 0.3);
 }
 
 TEST_F(CRSTest, EqualHeightsPassBitForBitEvenIfNothingCouldConvertThem) {

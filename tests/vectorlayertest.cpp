@@ -190,10 +190,7 @@ TEST_F(VectorLayerTest, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
                R"(<!DOCTYPE c [<!ENTITY % e SYSTEM "http://127.0.0.1:9"> %e;]>)");
     moFolder.WriteFile("a.xsd", R"(<xs:schema xmlns:xs="http://www.w3.org/2001/XMLSchema">)"
                                 R"(<xs:include schemaLocation="http://127.0.0.1:9"/></xs:schema>)");
-    CPLSetConfigOption("GML_PARSER", "XERCES");
     EXPECT_EQ(Read(moFolder.WriteFile("a.gml", gml)).moIds.size(), 1U);
-    EXPECT_STREQ(CPLGetConfigOption("GML_PARSER", ""), "XERCES") << "the host's choice stands";
-    CPLSetConfigOption("GML_PARSER", nullptr);
     EXPECT_FALSE(fs::exists(moFolder.GetPath("a.gfs")));
 
     const std::string spy = moFolder.GetPath("spy.sqlite"), other = WriteRow(kShape, 1);
@@ -323,16 +320,6 @@ TEST_F(VectorLayerTest, TheBytesOfAGeoPackageGiveWhatItsGeometriesGive) {
         EXPECT_EQ(said[0].size(), 82U);
         EXPECT_EQ(said[0], said[1]);
     }
-}
-
-TEST_F(VectorLayerTest, TheHostGetsBackItsStateOfGdal) {
-    const char* const options[] = {"GML_PARSER=XERCES",
-                                   "OGR_SQLITE_STATIC_VIRTUAL_OGR=", "HOST=own", nullptr};
-    const std::string pathGml = WriteRow(kGml, 3), pathGpkg = WriteRow(kGpkg, 3);
-    CPLSetThreadLocalConfigOptions(options);
-    for (const std::string& path : {pathGml, pathGpkg, moFolder.GetPath("no")})
-        moTranscript.Refuses([&] { GetCrs(Read(path).mpo); });
-    CPLSetThreadLocalConfigOptions(std::array<const char*, 2>{"CPL_DEBUG=TIN", nullptr}.data());
 }
 
 } // namespace

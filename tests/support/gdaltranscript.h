@@ -12,12 +12,14 @@ struct GdalTranscript : Transcript {
         CPLPushErrorHandlerEx(Keep, this);
         CPLHTTPPushFetchCallback(Fetch, nullptr);
         CPLSetThreadLocalConfigOption("CPL_DEBUG", "TIN");
+        CPLSetThreadLocalConfigOption("GML_PARSER", "XERCES"); // which the store must not use
         moHost = DescribeHost();
     }
     ~GdalTranscript() {
         EXPECT_EQ(DescribeHost(), moHost);
         EXPECT_EQ(ListOpenFiles(), moFiles);
-        CPLSetThreadLocalConfigOption("CPL_DEBUG", nullptr);
+        for (const char* pszOption : {"CPL_DEBUG", "GML_PARSER"})
+            CPLSetThreadLocalConfigOption(pszOption, nullptr);
         CPLHTTPPopFetchCallback();
         CPLPopErrorHandler();
     }
