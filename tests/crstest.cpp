@@ -127,8 +127,8 @@ const struct {
     {"EPSG:3035", 1835000, 1030000,
      "+inv +proj=laea +lat_0=52 +lon_0=10 +x_0=4321000 +y_0=3210000 +ellps=GRS80 "},
     {"+proj=longlat +datum=WGS84 +vunits=ft +type=crs", -84.2, 36.3, kFromDegrees, 0.3048},
-    {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +type=crs", 738669, 4045105,
-     kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart "},
+    {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +vunits=ft +type=crs", 738669, 4045105,
+     kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart ", 0.3048},
     {"EPSG:3857", -9373101, 4344013, kFromWebMercator},
     {"EPSG:3857+5773", 1e6, 7e6, kFromWebMercator},
     // Of 17 ways to WGS 84 and back, most for one state, none moves a height or needs its grid.
@@ -332,8 +332,9 @@ TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {
         utils::CreateCRSTransform(poSource.get(), poTarget.get(), 0.0);
     };
     for (const auto& work : std::vector<std::function<void()>>{
-             [&] { Create(po3D, poLocal); }, [&] { Create(poUtm, po3D); },
-             [&] { Create(po3D, nullptr); }, [&] { utils::IsCRSLocal(&oForeign); },
+             [&] { Create(po3D, poLocal); }, [&] { Create(poLocal, po3D); },
+             [&] { Create(poUtm, po3D); }, [&] { Create(po3D, nullptr); },
+             [&] { utils::IsCRSLocal(&oForeign); },
              [&] { utils::CreateCompoundCS(poUtm.get(), kOrtho, cs::LinearUnitType(7)); },
              [] { ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(nullptr); }})
         EXPECT_TRUE(moTranscript.Refuses(work));
@@ -356,4 +357,5 @@ TEST_F(CRSTest, EqualHeightsPassBitForBitEvenIfNothingCouldConvertThem) {
         const auto eDatum = bLocal ? static_cast<cs::DatumType>(2345) : kOrtho;
         EXPECT_EQ(Convert(crs, {0.3, 1e7, 0.1 + 0.2}, eDatum, eDatum), 0.1 + 0.2) << crs;
     }
+    Convert("", {}); // no height, nothing to convert
 }
