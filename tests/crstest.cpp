@@ -10,6 +10,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <limits>
 
 using namespace kelm::ogc;
 
@@ -20,6 +21,7 @@ using TransformPtr = std::unique_ptr<ct::IMathTransform>;
 using PjPtr = std::unique_ptr<PJ, decltype(&proj_destroy)>;
 using Points = std::vector<double>;
 
+constexpr double kNan = std::numeric_limits<double>::quiet_NaN();
 constexpr cs::DatumType kOrtho = cs::VD_Orthometric;
 constexpr cs::DatumType kEllips = cs::VD_Ellipsoidal;
 
@@ -91,7 +93,7 @@ double AskProj(const std::string& crs, const std::string& name, const Points& po
     proj_operation_factory_context_set_spatial_criterion(
         nullptr, poSearch, PROJ_SPATIAL_CRITERION_PARTIAL_INTERSECTION);
     auto* const poList = proj_create_operations(nullptr, poFrom.get(), poTo.get(), poSearch);
-    double dfHeight = std::nan("");
+    double dfHeight = kNan;
     for (int n = 0; n < proj_list_get_count(poList); ++n) {
         const PjPtr po(proj_list_get(nullptr, poList, n), proj_destroy);
         const PjPtr poOurs(proj_normalize_for_visualization(nullptr, po.get()), proj_destroy);
@@ -179,7 +181,7 @@ const struct {
     {"EPSG:4326",
      {{10, 50, 1, 10, 150, 2, 10, 151, 3},
       {10, 50, 9},
-      {10, 50, 1e8, NAN, 50, 9, 10, NAN, 9, 10, 50, NAN, 10, 50, -1.1e8, 10, 50, 1.1e8}}},
+      {10, 50, 1e8, kNan, 50, 9, 10, kNan, 9, 10, 50, kNan, 10, 50, -1.1e8, 10, 50, 1.1e8}}},
     {"EPSG:4301", {{139, 36, 9}}}, // a shift of 4 m for Korea, and none below 9 m for Japan
     {"+proj=longlat +datum=GGRS87 +type=crs", {{0, 0, 9}}}, // the area of the CRS is not known
     {"EPSG:4176", {{100, -80, 9}, {20, -80, 9}}},
@@ -231,12 +233,12 @@ TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
 }
 
 TEST_F(CRSTest, TheMostAccurateOperationThatHoldsAllPointsOfACallServes) {
-    for (const auto& [pszCRS, oCalls] : kChoices)
+    for (const auto& oRow : kChoices)
         moTranscript.Refuses([&] {
             const std::string told = moTranscript.moLines;
-            const TransformPtr poTransform = MakeTransform(pszCRS);
+            const TransformPtr poTransform = MakeTransform(oRow.mpszCRS);
             moTranscript.moLines = told; // other tests read the list
-            for (const Points& points : oCalls) {
+            for (const Points& points : oRow.moCalls) {
                 Points target;
                 const std::size_t nTold = moTranscript.moLines.size();
                 if (moTranscript.Refuses([&] { target = Transform(poTransform, points); }))
@@ -244,7 +246,7 @@ TEST_F(CRSTest, TheMostAccurateOperationThatHoldsAllPointsOfACallServes) {
                 std::string& lines = moTranscript.moLines;
                 const std::size_t nName = lines.find('\'', nTold) + 1;
                 const std::string name = lines.substr(nName, lines.find('\'', nName) - nName);
-                EXPECT_NEAR(target[2], AskProj(pszCRS, name, points), 1e-9) << pszCRS;
+                EXPECT_NEAR(target[2], AskProj(oRow.mpszCRS, name, points), 1e-9) << oRow.mpszCRS;
                 lines.resize(lines.find('\n', nTold) + 1); // the warning is told above
             }
         });

@@ -26,17 +26,17 @@ inline std::string DescribeHost() {
         CPLGetErrorHandlerUserData(), poResult->pszErrBuf, proj_context_is_network_enabled(nullptr),
         setlocale(LC_ALL, nullptr), fegetround(), omp_get_max_threads(), omp_get_dynamic(),
         omp_get_max_active_levels(), std::filesystem::current_path().c_str());
-    for (char** ppszOption = CPLGetThreadLocalConfigOptions(); ppszOption && *ppszOption;)
-        text.append(", ").append(*ppszOption++);
+    const CPLStringList oOptions(CPLGetThreadLocalConfigOptions());
+    for (int n = 0; n < oOptions.size(); ++n)
+        text.append(", ").append(oOptions[n]);
     return text;
 }
 
 /// @return the files that the process holds open, but for the database that PROJ keeps
 inline std::string ListOpenFiles() {
     std::string files;
-    std::error_code oNone; // of the listing's own handle
     for (const auto& oEntry : std::filesystem::directory_iterator("/proc/self/fd"))
-        if (const auto path = read_symlink(oEntry, oNone); path.filename() != "proj.db")
+        if (const auto path = read_symlink(oEntry); path.filename() != "proj.db")
             files += path.string().find("/proc/") == 0 ? "" : path.string() + '\n';
     return files;
 }
@@ -47,7 +47,6 @@ struct HostCall {
     HostCall(const HostCall&) = delete;
     ~HostCall() {
         EXPECT_EQ(CPLGetLastErrorType(), CE_Failure);
-        EXPECT_EQ(CPLGetLastErrorNo(), 42);
         EXPECT_STREQ(CPLGetLastErrorMsg(), "the host's own");
         EXPECT_EQ(DescribeHost(), moBefore);
     }
