@@ -6,17 +6,22 @@
 
 #include <ogr_srs_api.h>
 #include <proj.h>
+#include <proj_experimental.h>
 
+#include <algorithm>
 #include <cmath>
+#include <limits>
 
 using namespace kelm::ogc;
 
 namespace {
 
 using CRSPtr = std::unique_ptr<cs::ICRS>;
+using TransformPtr = std::unique_ptr<ct::IMathTransform>;
 using PjPtr = std::unique_ptr<PJ, decltype(&proj_destroy)>;
 using Points = std::vector<double>;
 
+constexpr double kNan = std::numeric_limits<double>::quiet_NaN();
 constexpr cs::DatumType kOrtho = cs::VD_Orthometric;
 constexpr cs::DatumType kEllips = cs::VD_Ellipsoidal;
 
@@ -63,22 +68,48 @@ CRSPtr MakeCompound(const CRSPtr& poMap, cs::DatumType eDatum) {
     return CRSPtr(utils::CreateCompoundCS(poMap->GetHorizontalCRS(), eDatum, cs::LU_Default));
 }
 
-/// @return the points with their heights converted, and one more
-Points Transform(const std::string& crs, const Points& points, cs::DatumType eFrom = kEllips,
-                 cs::DatumType eTo = kOrtho, bool bWkt = true) {
+TransformPtr MakeTransform(const std::string& crs, cs::DatumType eFrom = kEllips,
+                           cs::DatumType eTo = kOrtho, bool bWkt = true) {
     const CRSPtr poMap = ReadCRS(crs, bWkt);
     const CRSPtr poFrom = MakeCompound(poMap, eFrom), poTo = MakeCompound(poMap, eTo);
     EXPECT_EQ(poMap->GetDimension() + 1, poFrom->GetDimension()) << crs;
+    return TransformPtr(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
+}
+
+/// @return the points with their heights converted, and one more
+Points Transform(const TransformPtr& poTransform, const Points& points) {
     Points target(points.size() + 3);
-    std::unique_ptr<ct::IMathTransform>(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0))
-        ->TransformPoints(points.data(), target.data(), static_cast<unsigned>(points.size() / 3));
+    poTransform->TransformPoints(points.data(), target.data(),
+                                 static_cast<unsigned>(points.size() / 3));
     return target;
+}
+
+/// @return the height of a point by the operation of this name among those that PROJ lists
+double AskProj(const std::string& crs, const std::string& name, const Points& points) {
+    const PjPtr poMap(proj_create(nullptr, crs.c_str()), proj_destroy),
+        poFrom(proj_crs_promote_to_3D(nullptr, nullptr, poMap.get()), proj_destroy),
+        poTo(proj_create(nullptr, (crs + "+5773").c_str()), proj_destroy);
+    auto* const poSearch = proj_create_operation_factory_context(nullptr, nullptr);
+    proj_operation_factory_context_set_spatial_criterion(
+        nullptr, poSearch, PROJ_SPATIAL_CRITERION_PARTIAL_INTERSECTION);
+    auto* const poList = proj_create_operations(nullptr, poFrom.get(), poTo.get(), poSearch);
+    double dfHeight = kNan;
+    for (int n = 0; n < proj_list_get_count(poList); ++n) {
+        const PjPtr po(proj_list_get(nullptr, poList, n), proj_destroy);
+        const PjPtr poOurs(proj_normalize_for_visualization(nullptr, po.get()), proj_destroy);
+        const PJ_COORD oPoint = proj_coord(points[0], points[1], points[2], HUGE_VAL);
+        if (proj_get_name(po.get()) == name)
+            dfHeight = proj_trans(poOurs.get(), PJ_FWD, oPoint).xyz.z;
+    }
+    proj_list_destroy(poList);
+    proj_operation_factory_context_destroy(poSearch);
+    return dfHeight;
 }
 
 /// @return the height of the first point
 template <typename... Arguments>
 double Convert(const std::string& crs, const Points& points, Arguments... arguments) {
-    return Transform(crs, points, arguments...)[2];
+    return Transform(MakeTransform(crs, arguments...), points)[2];
 }
 
 const std::string kFromUtm = "+inv +proj=utm +zone=16 +ellps=WGS84 ";
@@ -98,13 +129,21 @@ const struct {
     {"EPSG:3035", 1835000, 1030000,
      "+inv +proj=laea +lat_0=52 +lon_0=10 +x_0=4321000 +y_0=3210000 +ellps=GRS80 "},
     {"+proj=longlat +datum=WGS84 +vunits=ft +type=crs", -84.2, 36.3, kFromDegrees, 0.3048},
-    {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +type=crs", 738669, 4045105,
-     kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart "},
+    {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +vunits=ft +type=crs", 738669, 4045105,
+     kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart ", 0.3048},
+    // Positions in feet and no height axis: heights are metres, and a warning says so.
+    {"EPSG:2274", 2400000, 700000,
+     "+inv +proj=lcc +lat_0=34.3333333333333 +lon_0=-86 +lat_1=35.25 +lat_2=36.4166666666667 "
+     "+x_0=600000 +units=us-ft +vunits=m +ellps=GRS80 "},
     {"EPSG:3857", -9373101, 4344013, kFromWebMercator},
     {"EPSG:3857+5773", 1e6, 7e6, kFromWebMercator},
     // Of 17 ways to WGS 84 and back, most for one state, none moves a height or needs its grid.
     {"EPSG:26916", 738669, 4e6, kFromUtm},
     {"EPSG:4269", -86.8, 36.5, kFromDegrees}, // on the border of two states
+    {"EPSG:4807", 2, 54,                      // grades east of Paris
+     "+proj=unitconvert +xy_in=grad +xy_out=rad +step +inv +proj=longlat +ellps=clrk80ign "
+     "+pm=paris +step +proj=cart +ellps=clrk80ign +step +proj=helmert +x=-168 +y=-60 +z=320 "
+     "+step +inv +proj=cart +ellps=WGS84 "},
     // Of these two, one operation shifts positions alone and the other points in space.
     {"EPSG:31467", 3513000, 5403000,
      "+inv +proj=tmerc +lon_0=9 +x_0=3500000 +ellps=bessel +step +proj=hgridshift "
@@ -114,6 +153,44 @@ const struct {
      "+y_0=463000 +ellps=bessel +step +proj=cart +ellps=bessel +step +proj=helmert +x=565.4171 "
      "+y=50.3319 +z=465.5524 +rx=0.398957388243134 +ry=-0.343987817378283 +rz=1.87740163998045 "
      "+s=4.0725 +convention=coordinate_frame +step +inv +proj=cart +ellps=WGS84 "}};
+
+/// Longitudes, latitudes and heights: each pair of braces is a call.
+const struct {
+    const char* mpszCRS;
+    std::vector<Points> moCalls;
+} kChoices[] = {
+    // Operations of 5 m, 7 m (beyond the 180th meridian, too), 10 m for all, and 11 m.
+    {"EPSG:4284",
+     {{50, 42, 9},
+      {37, 55, 9, 50, 42, 9},
+      {37, 55, 9, -170, 65, 9, 190, 65, 9, 24, 57, 9},
+      {44.5, 40, 9, 45, 40, 9},
+      {44.5, 40, 9, 45, 40, 9, 37, 55, 9},
+      {-160, 65, 9, 37, 55, 9, 0, 55, 9}}},
+    {"EPSG:4740",
+     {{37, 55, 9}, {0, 0, 9}, {37, 55, 9, 0, 0, 9}}}, // one of the world is the coarser
+    // The shifts for Czechia and Slovakia, equally accurate in plan, are 45 m apart in height.
+    {"EPSG:4156",
+     {{14, 50, 9}, {17.5, 49, 9}, {14, 50, 9, 17.5, 49, 9}, {20, 48.5, 9, 14, 50, 9}, {14, 48, 9}}},
+    {"EPSG:4283",
+     {{151, -33, 9}, {95, -33, 9}}}, // of three equals, that of the smallest area lacks its grid
+    {"EPSG:4272", {}},
+    // The northern one is the narrower, the southern one the smaller.
+    {"EPSG:4204", {{47.5, 29.3, 9}}},
+    // Better ones for places in the same latitudes, farther west and farther east.
+    {"EPSG:4630", {{-139.5, -8.9, 9}}},
+    {"EPSG:4230", {{-13, 36, 9}, {-3, 40, 9}, {9, 56, 9}}},
+    {"EPSG:8996", {{175, -40, 9}, {130, -25, 9}}}, // drifts with a time that is not known
+    // A failure, of which the next call knows nothing, and what is no place of a vertex.
+    {"EPSG:4326",
+     {{10, 50, 1, 10, 150, 2, 10, 151, 3},
+      {10, 50, 9},
+      {10, 50, 1e8, kNan, 50, 9, 10, kNan, 9, 10, 50, kNan, 10, 50, -1.1e8, 10, 50, 1.1e8}}},
+    {"EPSG:4301", {{139, 36, 9}}}, // a shift of 4 m for Korea, and none below 9 m for Japan
+    {"+proj=longlat +datum=GGRS87 +type=crs", {{0, 0, 9}}}, // the area of the CRS is not known
+    {"EPSG:4176", {{100, -80, 9}, {20, -80, 9}}},
+    // Of two zones only the southern has its grid; beside all, in the area of the CRS.
+    {"EPSG:32616+5703", {{738669, 4745105, 9}, {5e5, 6.65e6, 9}}}};
 
 const struct {
     const char* mpszCRS;
@@ -126,19 +203,18 @@ const struct {
     {"EPSG:32616+3855", {}},
     {"+proj=utm +zone=16 +datum=WGS84 +geoidgrids=no.gtx +type=crs", {}},
     {"+proj=utm +zone=16 +ellps=WGS84 +type=crs", {}},
-    {"EPSG:32616+5703", {738669, 4745105, 250}}, // of two zones only the southern has its grid
-    // The shifts for Czechia and Slovakia, equally accurate in plan, are 45 m apart in height.
-    {"EPSG:5514", {-5e5, -1.26e6, 300, -7.5e5, -1.04e6, 300}},
     {"EPSG:4131", {}},
-    {"EPSG:4301", {139, 36, 100}}, // a shift of 4 m for Korea, and none below 9 m for Japan
-    {"EPSG:4326", {10, 50, 1, 10, 150, 2, 10, 151, 3}},
-    {"EPSG:4326", {10, 50, 1, 11, 50, std::nan(""), 10, 50, -3.4e38}},
-    {"EPSG:2193", {1748735, 5427916, 1, 1748735, 9e6, 2}}};
+    {"EPSG:8252", {0, 0, 9}}, // an area without a name
+};
 
 } // namespace
 
 TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
     bool bWkt = false;
+    std::string told;
+    const auto CountLines = [](const std::string& text) {
+        return std::count(text.begin(), text.end(), '\n');
+    };
     for (const auto& [pszCRS, x, y, steps, dfUnit] : kConversions) {
         bWkt = !bWkt;
         const std::string geoid = "+step +inv +proj=vgridshift +grids=egm96_15.gtx +multiplier=1";
@@ -147,12 +223,54 @@ TEST_F(CRSTest, HeightsAreThoseOfTheGeoidGridAndComeBack) {
         const PJ_COORD oSource = proj_coord(x, y, 300 * dfUnit, HUGE_VAL);
         const double dfHeight = Convert(pszCRS, {x, y, 300}, kEllips, kOrtho, bWkt);
         EXPECT_NEAR(dfHeight * dfUnit, proj_trans(po.get(), PJ_FWD, oSource).xyz.z, 1e-6) << pszCRS;
+        const std::string there = moTranscript.Take();
         EXPECT_NEAR(Convert(pszCRS, {x, y, dfHeight}, kOrtho, kEllips), 300, 2e-4) << pszCRS;
+        const std::string back = moTranscript.Take(); // the same of the inverse
+        EXPECT_EQ(CountLines(back), CountLines(there)) << back;
+        told += there;
     }
+    moTranscript.moLines = told;
     const double dfMetres = Convert("EPSG:32616+5703", {738669, 4045105, 300});
     EXPECT_NEAR(dfMetres, 330.5, 1.5) << "NAD83";
     EXPECT_NEAR(Convert("EPSG:32616+6360", {738669, 4045105, 300}) - 300,
                 (dfMetres - 300) / 1200 * 3937, 1e-6);
+}
+
+TEST_F(CRSTest, TheMostAccurateOperationThatHoldsAllPointsOfACallServes) {
+    for (const auto& oRow : kChoices)
+        moTranscript.Refuses([&] {
+            const std::string told = moTranscript.moLines;
+            const TransformPtr poTransform = MakeTransform(oRow.mpszCRS);
+            moTranscript.moLines = told; // other tests read the list
+            for (const Points& points : oRow.moCalls) {
+                Points target;
+                const std::size_t nTold = moTranscript.moLines.size();
+                if (moTranscript.Refuses([&] { target = Transform(poTransform, points); }))
+                    continue;
+                std::string& lines = moTranscript.moLines;
+                const std::size_t nName = lines.find('\'', nTold) + 1;
+                const std::string name = lines.substr(nName, lines.find('\'', nName) - nName);
+                EXPECT_NEAR(target[2], AskProj(oRow.mpszCRS, name, points), 1e-9) << oRow.mpszCRS;
+                lines.resize(lines.find('\n', nTold) + 1); // the warning is told above
+            }
+        });
+}
+
+TEST_F(CRSTest, AnAreaOfUseServesAHundredthOfADegreeBesideIt) {
+    for (const char* pszCRS : {"EPSG:4167", "EPSG:4258"}) { // the first crosses the 180th meridian
+        const PjPtr po(proj_create(nullptr, pszCRS), proj_destroy);
+        double w, s, e, n;
+        proj_get_area_of_use(nullptr, po.get(), &w, &s, &e, &n, nullptr);
+        const TransformPtr poTransform = MakeTransform(pszCRS);
+        for (const double d : {-0.012, -0.008, 0.008, 0.012})
+            for (const Points& point : {Points{w - d, s + 9, 9},
+                                        {e + d + 360, s + 9, 9},
+                                        {w + 9, s - d, 9},
+                                        {w + 9, n + d, 9}})
+                EXPECT_EQ(moTranscript.Refuses([&] { Transform(poTransform, point); }), d > 0.01)
+                    << pszCRS << ' ' << point[0] << ' ' << point[1];
+    }
+    moTranscript.moLines.clear();
 }
 
 TEST_F(CRSTest, DataIsFoundWhereTheHostsGdalFindsIt) {
@@ -186,7 +304,8 @@ TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
         ASSERT_LE(nNodes, 900000U); // as long as a walk over a million triangles
         Points nodes(std::size_t{3} * nNodes), centres;
         oGrid.GetGridPositions(nodes.data());
-        const Points heights = Transform(pszCRS, nodes);
+        const TransformPtr poTransform = MakeTransform(pszCRS);
+        const Points heights = Transform(poTransform, nodes);
         for (std::size_t i = 0; i < nNodes; ++i)
             oGrid.GetArray()[i] = static_cast<double>(static_cast<float>(heights[3 * i + 2]));
         std::size_t nRow = 3;
@@ -196,7 +315,7 @@ TEST_F(CRSTest, InterpolatedHeightsAreThoseOfTheTransform) {
             if (nodes[i] > x)
                 centres.insert(centres.end(),
                                {(nodes[j] + nodes[i]) / 2, (nodes[j + 1] + nodes[i + 1]) / 2, 755});
-        const Points expected = Transform(pszCRS, centres);
+        const Points expected = Transform(poTransform, centres);
         for (std::size_t i = 0; i < centres.size(); i += 3) {
             double dfFound = 0;
             oGrid.GetVal(centres[i], centres[i + 1], centres[i + 2], &dfFound);
@@ -219,11 +338,19 @@ TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {
         utils::CreateCRSTransform(poSource.get(), poTarget.get(), 0.0);
     };
     for (const auto& work : std::vector<std::function<void()>>{
-             [&] { Create(po3D, poLocal); }, [&] { Create(poUtm, po3D); },
-             [&] { Create(po3D, nullptr); }, [&] { utils::IsCRSLocal(&oForeign); },
+             [&] { Create(po3D, poLocal); }, [&] { Create(poLocal, po3D); },
+             [&] { Create(poUtm, po3D); }, [&] { Create(po3D, nullptr); },
+             [&] { utils::IsCRSLocal(&oForeign); },
              [&] { utils::CreateCompoundCS(poUtm.get(), kOrtho, cs::LinearUnitType(7)); },
              [] { ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(nullptr); }})
         EXPECT_TRUE(moTranscript.Refuses(work));
+}
+
+TEST_F(CRSTest, HeightsOfTheSameKindNeedNoChange) {
+    const CRSPtr poFrom = MakeCompound(ReadCRS("EPSG:4619"), kOrtho),
+                 poTo = MakeCompound(ReadCRS("EPSG:4258"), kOrtho);
+    const TransformPtr poTransform(utils::CreateCRSTransform(poFrom.get(), poTo.get(), 0.0));
+    EXPECT_EQ(Transform(poTransform, {15, 60, 0.3})[2], 0.3);
 }
 
 TEST_F(CRSTest, EqualHeightsPassBitForBitEvenIfNothingCouldConvertThem) {
@@ -236,4 +363,5 @@ TEST_F(CRSTest, EqualHeightsPassBitForBitEvenIfNothingCouldConvertThem) {
         const auto eDatum = bLocal ? static_cast<cs::DatumType>(2345) : kOrtho;
         EXPECT_EQ(Convert(crs, {0.3, 1e7, 0.1 + 0.2}, eDatum, eDatum), 0.1 + 0.2) << crs;
     }
+    Convert("", {}); // no height, nothing to convert
 }

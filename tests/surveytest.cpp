@@ -148,7 +148,10 @@ TEST_F(SurveyTest, AStopLeavesNothingBehind) {
             Listener oListener;
             oListener.mdfStop = 0.1 * nTenth;
             oListener.mbThrows = bThrows;
-            const auto Load = [&] { delete poReader->Load(nullptr, With(oListener)); };
+            const auto Load = [&] {
+                const HostCall oCall;
+                delete poReader->Load(nullptr, With(oListener));
+            };
             const auto Open = [&] { OpenSurveyed(path, "", 0, oListener.Get()); };
             if (bThrows) {
                 EXPECT_THROW(Load(), std::out_of_range);

@@ -2,7 +2,6 @@
 #include "services/bundled/store/gdal/warnings.h"
 #include "tests/support/filetest.h"
 
-#include <cpl_http.h>
 #include <sys/stat.h>
 
 using namespace kelm::test;
@@ -16,7 +15,7 @@ Ring MakeRing(double x, double y, double z) {
 
 /// The first layer of a file, by one walk. The ring of a shape that is refused is empty.
 struct Layer {
-    Layer(const std::string& path, Transcript& oTranscript) : mpoFile(OpenFile(path)) {
+    Layer(const std::string& path, GdalTranscript& oTranscript) : mpoFile(OpenFile(path)) {
         for (int nId = mpo ? ZARGetNext(mpo, -1) : -1; nId != -1; nId = ZARGetNext(mpo, nId)) {
             moIds.push_back(nId);
             moRings.emplace_back();
@@ -192,10 +191,7 @@ TEST_F(VectorLayerTest, AFileMakesTheStoreNeitherConnectNorOpenOthersNorWrite) {
                R"(<!DOCTYPE c [<!ENTITY % e SYSTEM "http://127.0.0.1:9"> %e;]>)");
     moFolder.WriteFile("a.xsd", R"(<xs:schema xmlns:xs="http://www.w3.org/2001/XMLSchema">)"
                                 R"(<xs:include schemaLocation="http://127.0.0.1:9"/></xs:schema>)");
-    CPLSetConfigOption("GML_PARSER", "XERCES");
     EXPECT_EQ(Read(moFolder.WriteFile("a.gml", gml)).moIds.size(), 1U);
-    EXPECT_STREQ(CPLGetConfigOption("GML_PARSER", ""), "XERCES") << "the host's choice stands";
-    CPLSetConfigOption("GML_PARSER", nullptr);
     EXPECT_FALSE(fs::exists(moFolder.GetPath("a.gfs")));
 
     const std::string spy = moFolder.GetPath("spy.sqlite"), other = WriteRow(kShape, 1);
@@ -325,40 +321,6 @@ TEST_F(VectorLayerTest, TheBytesOfAGeoPackageGiveWhatItsGeometriesGive) {
         EXPECT_EQ(said[0].size(), 82U);
         EXPECT_EQ(said[0], said[1]);
     }
-}
-
-TEST_F(VectorLayerTest, TheHostGetsBackItsStateOfGdal) {
-    const std::pair<const char*, const char*> options[] = {{"GML_PARSER", "XERCES"},
-                                                           {"GML_SKIP_RESOLVE_ELEMS", nullptr},
-                                                           {"SPATIALITE_LOAD", "YES"},
-                                                           {"GML_SKIP_CORRUPTED_FEATURES", nullptr},
-                                                           {"SHAPE_RESTORE_SHX", nullptr},
-                                                           {"OGR_SQLITE_LOAD_EXTENSIONS", nullptr},
-                                                           {"OGR_SQLITE_STATIC_VIRTUAL_OGR", ""}};
-    const auto Fetch = [](const char*, CSLConstList, GDALProgressFunc, void*, CPLHTTPFetchWriteFunc,
-                          void*, void* pCalls) -> CPLHTTPResult* {
-        ++*static_cast<int*>(pCalls);
-        return static_cast<CPLHTTPResult*>(CPLCalloc(1, sizeof(CPLHTTPResult)));
-    };
-    int nCalls = 0;
-    CPLHTTPPushFetchCallback(Fetch, &nCalls);
-    for (const auto& [pszKey, pszValue] : options)
-        CPLSetThreadLocalConfigOption(pszKey, pszValue);
-    for (const std::string& path :
-         {WriteRow(kGml, 3), WriteRow(kGpkg, 3), moFolder.GetPath("no")}) {
-        CPLErrorReset();
-        moTranscript.Refuses([&] { GetCrs(Read(path).mpo); });
-        EXPECT_EQ(CPLGetLastErrorType(), CE_None);
-        EXPECT_STREQ(CPLGetLastErrorMsg(), "");
-        EXPECT_EQ(CPLGetErrorHandlerUserData(), &moTranscript);
-        for (const auto& [pszKey, pszValue] : options)
-            EXPECT_STREQ(CPLGetThreadLocalConfigOption(pszKey, nullptr), pszValue) << pszKey;
-        CPLHTTPDestroyResult(CPLHTTPFetch("http://127.0.0.1:9", nullptr));
-    }
-    EXPECT_EQ(nCalls, 3);
-    CPLHTTPPopFetchCallback();
-    for (const auto& [pszKey, pszValue] : options)
-        CPLSetThreadLocalConfigOption(pszKey, nullptr);
 }
 
 TEST_F(VectorLayerTest, TextsOfWarningsBeyondAThousandAreCountedTogether) {

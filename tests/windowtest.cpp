@@ -191,6 +191,13 @@ TEST_F(WindowTest, AFileThatWasWrittenToIsReadAsItIsThen) {
     ASSERT_NE(Print(poReader->Load(&oWindow)), "");
     Execute(path, "DELETE FROM facets WHERE fid = 1"); // beside the window
     EXPECT_TRUE(moTranscript.Refuses([&] { poReader->Load(&oWindow); }));
+
+    // As if nothing had been written.
+    const std::string survey = OpenReader(Write(MakeLayer(4, false)))->GetSurvey();
+    const auto tNow = fs::last_write_time(path);
+    Execute(path, "DELETE FROM facets WHERE fid = 3");
+    fs::last_write_time(path, tNow);
+    EXPECT_TRUE(moTranscript.Refuses([&] { OpenSurveyed(path, survey)->Load(&oWindow); }));
 }
 
 TEST_F(WindowTest, ManyFeaturesShareTheirBlocks) {

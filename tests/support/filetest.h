@@ -19,6 +19,7 @@ using File = std::unique_ptr<_iobuf, decltype(&ZARClose)>;
 using Ring = std::vector<std::array<double, 3>>;
 
 inline File OpenFile(const std::string& path) {
+    const HostCall oCall;
     return {ZAROpen(path.c_str(), "r"), ZARClose};
 }
 
@@ -38,6 +39,7 @@ inline std::string GetCrs(ZARLayer_t* poLayer) {
 
 inline std::unique_ptr<tin::TinReader> OpenReader(const std::string& path, int nLayer = 0,
                                                   ogc::cs::DatumType eDatum = ogc::cs::VD_Other) {
+    const HostCall oCall;
     return std::unique_ptr<tin::TinReader>(
         tin::TinReaderFactory::CreateTinReader(path.c_str(), nLayer, 0.0, 1.0, eDatum));
 }
@@ -46,6 +48,7 @@ inline std::unique_ptr<tin::TinReader> OpenReader(const std::string& path, int n
 inline std::unique_ptr<tin::TinReader> OpenSurveyed(const std::string& path,
                                                     const std::string& survey, int nLayer = 0,
                                                     const tin::Progress& oProgress = {}) {
+    const HostCall oCall;
     return std::unique_ptr<tin::TinReader>(tin::TinReaderFactory::CreateTinReader(
         path.c_str(), nLayer, 0.0, 1.0, ogc::cs::VD_Other, {survey, oProgress}));
 }

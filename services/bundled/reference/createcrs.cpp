@@ -117,11 +117,11 @@ HeightUnit GetLayerUnit(ProjSession& session, const CRSText& text) {
 
 /// @return the CRS with ellipsoidal heights as PROJJSON
 std::string CreateEllipsoidal(const CRSText& text) {
-    if (!text.moEllipsoidal.empty())
-        return text.moEllipsoidal;
     ProjSession session;
-    const PjPtr flat = session.CreateFromText(text.moDefinition);
-    const PjPtr spatial(proj_crs_promote_to_3D(session.Get(), nullptr, flat.get()));
+    const bool named = !text.moEllipsoidal.empty();
+    const PjPtr crs = session.CreateFromText(named ? text.moEllipsoidal : text.moDefinition);
+    // A bound CRS of three axes may have a hub of two, and PROJ's shift then leaves heights alone.
+    const PjPtr spatial(proj_crs_promote_to_3D(session.Get(), nullptr, crs.get()));
     const HeightUnit unit = GetLayerUnit(session, text);
     return session.GetText(SetHeightUnit(session, spatial.get(), unit).get());
 }
