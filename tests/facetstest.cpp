@@ -213,7 +213,10 @@ TEST_F(FacetsTest, AFileOfBadPolygonsSilencesNobody) {
         const std::string path =
             Write({std::vector<std::string>(bowTies, "POLYGON Z ((0 0 1,9 9 1,9 0 1,0 9 1,0 0 1))"),
                    wkbPolygon25D});
-        EXPECT_EQ(OpenReader(path)->Load(nullptr), nullptr);
+        {
+            const HostCall call; // closing tells what was left out
+            EXPECT_EQ(OpenReader(path)->Load(nullptr), nullptr);
+        }
         std::istringstream lines(moTranscript.Take());
         int count = 0;
         for (std::string line; getline(lines, line);)
