@@ -59,7 +59,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     fuzz::Bytes bytes(data, size);
     fuzz::Coordinates<double> coordinates(bytes, 3e-10);
     Corners corners;
-    while (!bytes.IsEmpty() && corners.size() < 150)
+    while (!bytes.IsEmpty() && corners.size() < 60)
         corners.push_back({coordinates.Take(), coordinates.Take(), coordinates.Take()});
     while (corners.size() % 3 != 0)
         corners.push_back(corners[0]);
