@@ -1,7 +1,9 @@
 // The bytes of a file, in memory, through the store and the reader: a surface, null or a documented
-// exception. The first byte chooses the format.
+// exception. Or those of a geometry of a GeoPackage, which GDAL must read alike if the store takes
+// it. The first byte chooses the format.
 
 #include "fuzz/bytes.h"
+#include "services/bundled/store/features/geometrybytes.h"
 #include "services/bundled/store/files/opendataset.h"
 #include "services/bundled/store/landxml/landxmlfile.h"
 #include "services/bundled/store/storefile.h"
@@ -10,7 +12,11 @@
 #include "tin/tinreader.h"
 
 #include <cpl_vsi.h>
+#include <dlfcn.h>
+#include <ogr_geometry.h>
+#include <ogr_srs_api.h>
 
+#include <array>
 #include <memory>
 #include <sstream>
 #include <string>
@@ -18,6 +24,10 @@
 namespace {
 
 constexpr const char* FOLDER = "/vsimem/fuzz";
+
+/// Formats behind those that GDAL reads.
+constexpr unsigned LANDXML = 8;
+constexpr unsigned GEOMETRY = 9;
 
 void Write(const std::string& name, const std::uint8_t* data, std::size_t size) {
     auto* bytes = const_cast<GByte*>(data);
@@ -59,19 +69,18 @@ std::string WriteFile(fuzz::Bytes& rBytes, unsigned format) {
 }
 
 /// LandXML is read from a stream, without GDAL.
-std::unique_ptr<_iobuf> Open(fuzz::Bytes& rBytes) {
+std::unique_ptr<_iobuf> Open(fuzz::Bytes& rBytes, unsigned format) {
     using namespace kelm::store;
-    const unsigned format = rBytes.TakeFrom(0, 8);
-    if (format < 8)
+    if (format < LANDXML)
         return std::make_unique<StoreFile>(OpenDataset(WriteFile(rBytes, format), "input"));
     const auto* text = reinterpret_cast<const char*>(rBytes.GetNext());
     std::istringstream stream(std::string(text, rBytes.GetSize()));
     return std::make_unique<landxml::LandXmlFile>(stream, "input");
 }
 
-void Load(fuzz::Bytes& rBytes) {
+void Load(fuzz::Bytes& rBytes, unsigned format) {
     using namespace kelm;
-    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(Open(rBytes).release(), &ZARClose);
+    std::unique_ptr<_iobuf, decltype(&ZARClose)> file(Open(rBytes, format).release(), &ZARClose);
     ZARLayer_t* layer = ZARGetLayer(file.get(), 1);
     if (layer == nullptr || ZARGetLayerType(layer, 0) == 0)
         return;
@@ -85,12 +94,54 @@ void Load(fuzz::Bytes& rBytes) {
     }
 }
 
+/// GDAL must read the same triangle from behind the header.
+void TestGeometry(const std::uint8_t* bytes, std::size_t size) {
+    std::array<ZARVertex, 4> vertices;
+    bool isFlat = false;
+    if (!kelm::store::ReadTriangleBytes(bytes, size, vertices, isFlat))
+        return;
+    const std::size_t behind = isFlat ? 13 + 4 * 16 : 13 + 4 * 24;
+    OGRGeometry* read = nullptr;
+    fuzz::Require(OGRGeometryFactory::createFromWkb(bytes + (size - behind), nullptr, &read,
+                                                    behind) == OGRERR_NONE);
+    const OGRGeometryUniquePtr geometry(read);
+    fuzz::Require(wkbFlatten(geometry->getGeometryType()) == wkbPolygon &&
+                  bool(geometry->Is3D()) != isFlat);
+    const OGRLinearRing* ring = geometry->toPolygon()->getExteriorRing();
+    fuzz::Require(ring != nullptr && ring->getNumPoints() == 4);
+    for (int i = 0; i < 4; ++i) {
+        const ZARVertex wanted{ring->getX(i), ring->getY(i), isFlat ? 0.0 : ring->getZ(i)};
+        fuzz::Require(std::memcmp(&vertices.at(static_cast<unsigned>(i)), &wanted, sizeof wanted) ==
+                      0);
+    }
+}
+
 } // namespace
+
+/// In place of GDAL's own: its list of all CRSs is always the same, and takes PROJ as long as a
+/// hundred other inputs.
+OSRCRSInfo** OSRGetCRSInfoListFromDatabase(const char* authority,
+                                           const OSRCRSListParameters* parameters, int* count) {
+    static int all = 0;
+    static OSRCRSInfo** const list = [&] {
+        void* own = dlsym(RTLD_NEXT, "OSRGetCRSInfoListFromDatabase");
+        return reinterpret_cast<decltype(&OSRGetCRSInfoListFromDatabase)>(own)(authority,
+                                                                               parameters, &all);
+    }();
+    *count = all;
+    return list;
+}
+void OSRDestroyCRSInfoList(OSRCRSInfo** /*list*/) {}
 
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     fuzz::Bytes bytes(data, size);
+    const unsigned format = bytes.TakeFrom(0, GEOMETRY);
+    if (format == GEOMETRY) {
+        TestGeometry(bytes.GetNext(), bytes.GetSize());
+        return 0;
+    }
     try {
-        Load(bytes);
+        Load(bytes, format);
     } catch (const kelm::Exception& e) {
         fuzz::Require(e.what()[0] != '\0');
     }

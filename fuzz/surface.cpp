@@ -9,6 +9,7 @@
 #include "tin/tin.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <memory>
 
@@ -31,6 +32,9 @@ struct Opened : Tin {
     using Tin::Subset;
     using Tin::Tin;
 };
+
+/// Copies that make cells crowded and the batch of the index of lines take turns.
+constexpr unsigned CROWD = 10;
 
 /// Of +0 and -0 the first one found stands, which a tree and a scan find in their own order.
 bool IsSame(float a, float b) {
@@ -64,16 +68,18 @@ void TestGridHeight(const Opened& surface, const HeightGrid& grid, float x, floa
     }
 }
 
+constexpr unsigned MOST_POSITIONS = 9;
+
 /// The same in a batch: a run of positions from one to another.
 void TestGridRun(const Opened& surface, const HeightGrid& grid, const Point& a, const Point& b,
                  unsigned count) {
-    std::vector<point2_t<double>> positions;
+    std::array<point2_t<double>, MOST_POSITIONS> positions;
     for (unsigned i = 0; i < count; ++i) {
         const double step = i / double(count);
-        positions.push_back({1000.0 + double(a.x) + (double(b.x) - double(a.x)) * step,
-                             double(a.y) - 2000.0 + (double(b.y) - double(a.y)) * step});
+        positions[i] = {1000.0 + double(a.x) + (double(b.x) - double(a.x)) * step,
+                        double(a.y) - 2000.0 + (double(b.y) - double(a.y)) * step};
     }
-    std::vector<float> heights(count);
+    std::array<float, MOST_POSITIONS> heights;
     for (const auto rule : {kelm::tin::ER_Float, kelm::tin::ER_Closed}) {
         grid.GetHeights(positions.data(), count, heights.data(), 1, rule);
         for (unsigned i = 0; i < count; ++i) {
@@ -171,16 +177,21 @@ void TestGrid(const Triangle& triangle, int cols, int rows) {
         Require(cells[i] >= 0 && cells[i] < cols && cells[i + 1] >= 0 && cells[i + 1] < rows);
 }
 
-std::unique_ptr<Opened> CreateSurface(fuzz::Bytes& rBytes, fuzz::Coordinates<float>& rCoordinates) {
+/// @param copies of each triangle
+std::unique_ptr<Opened> CreateSurface(fuzz::Bytes& rBytes, fuzz::Coordinates<float>& rCoordinates,
+                                      unsigned copies) {
     const unsigned vertexCount = rBytes.TakeFrom(3, 40);
-    const unsigned triangleCount = rBytes.TakeFrom(1, 60);
+    const unsigned own = rBytes.TakeFrom(1, 60);
+    const unsigned triangleCount = copies * own;
     auto vertices = std::make_unique<Point[]>(vertexCount);
     for (unsigned i = 0; i < vertexCount; ++i)
         vertices[i] = {rCoordinates.Take(), rCoordinates.Take(), rCoordinates.Take()};
     auto ids = std::make_unique<Triangle_Id[]>(triangleCount);
     const auto takeIndex = [&] { return rBytes.TakeFrom(0, vertexCount - 1); };
-    for (unsigned i = 0; i < triangleCount; ++i)
+    for (unsigned i = 0; i < own; ++i)
         ids[i] = {takeIndex(), takeIndex(), takeIndex()};
+    for (unsigned i = own; i < triangleCount; ++i)
+        ids[i] = {ids[i - own].id1, ids[i - own].id2, ids[i - own].id0};
     return std::make_unique<Opened>(vertices.release(), vertexCount, ids.release(), triangleCount,
                                     1000.0, -2000.0);
 }
@@ -190,11 +201,12 @@ std::unique_ptr<Opened> CreateSurface(fuzz::Bytes& rBytes, fuzz::Coordinates<flo
 extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size) {
     fuzz::Bytes bytes(data, size);
     AabbTree tree;
-    tree.SetCapacity(static_cast<int>(bytes.TakeFrom(0, 6)));
+    const unsigned kind = bytes.TakeFrom(0, 111);
+    tree.SetCapacity(static_cast<int>(kind % 7));
     tree.GetInfo()->SetDivisionType(bytes.TakeFrom(0, 1) == 0 ? kelm::tin::DT_BestAxis
                                                               : kelm::tin::DT_LongestAxis);
     fuzz::Coordinates<float> coordinates(bytes, 6e-8F);
-    const auto surface = CreateSurface(bytes, coordinates);
+    const auto surface = CreateSurface(bytes, coordinates, kind / 7 == 15 ? CROWD : 1);
     tree.CreateTree(surface.get());
     const unsigned triangles = surface->GetTriangleCount();
     const CrossingTree crossings(*surface);
@@ -204,7 +216,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         const Point b{coordinates.Take(), coordinates.Take(), coordinates.Take()};
         TestPoint(*surface, tree, a.x, a.y);
         TestGridHeight(*surface, grid, a.x, a.y);
-        TestGridRun(*surface, grid, a, b, 2 + triangles % 8);
+        TestGridRun(*surface, grid, a, b, 2 + triangles % (MOST_POSITIONS - 1));
         TestLine(*surface, tree, a, b);
         TestCrossing(*surface, crossings, a, b);
         BBox<float, point2_t<float>> region;
@@ -218,7 +230,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
             TestSubset(std::unique_ptr<Tin>(surface->SubsetByLineString(path, 2, index)), *surface);
         }
         const Triangle& one = *surface->GetTriangle(bytes.TakeFrom(0, triangles - 1));
-        TestGrid(one, static_cast<int>(bytes.TakeFrom(0, 70)) - 2, 40);
+        TestGrid(one, static_cast<int>(bytes.TakeFrom(0, 70)) - 2, 8);
         static_cast<void>(one.IsIntersected(*surface->GetTriangle(0)));
     } while (!bytes.IsEmpty());
     TestSubset(std::unique_ptr<Tin>(surface->Subset(List{triangles - 1, 0, 0})), *surface);

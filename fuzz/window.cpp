@@ -13,6 +13,7 @@
 #include <ogrsf_frmts.h>
 
 #include <algorithm>
+#include <array>
 #include <memory>
 #include <string>
 #include <vector>
@@ -32,30 +33,79 @@ double TakeNumber(fuzz::Bytes& rBytes) {
     return rBytes.Take<std::int8_t>() / 8;
 }
 
-OGRGeometryUniquePtr TakeTriangle(fuzz::Bytes& rBytes) {
-    auto* ring = new OGRLinearRing;
-    for (int i = 0; i < 3; ++i)
-        ring->addPoint(TakeNumber(rBytes), TakeNumber(rBytes), i);
-    ring->closeRings();
-    auto polygon = std::make_unique<OGRPolygon>();
-    polygon->addRingDirectly(ring);
-    return OGRGeometryUniquePtr(polygon.release());
+using Triangle = std::array<double, 6>;
+struct Layer {
+    unsigned format = ~0U;
+    std::vector<Triangle> triangles;
+    bool operator==(const Layer& other) const {
+        return format == other.format && triangles == other.triangles;
+    }
+};
+constexpr const char* DRIVERS[] = {"FlatGeobuf", "ESRI Shapefile", "GPKG"};
+constexpr const char* ENDINGS[] = {"fgb", "shp", "gpkg"};
+constexpr unsigned GEOPACKAGE = 2;
+
+Layer TakeLayer(fuzz::Bytes& rBytes) {
+    const unsigned kind = rBytes.TakeFrom(0, 15);
+    Layer layer;
+    layer.format = kind == 15 ? GEOPACKAGE : kind % 2;
+    layer.triangles.resize(rBytes.TakeFrom(1, 60));
+    for (Triangle& triangle : layer.triangles)
+        for (double& v : triangle)
+            v = TakeNumber(rBytes);
+    return layer;
 }
 
-/// @return the name of the file
-std::string WriteLayer(fuzz::Bytes& rBytes) {
-    const bool isShape = rBytes.TakeFrom(0, 1) == 1;
-    std::string name = std::string(FOLDER) + (isShape ? "/a.shp" : "/a.fgb");
-    GDALDriver* driver =
-        GetGDALDriverManager()->GetDriverByName(isShape ? "ESRI Shapefile" : "FlatGeobuf");
-    const GDALDatasetUniquePtr file(driver->Create(name.c_str(), 0, 0, 0, GDT_Unknown, nullptr));
-    OGRLayer* layer = file->CreateLayer("a", nullptr, wkbPolygon25D, nullptr);
-    for (unsigned rest = rBytes.TakeFrom(1, 60); rest > 0; --rest) {
-        OGRFeature feature(layer->GetLayerDefn());
-        feature.SetGeometryDirectly(TakeTriangle(rBytes).release());
-        fuzz::Require(layer->CreateFeature(&feature) == OGRERR_NONE);
-    }
-    return name;
+std::string GetName(unsigned format) {
+    return std::string(FOLDER) + "/a." + ENDINGS[format];
+}
+
+GDALDatasetUniquePtr CreateFile(unsigned format) {
+    GDALDriver* driver = GetGDALDriverManager()->GetDriverByName(DRIVERS[format]);
+    GDALDatasetUniquePtr file(
+        driver->Create(GetName(format).c_str(), 0, 0, 0, GDT_Unknown, nullptr));
+    const char* const options[] = {"SPATIAL_INDEX=NO", nullptr};
+    file->CreateLayer("a", nullptr, wkbPolygon25D,
+                      const_cast<char**>(format == GEOPACKAGE ? options : nullptr));
+    return file;
+}
+
+/// The tables of an empty GeoPackage take far longer to make than to copy.
+GDALDatasetUniquePtr CreateGeoPackage() {
+    static const std::vector<GByte> empty = [] {
+        CreateFile(GEOPACKAGE).reset();
+        vsi_l_offset size = 0;
+        const GByte* bytes = VSIGetMemFileBuffer(GetName(GEOPACKAGE).c_str(), &size, FALSE);
+        return std::vector<GByte>(bytes, bytes + size);
+    }();
+    const std::string name = GetName(GEOPACKAGE);
+    VSILFILE* file = VSIFOpenL(name.c_str(), "wb");
+    VSIFWriteL(empty.data(), 1, empty.size(), file);
+    VSIFCloseL(file);
+    return GDALDatasetUniquePtr(
+        GDALDataset::Open(name.c_str(), GDAL_OF_VECTOR | GDAL_OF_UPDATE, nullptr));
+}
+
+void AddFeature(OGRLayer& rLayer, const Triangle& triangle) {
+    auto ring = std::make_unique<OGRLinearRing>();
+    for (std::size_t i = 0; i < triangle.size(); i += 2)
+        ring->addPoint(triangle.at(i), triangle.at(i + 1), static_cast<double>(i / 2));
+    ring->closeRings();
+    auto polygon = std::make_unique<OGRPolygon>();
+    polygon->addRingDirectly(ring.release());
+    OGRFeature feature(rLayer.GetLayerDefn());
+    feature.SetGeometryDirectly(polygon.release());
+    fuzz::Require(rLayer.CreateFeature(&feature) == OGRERR_NONE);
+}
+
+void WriteLayer(const Layer& layer) {
+    VSIRmdirRecursive(FOLDER);
+    const GDALDatasetUniquePtr file =
+        layer.format == GEOPACKAGE ? CreateGeoPackage() : CreateFile(layer.format);
+    file->StartTransaction();
+    for (const Triangle& triangle : layer.triangles)
+        AddFeature(*file->GetLayer(0), triangle);
+    file->CommitTransaction();
 }
 
 File Open(const std::string& name) {
@@ -123,17 +173,37 @@ bool Alter(std::string& rSurvey, fuzz::Bytes& rBytes) {
     return content == before;
 }
 
-void Run(fuzz::Bytes& rBytes) {
+/// A file that is written, and what a walk over its whole layer gives.
+struct Written {
+    Layer layer;
+    Shapes all;
+    std::string survey;
+};
+
+/// Many inputs alter the survey or the windows alone, so the last file stays for the next input.
+const Written& GetWritten(Layer&& layer) {
+    static Written written;
+    if (written.layer == layer)
+        return written;
     kelm::store::RegisterFormats();
-    const std::string name = WriteLayer(rBytes);
-    const File whole = Open(name);
-    ZARLayer_t* layer = ZARGetLayer(whole.get(), 1);
-    const Shapes all = Walk(layer);
-    std::string survey = ZARGetSurvey(layer);
+    written = {};
+    WriteLayer(layer);
+    const File file = Open(GetName(layer.format));
+    ZARLayer_t* opened = ZARGetLayer(file.get(), 1);
+    written.all = Walk(opened);
+    fuzz::Require(written.all.size() == layer.triangles.size());
+    written.survey = ZARGetSurvey(opened);
+    written.layer = std::move(layer);
+    return written;
+}
+
+void Run(fuzz::Bytes& rBytes) {
+    const Written& written = GetWritten(TakeLayer(rBytes));
+    std::string survey = written.survey;
     const bool isOwn = Alter(survey, rBytes);
-    const File file = Open(name);
+    const File file = Open(GetName(written.layer.format));
     const int segment = ZARSetSurvey(file.get(), survey);
-    TestWindows(ZARGetLayer(file.get(), segment), isOwn ? &all : nullptr, rBytes);
+    TestWindows(ZARGetLayer(file.get(), segment), isOwn ? &written.all : nullptr, rBytes);
 }
 
 } // namespace
@@ -146,6 +216,5 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
         fuzz::Require(e.what()[0] != '\0');
     } catch (const std::bad_alloc&) { // an altered survey can tell of any number of features
     }
-    VSIRmdirRecursive(FOLDER);
     return 0;
 }
