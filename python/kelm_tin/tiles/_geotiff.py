@@ -10,7 +10,7 @@ from typing import Any, Callable, Iterator, NamedTuple, Optional
 import numpy as np
 
 from .._reading import Path
-from ._dask import compute, get_scheduler
+from ._dask import compute, from_array, get_scheduler
 from ._raster import Transform
 
 GROUP = 8
@@ -108,9 +108,7 @@ def write_geotiff(
 def _to_chunks(array: Any) -> Any:
     """A dask array of numbers that a GeoTIFF can hold."""
     if not hasattr(array, "chunks"):
-        import dask.array
-
-        array = dask.array.from_array(array, chunks=4 * MOST_BLOCK)
+        array = from_array(array, chunks=4 * MOST_BLOCK)
     return array.astype(np.uint8) if array.dtype == bool else array
 
 
