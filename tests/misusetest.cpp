@@ -139,9 +139,10 @@ TEST(MisuseTest, AssignmentOfACopyReleasesNothingAndAMoveReleasesWhatItReplaces)
     OpenTin tin = mesh.MakeTin();
     point3_t<float>* vertices;
     Triangle* triangles;
-    unsigned count;
-    tin.GetVertexList(vertices, count);
-    tin.GetTriangleList(triangles, count);
+    unsigned counts[2];
+    tin.GetVertexList(vertices, counts[0]);
+    tin.GetTriangleList(triangles, counts[1]);
+    EXPECT_TRUE(counts[0] == 6 && counts[1] == 2);
     tin = other;
     delete[] vertices; // the former owner has let them go
     delete[] triangles;

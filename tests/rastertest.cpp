@@ -5,6 +5,13 @@
 namespace kelm::tin::test {
 namespace {
 
+Point2 GetVertexOf(const OpenTin& tin, unsigned number) {
+    if (tin.GetVertexCount() == 0)
+        return {};
+    const Point& vertex = *tin.GetVertex(number * 7919 % tin.GetVertexCount());
+    return {vertex.x, vertex.y};
+}
+
 /// Puts a grid over what a surface's vertices in the middle of the list span.
 RasterFrame MakeFrame(const OpenTin& tin, unsigned kind) {
     static constexpr unsigned SIDES[][2] = {{43, 31}, {3, 9}, {70, 2}, {1, 1}, {17, 23}};
@@ -15,12 +22,17 @@ RasterFrame MakeFrame(const OpenTin& tin, unsigned kind) {
     const double dx = (double(box.max.x) - double(box.min.x)) / frame.nColumns;
     const double dy = (double(box.max.y) - double(box.min.y)) / frame.nRows;
     double* t = frame.adfTransform;
+    // Cells so fine that several have one float for a centre, which is that of a vertex.
+    const Point2 at = kind % 6 < 4 ? Point2{} : GetVertexOf(tin, kind);
+    const double fx = std::fabs(double(at.x)) * 0x1p-26, fy = std::fabs(double(at.y)) * 0x1p-26;
     const double transforms[][6] = {
         {500 + double(box.min.x), dx, 0, double(box.max.y) - 3, 0, -dy},       // as usual
         {500 + double(box.min.x) - dx / 2, dx, 0, double(box.min.y), 0, dy},   // upside down
         {500 + double(box.min.x), dx, dx / 9, double(box.max.y), dy / 3, -dy}, // turned
-        {500 + double(box.max.x), -dx, 0, double(box.max.y), 0, -dy}};         // mirrored
-    std::copy(transforms[kind % 4], transforms[kind % 4] + 6, t);
+        {500 + double(box.max.x), -dx, 0, double(box.max.y), 0, -dy},          // mirrored
+        {500 + double(at.x) - fx, fx, 0, double(at.y) - 3 + fy, 0, -fy},       // fine
+        {500 + double(at.x) - fx, fx, 0, double(at.y) - 3 - fy, 0, fy}};       // and upside down
+    std::copy(transforms[kind % 6], transforms[kind % 6] + 6, t);
     return frame;
 }
 
