@@ -130,7 +130,13 @@ TEST(MisuseTest, ADefaultTriangleHoldsNothing) {
     EXPECT_EQ(unset.GetGridPointsCR(nullptr, 4, 4), 0U);
     for (const int i : {-1, 3, 2147483647})
         EXPECT_EQ(set.GetVertex(i), nullptr);
-    EXPECT_TRUE(unset.GetVertex(0) == nullptr && set.GetVertex(2) == &set.corners[2]);
+    point3_t<float>*list[3] = {}, *each[3] = {};
+    set.GetVertexList(list);
+    set.GetVertices(each[0], each[1], each[2]);
+    for (int i = 0; i < 3; ++i)
+        EXPECT_TRUE(set.GetVertex(i) == &set.corners[std::size_t(i)] &&
+                    set.GetVertex(i) == list[i] && list[i] == each[i]);
+    EXPECT_EQ(unset.GetVertex(0), nullptr);
 }
 
 TEST(MisuseTest, AssignmentOfACopyReleasesNothingAndAMoveReleasesWhatItReplaces) {

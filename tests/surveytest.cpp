@@ -54,6 +54,8 @@ TEST_F(SurveyTest, OpensWithoutReadingTheLayer) {
     const std::string path = Write(MakeLayer(3), "GPKG", "a.gpkg", true);
     const auto poFirst = OpenReader(path, 2);
     const std::string survey = poFirst->GetSurvey();
+    EXPECT_EQ(OpenReader(path)->GetSurvey(), OpenReader(path, 1)->GetSurvey());
+    EXPECT_NE(poFirst->GetCRSText().find("UTM zone 32N"), std::string::npos);
     moTranscript.moLines.clear();
     const auto poSecond = OpenSurveyed(path, survey); // the warnings were given once
     EXPECT_EQ(poSecond->GetShapeCount(), poFirst->GetShapeCount());
