@@ -81,6 +81,9 @@ TEST(AabbTreeTest, DividesAtTheMeanCentroidEachTimeItIsBuilt) {
     tree.CreateTree(std::make_unique<Tin>(nullptr, 0, new Triangle_Id[0], 0, 0, 0).get());
     EXPECT_TRUE(tree.GetRoot() == nullptr && tree.GetObjBytes() == 32);
     EXPECT_EQ(EstimateAabbTreeBytes(7), 380U);
+    tree.SetCapacity(0); // no number of triangles is 0 of them
+    EXPECT_EQ(tree.EstimateObjBytes(0), 96U);
+    EXPECT_EQ(tree.EstimateObjBytes(1), (std::uint64_t{64} << 31U) + 4 + 32);
     tree.SetCapacity(-1); // no overflow
     EXPECT_GE(tree.EstimateObjBytes(4294967295U), 4294967295U * std::uint64_t{4});
 }

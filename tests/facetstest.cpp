@@ -209,7 +209,7 @@ TEST_F(FacetsTest, WhatCannotBeUsedIsToldWithItsReason) {
 TEST_F(FacetsTest, AFileOfBadPolygonsSilencesNobody) {
     const std::string given = "Triangulate(): Polygon# ";
     std::string told;
-    for (const std::size_t bowTies : {1500U, 3U, 3U}) {
+    for (const std::size_t bowTies : {1500U, 3U, 100U, 3U}) {
         const std::string path =
             Write({std::vector<std::string>(bowTies, "POLYGON Z ((0 0 1,9 9 1,9 0 1,0 9 1,0 0 1))"),
                    wkbPolygon25D});

@@ -79,8 +79,11 @@ TEST(TriangleTest, SumsInItsOrderAndLetsNotANumberPass) {
     // So little below the edge that the weights do not show it; the box does.
     EXPECT_TRUE(low.IsPointInsideLT(2, -1e-45F) && !low.IsPointInside(2, -1e-45F));
     EXPECT_TRUE(low.GetHeight(NOT_A_NUMBER, 1, h) && !low.IsPointInside(NOT_A_NUMBER, 1));
-    const OwnTriangle huge({{-3e9F, -3e9F, 0}, {3e9F, -3e9F, 0}, {0, 3e9F, 0}}); // beyond any int
-    EXPECT_EQ(huge.GetGridPointsNum(4, 4), 16U);
+    for (const float top : {3e9F, 0x1p31F}) { // beyond any int
+        const OwnTriangle huge({{-top, -top, 0}, {top, -top, 0}, {0, top, 0}});
+        EXPECT_EQ(huge.GetGridPointsNum(4, 4), 16U);
+        EXPECT_EQ(huge.GetGridPointsNum(70000, 70000), 4294967295U) << "of 4.9e9 cells";
+    }
 }
 
 TEST(TriangleTest, ADeterminantCountsFromEpsilonOnInEitherSense) {

@@ -11,7 +11,8 @@ const double NaN = std::nan("");
 TEST_F(ReaderTest, TouchingAWindowIsMeetingIt) {
     const Window meeting[] = {{4, 4, 6, 6},  {-1, -1, 11, 11}, {-1, 4.5, 11, 5.5},
                               {7, 2, 20, 3}, {10, 5, 20, 20},  {7.5, -9, 9, 2.5}};
-    const Window clear[] = {{7.6, -9, 9, 2.5}, {0, 0, 2, 2}, {NaN, 0, 9, 9}, {0, 0, 9, NaN}};
+    const Window clear[] = {{7.6, -9, 9, 2.5}, {0, 0, 2, 2},   {NaN, 0, 9, 9},
+                            {0, NaN, 9, 9},    {0, 0, NaN, 9}, {0, 0, 9, NaN}};
     script.shapes = {Close({{5, 0, 0}, {10, 5, 0}, {5, 10, 0}, {0, 5, 0}})};
     const Reader reader = Open();
     for (int turn = 0; turn < 2; ++turn) {
