@@ -77,6 +77,19 @@ TEST(HeightGrid, AnswersAsTheScanToTheBitOnOddSurfacesInAnyMemory) {
     }
 }
 
+// Whoever is not divided into cells answers the same, but slowly; the bytes tell.
+TEST(HeightGrid, OfASheetFitsIntoItsDefaultMemory) {
+    Random random;
+    const OpenTin tin = MakeSheet(0, random).MakeTin();
+    const auto getBytes = [&](unsigned most) {
+        BuildOptions options;
+        options.bytesPerTriangle = most;
+        return HeightGrid(tin, options).GetObjBytes();
+    };
+    EXPECT_EQ(getBytes(0), getBytes(1000));
+    EXPECT_NE(getBytes(0), getBytes(1)) << "too little for cells";
+}
+
 TEST(HeightGrid, IsTheSameOnAnyNumberOfThreadsAndOutlivesTheSurface) {
     Random random;
     Mesh mesh = MakeSheet(3, random);
