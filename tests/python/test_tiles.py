@@ -232,6 +232,15 @@ def test_geotiff(country, tmp_path, monkeypatch, writer):
     assert os.listdir(tmp_path) == ["cells.tif"]
 
 
+def test_the_margin_counts_all_distances(country):
+    survey = kelm_tin.survey(country[0])
+    xmin, ymin, xmax, ymax = survey.bounds
+    margin = lambda base: -(2**18) * tiles.Plan(country[0], 800, base=base, survey=survey).window((0, 0, 0, 0))[0]
+    assert margin("tile") >= 2 * max(xmax - xmin, ymax - ymin)
+    for base in ((xmin - 1e8, ymin), (xmax + 1e8, ymin), (xmin, ymin - 1e8), (xmin, ymax + 1e8)):
+        assert 1e8 <= margin(base) < 1.001e8
+
+
 def measure_peak(prepare, run, *arguments):
     """The bytes that `run` needs and what it prints, in a process of its own, since what a process has freed is
     not given back at once."""
