@@ -229,10 +229,11 @@ TEST(CrossingTreeTest, LosesNoCrossingAtTheFacesOfABox) {
     EXPECT_GT(found, 100000U);
 }
 
-/// Sheets side by side, so many that a build divides its work, with some walls in each.
+/// Sheets side by side, so many that a build divides its work and a batch walks several lines in
+/// turn, with some walls in each.
 Mesh MakeLargeSurface(Random& random) {
     Mesh large;
-    for (float x = 0; x < 12 * 230; x += 230) {
+    for (float x = 0; x < 50 * 230; x += 230) {
         const auto first = static_cast<unsigned>(large.vertices.size());
         for (const Point& v : MakeSheet(3, random).vertices)
             large.vertices.push_back({v.x + x, v.y, v.z});
