@@ -61,6 +61,10 @@ def test_closed_misses_no_position_on_an_edge(terrain):
     missed = np.isnan(usual)
     assert missed.any() and np.isnan(closed).sum() < missed.sum() / 10
     assert (usual[~missed] == closed[~missed]).all()
+    cells = [(x - 0.5, y - 0.5, x + 0.5, y + 0.5) for x, y in positions[missed & ~np.isnan(closed)][:50]]
+    for options, share in (({}, 1), ({"closed": True}, 0)):  # but for a rounding of the centre
+        found = [terrain.raster(cell, 1, **options).heights[0, 0] for cell in cells]
+        assert abs(np.isnan(found).mean() - share) < 0.1
 
 
 def test_scipy_agrees_on_its_own_triangles():
