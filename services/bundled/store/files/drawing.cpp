@@ -186,9 +186,12 @@ bool DrawingTest::ReadCode() {
 
 /// Blank lines may follow the last pair. @return false
 bool DrawingTest::SkipBlankEnd() {
-    while (moLines.Next())
+    do {
         if (!moLines.GetText().empty())
             return Fail("a blank line stands where a group code must");
+        if (moLines.EndsInReturn())
+            return Fail("the file ends within a line end");
+    } while (moLines.Next());
     return false;
 }
 
