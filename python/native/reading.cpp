@@ -140,10 +140,8 @@ std::pair<LayerFacts, std::string> SurveyLayer(const std::string& file,
 
 std::optional<std::string> FlattenCrs(const std::string& wkt) {
     const SpatialReference crs = ReadCrs(wkt);
-    if (crs) {
-        OSRStripVertical(crs.get());
+    if (crs)
         OSRDemoteTo2D(crs.get(), nullptr);
-    }
     return GetWkt(crs);
 }
 

@@ -62,14 +62,15 @@ void WarnOfEllipsoid(const std::string& map, const std::string& ellipsoid,
 }
 
 void WarnOfUnit(ProjSession& session, const CRSText& text, const PJ* map, const HeightUnit& unit) {
-    const HeightUnit ofMap = GetMapUnit(session, map);
     if (unit.mdfMetres != 1.0)
-        tellus::Warning::Warn(
+        return tellus::Warning::Warn(
             FormatString("Heights of '%s' have the unit %s of its height axis in the change of "
                          "datum; offset and scale of a load come before it",
                          text.moName.c_str(), unit.moName.c_str()),
             SOURCE, __LINE__);
-    else if (text.moVertical.empty() && text.moEllipsoidal.empty() && ofMap.mdfMetres != 1.0)
+    if (!text.moVertical.empty() || !text.moEllipsoidal.empty())
+        return;
+    if (const HeightUnit ofMap = GetMapUnit(session, map); ofMap.mdfMetres != 1.0)
         tellus::Warning::Warn(
             FormatString("'%s' has the unit %s and no height axis: heights count as metres in the "
                          "change of datum",
