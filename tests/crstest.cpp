@@ -60,7 +60,7 @@ CRSPtr ReadCRS(const std::string& text, bool bWkt = true) {
     const PjPtr po(proj_create(nullptr, text.c_str()), proj_destroy);
     ProjInfo_t oInfo{!po    ? text
                      : bWkt ? proj_as_wkt(nullptr, po.get(), PJ_WKT2_2019, nullptr)
-                            : proj_as_projjson(nullptr, po.get(), nullptr)};
+                            : " \n" + std::string(proj_as_projjson(nullptr, po.get(), nullptr))};
     return CRSPtr(ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(&oInfo));
 }
 
@@ -152,7 +152,12 @@ const struct {
      "+inv +proj=sterea +lat_0=52.1561605555556 +lon_0=5.38763888888889 +k=0.9999079 +x_0=155000 "
      "+y_0=463000 +ellps=bessel +step +proj=cart +ellps=bessel +step +proj=helmert +x=565.4171 "
      "+y=50.3319 +z=465.5524 +rx=0.398957388243134 +ry=-0.343987817378283 +rz=1.87740163998045 "
-     "+s=4.0725 +convention=coordinate_frame +step +inv +proj=cart +ellps=WGS84 "}};
+     "+s=4.0725 +convention=coordinate_frame +step +inv +proj=cart +ellps=WGS84 "},
+    {R"(COMPD_CS["x",GEOGCS["bound",DATUM["x",SPHEROID["WGS 84",6378137,298.257223563],)"
+     R"(TOWGS84[0,0,100,0,0,0,0]],PRIMEM["Greenwich",0],UNIT["degree",0.0174532925199433]],)"
+     R"(VERT_CS["EGM96 height",VERT_DATUM["EGM96 geoid",2005],UNIT["foot",0.3048]]])",
+     -84.2, 36.3,
+     kFromDegrees + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart ", 0.3048}};
 
 /// Longitudes, latitudes and heights: each pair of braces is a call.
 const struct {
@@ -199,6 +204,7 @@ const struct {
     {"no CRS at all", {}},
     {"EPSG:4978", {}},
     {"EPSG:5773", {}},
+    {R"(ELLIPSOID["no CRS",6378137,298])", {}},
     {"", {1, 2, 3}},
     {"EPSG:32616+3855", {}},
     {"+proj=utm +zone=16 +datum=WGS84 +geoidgrids=no.gtx +type=crs", {}},
@@ -342,6 +348,7 @@ TEST_F(CRSTest, WhatCannotBeConvertedIsRefusedAndNamed) {
              [&] { Create(poUtm, po3D); }, [&] { Create(po3D, nullptr); },
              [&] { utils::IsCRSLocal(&oForeign); },
              [&] { utils::CreateCompoundCS(poUtm.get(), kOrtho, cs::LinearUnitType(7)); },
+             [] { ReadCRS(std::string(199, 'x') + "\u00e9"); },
              [] { ProjectionEngine::GetProjInfoFactory(PE_Default)->CreateCRS(nullptr); }})
         EXPECT_TRUE(moTranscript.Refuses(work));
 }
@@ -363,5 +370,6 @@ TEST_F(CRSTest, EqualHeightsPassBitForBitEvenIfNothingCouldConvertThem) {
         const auto eDatum = bLocal ? static_cast<cs::DatumType>(2345) : kOrtho;
         EXPECT_EQ(Convert(crs, {0.3, 1e7, 0.1 + 0.2}, eDatum, eDatum), 0.1 + 0.2) << crs;
     }
-    Convert("", {}); // no height, nothing to convert
+    for (const char* pszCRS : {"", "EPSG:4283"})
+        Convert(pszCRS, {}); // no height, nothing to convert
 }

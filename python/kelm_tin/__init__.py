@@ -17,6 +17,7 @@ import importlib
 from types import ModuleType
 
 from ._native import DataError
+from ._native import __version__ as __version__
 from ._reading import DataWarning, Layer, NothingRead, Survey, layers, read, survey
 from ._surface import Profile, Raster, Surface
 

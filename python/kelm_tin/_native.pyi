@@ -3,6 +3,8 @@ from typing import Callable, Optional
 import numpy as np
 from numpy.typing import NDArray
 
+__version__: str
+
 class DataError(ValueError): ...
 
 class Datum:

@@ -128,6 +128,7 @@ void AddFiles(py::module_& module) {
 // NOLINTNEXTLINE: the macro is pybind11's
 PYBIND11_MODULE(_native, module) {
     module.doc() = "What the package is made of. Not for direct use: it tests no shapes.";
+    module.attr("__version__") = KELM_TIN_VERSION;
     AddErrors(module);
     AddSurface(module);
     AddFiles(module);

@@ -11,6 +11,7 @@ import sys
 import kelm_tin
 import numpy as np
 import pytest
+from conftest import ROOT
 
 POINTS = [[0, 0, 5], [10, 0, 7], [0, 10, 9]]
 XY = [[1.0, 1.0]]
@@ -128,6 +129,10 @@ def test_dropped_surfaces_leak_nothing():
     run(100)
     before = run(100)
     assert run(1000) - before < 40e6, "a surface and its index take 0.3 MB"
+
+
+def test_version_is_that_of_the_distribution():
+    assert f'\nversion = "{kelm_tin.__version__}"\n' in (ROOT / "pyproject.toml").read_text()
 
 
 def test_types_of_the_package():
