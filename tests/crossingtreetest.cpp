@@ -245,20 +245,27 @@ Mesh MakeLargeSurface(Random& random) {
     return large;
 }
 
+struct Notes {
+    double dfStop;
+    std::vector<double> done;
+};
+
 int Note(double done, const char*, void* data) {
-    static_cast<std::vector<double>*>(data)->push_back(done);
-    return done < 0.5;
+    Notes& notes = *static_cast<Notes*>(data);
+    notes.done.push_back(done);
+    return done < notes.dfStop;
 }
 
 TEST(CrossingTreeTest, IsTheSameOnAnyNumberOfThreadsAndStopsWhenTold) {
     Random random;
     auto tin = std::make_unique<OpenTin>(MakeLargeSurface(random).MakeTin());
-    std::vector<double> noted;
-    EXPECT_THROW(CrossingTree(*tin, {2, 0, {Note, &noted}}), CancelledException);
-    EXPECT_TRUE(noted.size() > 3 && std::is_sorted(noted.begin(), noted.end()));
-    EXPECT_TRUE(noted.front() == 0 && noted.back() >= 0.5);
+    Notes half{0.5, {}}, whole{2.0, {}};
+    EXPECT_THROW(CrossingTree(*tin, {2, 0, {Note, &half}}), CancelledException);
+    CrossingTree one(*tin, {1, 0, {}}), moved(*tin, {3, 0, {Note, &whole}});
+    for (const Notes& notes : {half, whole})
+        EXPECT_TRUE(notes.done.size() > 3 && std::is_sorted(notes.done.begin(), notes.done.end()));
+    EXPECT_TRUE(half.done.front() == 0 && half.done.back() >= 0.5 && whole.done.back() == 1.0);
 
-    CrossingTree one(*tin, {1, 0, {}}), moved(*tin, {3, 0, {}});
     EXPECT_EQ(one.GetObjBytes(), moved.GetObjBytes());
     EXPECT_LE(one.GetObjBytes(), CrossingTree::EstimateObjBytes(tin->GetTriangleCount()));
     EXPECT_GE(one.GetObjBytes(), 44 * std::uint64_t{tin->GetTriangleCount()});
@@ -267,8 +274,11 @@ TEST(CrossingTreeTest, IsTheSameOnAnyNumberOfThreadsAndStopsWhenTold) {
         EXPECT_GT(Compare(*tin, *tree, 300, random), 50U);
     const Point a{-9, 99, 60}, b{999, 99, 0};
     float h = UNTOUCHED, same = UNTOUCHED;
+    const point3_t<double> ends[] = {{-9, 99, 60}, {999, 99, 0}};
     EXPECT_FALSE(moved.GetLineIntersectHeight(a, b, h)); // NOLINT(bugprone-use-after-move)
+    EXPECT_FALSE(moved.GetLineIntersectHeight(ends[0], ends[1], h));
     EXPECT_EQ(h, UNTOUCHED);
+    EXPECT_EQ(moved.GetLineIntersectHeights(ends, 1, &h), 0U);
     tin.reset();
     EXPECT_TRUE(one.GetLineIntersectHeight(a, b, h));
     EXPECT_TRUE(three.GetLineIntersectHeight(a, b, same));

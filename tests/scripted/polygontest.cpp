@@ -63,6 +63,8 @@ TEST(PolygonTest, ARingIsTurnedUnlessItIsAsAskedAndItsBoxHoldsRepeats) {
     for (const PolygonOrient orient : {PO_CounterClockwise, PO_Clockwise})
         for (const double x : {-1, 1, 3}) // at the height of two corners
             EXPECT_EQ(Make({{1, 0}, {2, 1}, {1, 2}, {0, 1}}, orient).IsPointInside(x, 1), x == 1);
+    for (const double y : {0, 2})
+        EXPECT_FALSE(Make(SQUARE).IsPointInside(3, y)) << "in line with an edge";
 }
 
 // A comb blocks almost every ear, again and again. All pairs of so many edges would take minutes.
