@@ -114,6 +114,9 @@ double Convert(const std::string& crs, const Points& points, Arguments... argume
 
 const std::string kFromUtm = "+inv +proj=utm +zone=16 +ellps=WGS84 ";
 const std::string kFromWebMercator = "+inv +proj=webmerc +ellps=WGS84 ";
+const std::string kFromTennessee =
+    "+inv +proj=lcc +lat_0=34.3333333333333 +lon_0=-86 +lat_1=35.25 +lat_2=36.4166666666667 "
+    "+x_0=600000 +units=us-ft +vunits=m +ellps=GRS80 ";
 const std::string kFromDegrees = "+proj=unitconvert +xy_in=deg +xy_out=rad ";
 const struct {
     const char* mpszCRS;
@@ -132,9 +135,7 @@ const struct {
     {"+proj=utm +zone=16 +ellps=WGS84 +towgs84=0,0,100 +vunits=ft +type=crs", 738669, 4045105,
      kFromUtm + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart ", 0.3048},
     // Positions in feet and no height axis: heights are metres, and a warning says so.
-    {"EPSG:2274", 2400000, 700000,
-     "+inv +proj=lcc +lat_0=34.3333333333333 +lon_0=-86 +lat_1=35.25 +lat_2=36.4166666666667 "
-     "+x_0=600000 +units=us-ft +vunits=m +ellps=GRS80 "},
+    {"EPSG:2274", 2400000, 700000, kFromTennessee},
     {"EPSG:3857", -9373101, 4344013, kFromWebMercator},
     {"EPSG:3857+5773", 1e6, 7e6, kFromWebMercator},
     // Of 17 ways to WGS 84 and back, most for one state, none moves a height or needs its grid.
@@ -157,7 +158,8 @@ const struct {
      R"(TOWGS84[0,0,100,0,0,0,0]],PRIMEM["Greenwich",0],UNIT["degree",0.0174532925199433]],)"
      R"(VERT_CS["EGM96 height",VERT_DATUM["EGM96 geoid",2005],UNIT["foot",0.3048]]])",
      -84.2, 36.3,
-     kFromDegrees + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart ", 0.3048}};
+     kFromDegrees + "+step +proj=cart +step +proj=helmert +z=100 +step +inv +proj=cart ", 0.3048},
+    {"EPSG:2274+5773", 2400000, 700000, kFromTennessee}};
 
 /// Longitudes, latitudes and heights: each pair of braces is a call.
 const struct {

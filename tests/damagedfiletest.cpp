@@ -118,6 +118,21 @@ TEST_F(DamagedFileTest, ADamagedRecordCostsThatRecordAndMoreTheFile) {
     }
 }
 
+TEST_F(DamagedFileTest, AWalkThatLosesItsTurnCountsADamagedRecordOnce) {
+    LayerText oText{{}, wkbPolygon25D};
+    for (int n = 0; n < 600; ++n)
+        oText.moGeometries.push_back(MakeTriangle(n, 0, n));
+    FileTest::Write(oText, "GML", "a.gml", true);
+    Edit("a.gml", Change("facets.2", "</gml:posList>", " 7</gml:posList>"));
+    const File poFile = OpenFile(moFolder.GetPath("a.gml"));
+    ZARLayer_t *const poFirst = ZARGetLayer(poFile.get(), 1), *const poSecond =
+                                                                  ZARGetLayer(poFile.get(), 2);
+    int nFirst = -1, nSecond = -1, nShapes = 0;
+    for (; (nFirst = ZARGetNext(poFirst, nFirst)) != -1; ++nShapes)
+        nSecond = ZARGetNext(poSecond, nSecond);
+    EXPECT_TRUE(nShapes == 599 && nSecond == 598);
+}
+
 TEST_F(DamagedFileTest, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {
     const std::string path = Write("GPKG", "a.gpkg"), copy = moFolder.GetPath("b.gpkg"),
                       blocked = moFolder.GetPath("c.gpkg");

@@ -20,7 +20,7 @@ TEST(MisuseTest, ATreeOfAnotherNumberOfTrianglesIsRefusedByEveryQuery) {
     kelm::test::Transcript transcript;
     const OpenTin tin = MakeSmallSheet(20).MakeTin();
     const Point a{0.2F, 0.2F, 9}, b{0.3F, 0.2F, -9};
-    const point3_t<double> mapA{0.2, 0.2, 9};
+    const point3_t<double> mapA{0.2, 0.2, 9}, segment[] = {mapA, mapA};
     const point2_t<float> path[] = {{0, 0}, {9, 0.5F}};
     const point2_t<double> mapPath[] = {{0, 0}, {9, 0.5}};
     const auto mapBox = MakeBox(mapPath[0], mapPath[1]);
@@ -34,6 +34,8 @@ TEST(MisuseTest, ATreeOfAnotherNumberOfTrianglesIsRefusedByEveryQuery) {
             [&] { tin.GetHeight(1e9, 0.2, h, &tree); }, // outside the surface too
             [&] { tin.GetLineIntersectHeight(a, b, h, &tree); },
             [&] { tin.GetLineIntersectHeight(mapA, mapA, h, &tree); },
+            [&] { tin.GetHeights(mapPath, 1, &h, &tree); },
+            [&] { tin.GetLineIntersectHeights(segment, 1, &h, &tree); },
             [&] { delete tin.SubsetByRegion(EVERYWHERE, &tree); },
             [&] { delete tin.SubsetByRegion(mapBox, &tree); },
             [&] { delete tin.SubsetByLineString(path, 2, &tree); },

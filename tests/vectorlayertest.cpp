@@ -54,6 +54,7 @@ TEST_F(VectorLayerTest, EachFormatGivesAllFacetsInOrderAndNeverLessWhenItIsCut) 
             EXPECT_EQ(oRings[n], MakeRing(double(n), 0, double(n))) << path;
         EXPECT_NE(GetCrs(Read(path).mpo).find("\"WGS 84 / UTM zone 32N\""), std::string::npos)
             << path;
+        EXPECT_TRUE(!fs::is_directory(path) || Read(path + '/').moRings == oRings);
         EXPECT_EQ(moTranscript.moLines, "");
         const auto nSize = fs::is_directory(path) ? 0 : fs::file_size(path);
         for (unsigned nCut = nSize > 0 ? 25 : 0; nCut-- > 0;) {

@@ -101,8 +101,12 @@ struct WindowTest : FileTest {
             }
             EXPECT_EQ(nCount, poReader->EstimateShapeCount(oWindow));
             EXPECT_LE(CountMet(oAll, oWindow), nCount);
-            for (const auto& oShape : {oAll.back(), oAll.front()}) // out of turn
+            for (const auto& oShape : {oAll.back(), oAll.front()}) { // out of turn
                 EXPECT_EQ(ReadShape(poLayer, oShape.first), oShape.second);
+                ZARSetWindow(poLayer, &low, &high);
+                ZARGetNext(poLayer, -1);
+                EXPECT_EQ(ReadShape(poLayer, oShape.first), oShape.second);
+            }
             const std::string part = Print(poReader->Load(&oWindow));
             MakeOlder(path); // what was written to is read as a whole
             EXPECT_EQ(part, Print(poWhole->Load(&oWindow)));
