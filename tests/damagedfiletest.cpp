@@ -122,11 +122,12 @@ TEST_F(DamagedFileTest, AWalkThatLosesItsTurnCountsADamagedRecordOnce) {
     LayerText oText{{}, wkbPolygon25D};
     for (int n = 0; n < 600; ++n)
         oText.moGeometries.push_back(MakeTriangle(n, 0, n));
-    FileTest::Write(oText, "GML", "a.gml", true);
+    const std::string path = FileTest::Write(oText, "GML", "a.gml", true);
     Edit("a.gml", Change("facets.2", "</gml:posList>", " 7</gml:posList>"));
-    const File poFile = OpenFile(moFolder.GetPath("a.gml"));
-    ZARLayer_t *const poFirst = ZARGetLayer(poFile.get(), 1), *const poSecond =
-                                                                  ZARGetLayer(poFile.get(), 2);
+    const File poFile = OpenFile(path);
+    ZARLayer_t* const poFirst = ZARGetLayer(poFile.get(), 1);
+    ZARLayer_t* const poSecond = ZARGetLayer(poFile.get(), 2);
+    fs::last_write_time(path, fs::file_time_type::clock::now()); // or what was read would serve
     int nFirst = -1, nSecond = -1, nShapes = 0;
     for (; (nFirst = ZARGetNext(poFirst, nFirst)) != -1; ++nShapes)
         nSecond = ZARGetNext(poSecond, nSecond);

@@ -120,7 +120,19 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
     });
     add("moved", MakeSheet(3, random), [](OpenTin& rTin) { // the boxes stay behind
         for (unsigned i = 0; i < 40; ++i)
-            rTin.GetVertex(i * 7)->x += 4;
+            (i % 2 == 0 ? rTin.GetVertex(i * 7)->x : rTin.GetVertex(i * 7)->y) +=
+                i % 4 < 2 ? 4 : -4;
+    });
+    Mesh lone = MakeEach(60, [](float i) {
+        return Trio{{{20 * i, 0, 1}, {20 * i + 9, 0, 2}, {20 * i, 9, i}}};
+    });
+    lone.Add({-500, -500, 0}, {1700, 500, 0}, {1700, 499, 0}); // so that segments reach all of it
+    add("moved beyond one side of the box", lone, [](OpenTin& rTin) {
+        for (unsigned i = 0; i < 60; ++i) {
+            Point* const v = rTin.GetVertex(3 * i);
+            float* const sides[] = {&v[0].x, &v[0].y, &v[1].x, &v[2].y};
+            *sides[i % 4] += i % 4 < 2 ? -490.0F : 490.0F;
+        }
     });
     add("soup", MakeSoup(400, [&] { return random.Between(-9, 9); }), leave);
     add("soup at all scales",
