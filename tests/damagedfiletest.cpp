@@ -219,8 +219,11 @@ TEST_F(DamagedFileTest, ADrawingThatWouldNeverEndIsRefusedAndNoOther) {
           kBegin + kFace + "\n9\n" + kEnd, kBegin + kFace + "8", kBegin + kFace + "8\n",
           std::string("AutoCAD Binary DXF\r\n\x1a\0", 22)})
         EXPECT_EQ(Load(moFolder.WriteFile("a.dxf", text)), "") << text;
+    // A block of bytes ends between the two of a line end.
+    std::string split = Replace(kBegin + "999\n", "\n", "\r\n");
+    split.append(65535 - split.size(), 'x') += Replace("\n" + kFace + kEnd, "\n", "\r\n");
     for (const std::string& text :
-         {whole, Replace(whole, "\n", "\r\n"), Replace(whole, "\n", "\r"),
+         {whole, split, Replace(whole, "\n", "\r\n"), Replace(whole, "\n", "\r"),
           Replace(whole, "10\n", "    10  \n"), "999\na comment\n" + whole, whole + "\n\n \n\x1a",
           Replace(whole, "EOF\n", "EOF"), kBegin + kFace + "0\nENDSEC\n", whole + "x" + zero,
           kBegin + "999\n" + std::string(70000, 'x') + "\n" + kFace + kEnd})
@@ -280,6 +283,10 @@ TEST_F(DamagedFileTest, ALayerWhoseCrsCannotBeReadCountsAsOneWithout) {
     EXPECT_EQ(Load(shape), "0 1 2 3 ");
     Execute(path, "UPDATE gpkg_geometry_columns SET column_name = 'none'");
     EXPECT_EQ(Load(path), "");
+    const std::string both = FileTest::Write({{MakeTriangle(0, 0, 0)}}, "GPKG", "b.gpkg", true);
+    Execute(both, "UPDATE gpkg_geometry_columns SET column_name = 'none' WHERE table_name <> "
+                  "'others'");
+    EXPECT_EQ(Load(both), "") << "the first is refused, not passed over";
 }
 
 } // namespace

@@ -165,6 +165,9 @@ TEST_F(SurveyTest, AStopLeavesNothingBehind) {
             EXPECT_EQ(Count(), nTriangles);
         }
     moTranscript.moLines.clear();
+    Listener oHalf;
+    oHalf.mdfStop = 0.5; // what was met until then is told
+    EXPECT_THROW(OpenSurveyed(path, "", 0, oHalf.Get()), kelm::tin::CancelledException);
 }
 
 } // namespace

@@ -61,6 +61,8 @@ def test_closed_misses_no_position_on_an_edge(terrain):
     missed = np.isnan(usual)
     assert missed.any() and np.isnan(closed).sum() < missed.sum() / 10
     assert (usual[~missed] == closed[~missed]).all()
+    alone = [terrain.heights(float(x), float(y), closed=True) for x, y in positions[missed][:100]]
+    assert np.array_equal(alone, closed[missed][:100], equal_nan=True)
     cells = [(x - 0.5, y - 0.5, x + 0.5, y + 0.5) for x, y in positions[missed & ~np.isnan(closed)][:50]]
     for options, share in (({}, 1), ({"closed": True}, 0)):  # but for a rounding of the centre
         found = [terrain.raster(cell, 1, **options).heights[0, 0] for cell in cells]
@@ -138,6 +140,8 @@ def test_profile_places_stations_evenly(square):
     assert np.allclose(stations, [0, 5 / 3, 10 / 3, 5, 20 / 3, 25 / 3, 10])
     assert np.allclose(np.hypot(np.diff(xs), np.diff(ys)), 5 / 3)
     assert np.array_equal(heights, square.heights(xs, ys))
+    still = square.profile([[x, y], [x, y], [x + 3, y + 4]], 5)
+    assert still.stations.tolist() == [0, 0, 5]
 
 
 def test_parts_keep_heights(terrain):

@@ -21,8 +21,8 @@ inline std::string DescribeHost() {
     const CPLErrorStateBackuper oError;
     const std::unique_ptr<CPLHTTPResult, decltype(&CPLHTTPDestroyResult)> poResult(
         CPLHTTPFetch("http://127.0.0.1:9", nullptr), CPLHTTPDestroyResult);
-    std::string text = FormatString(
-        "handler of %p, fetch: %s, network %d, locale %s, rounding %d, threads %d %d %d, in %s",
+    std::string text = FormatString( // curl's text ends in the time that it took
+        "handler of %p, fetch: %.9s, network %d, locale %s, rounding %d, threads %d %d %d, in %s",
         CPLGetErrorHandlerUserData(), poResult->pszErrBuf, proj_context_is_network_enabled(nullptr),
         setlocale(LC_ALL, nullptr), fegetround(), omp_get_max_threads(), omp_get_dynamic(),
         omp_get_max_active_levels(), std::filesystem::current_path().c_str());
