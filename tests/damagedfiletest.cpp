@@ -134,6 +134,19 @@ TEST_F(DamagedFileTest, AWalkThatLosesItsTurnCountsADamagedRecordOnce) {
     EXPECT_TRUE(nShapes == 599 && nSecond == 598);
 }
 
+TEST_F(DamagedFileTest, MessagesForWhoeverDebugsGdalAreNoWarnings) {
+    const std::string path = Write("GPKG", "a.gpkg");
+    const auto KeepOthers = [](CPLErr eClass, CPLErrorNum nError, const char* pszText) {
+        if (eClass != CE_Debug)
+            GdalTranscript::Keep(eClass, nError, pszText);
+    };
+    CPLPushErrorHandlerEx(KeepOthers, &moTranscript);
+    CPLSetThreadLocalConfigOption("CPL_DEBUG", "ON");
+    EXPECT_EQ(Load(path), "0 1 2 3 ");
+    CPLSetThreadLocalConfigOption("CPL_DEBUG", "TIN");
+    CPLPopErrorHandler();
+}
+
 TEST_F(DamagedFileTest, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {
     const std::string path = Write("GPKG", "a.gpkg"), copy = moFolder.GetPath("b.gpkg"),
                       blocked = moFolder.GetPath("c.gpkg");

@@ -108,12 +108,15 @@ const struct {
          "<Pnts><P id='4294967295'>0 0 3</P><P id='11'>1 1 4</P><P id='2147483648'>1 0 1</P>"
          "<P id='7'>0 1 2</P></Pnts>"),
      "type 2 1=1231 2=2412"},
-    // Four corners: both diagonals, upright, crossing itself, one corner on a side, a triangle.
+    // Four corners: both diagonals, upright, one corner on a side, crossing itself, a triangle.
     {Tin("<F>1 2 4 3</F><F>2 5 3 1</F><F>5 3 1 2</F>"),
      "type 2 10=1241 11=1431 20=2512 21=5315 30=5315 31=5125"},
     {Tin("<F>6 7 8 9</F>", "<Pnts><P id='6'>0 0 1</P><P id='7'>0 1 2</P><P id='8'>0 1 3</P>"
                            "<P id='9'>0 0 4</P></Pnts>"),
      "type 2 10=1231 11=1341"},
+    {Tin("<F>2 6 3 1</F><F>3 1 2 6</F><F>1 2 6 3</F>",
+         kPoints + "<Pnts><P id='6'>.5 10.5 6</P></Pnts>"),
+     "type 2 10=2612 11=6316 20=3163 21=1261 30=1261 31=1631"},
     {Tin("<F>1 2 3 4</F><F>1 2 3 3</F><F>1 1 2 3</F><F>3 1 2 3</F>"),
      "type 2 2=1231 3=1231 4=3123"},
     // Damaged records cost themselves.

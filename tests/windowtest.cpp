@@ -132,6 +132,7 @@ struct WindowTest : FileTest {
         for (int n = 0; n < 12; ++n)
             Add(double(oRandom() % 60), double(oRandom() % 50) * 0.999, double(oRandom() % 16));
         Add(4, 4, 0);                 // a corner, which touching meets
+        Add(3, 3, 0);                 // one on the other sides
         Add(-1e300, -1e300, 2e300);   // all
         Add(1e9, 1e9, 1);             // beside all
         Add(5, 5, -3);                // turned inside out

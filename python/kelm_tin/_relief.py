@@ -25,6 +25,8 @@ def make_png(surface: Surface) -> Optional[bytes]:
     side = max(xmax - xmin, ymax - ymin) / LONG_SIDE
     if not side > 0:
         return None
+    # The shade of a cell is found from its neighbours, so there must be two rows and two columns.
+    xmax, ymax = max(xmax, xmin + 2 * side), max(ymax, ymin + 2 * side)
     heights = surface.raster((xmin, ymin, xmax, ymax), side, closed=True).heights
     there = np.isfinite(heights)
     if not there.any():
