@@ -26,14 +26,17 @@ def make_png(surface: Surface) -> Optional[bytes]:
     if not side > 0:
         return None
     # The shade of a cell is found from its neighbours, so there must be two rows and two columns.
-    xmax, ymax = max(xmax, xmin + 2 * side), max(ymax, ymin + 2 * side)
-    heights = surface.raster((xmin, ymin, xmax, ymax), side, closed=True).heights
+    columns, rows = (max(2, round(length / side)) for length in (xmax - xmin, ymax - ymin))
+    dx, dy = (xmax - xmin) / columns, (ymax - ymin) / rows
+    x = xmin + (np.arange(columns) + 0.5) * dx
+    y = ymax - (np.arange(rows) + 0.5) * dy
+    heights = surface.heights(x, y[:, np.newaxis], closed=True)
     there = np.isfinite(heights)
     if not there.any():
         return None
     filled = np.where(there, heights, heights[there].mean())
     picture = LightSource().shade(
-        filled, cm.ScalarMappable(cmap="gist_earth").get_cmap(), dx=side, dy=side, blend_mode="soft"
+        filled, cm.ScalarMappable(cmap="gist_earth").get_cmap(), dx=dx, dy=dy, blend_mode="soft"
     )
     picture[..., 3] = there
     out = io.BytesIO()

@@ -124,6 +124,7 @@ def test_sight(square):
     eye = [x - 3, y, 40]
     targets = [[x + 3, y, 13.5], [x + 3, y, 12.5], [x + 3, y, np.nan], [x + 99, y, 1]]
     assert square.visible(eye, targets).tolist() == [True, False, False, True]
+    assert not square.visible([x, np.nan, 40], targets).any()
     # A ridge between: the western side of a roof does not see the eastern.
     roof = kelm_tin.Surface(
         [[0, 0, 0], [5, 0, 5], [10, 0, 0], [0, 9, 0], [5, 9, 5], [10, 9, 0]],

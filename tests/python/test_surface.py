@@ -40,6 +40,12 @@ def test_copies_answer_alike_and_are_other_surfaces(terrain):
         restore(state[0][:3], state[1], *state[2:])
 
 
+def test_the_list_of_triangles_is_counted(terrain):
+    part = terrain.subset(terrain.bounds)
+    before = part.nbytes
+    assert part.triangles.nbytes > 0 and part.nbytes - before == part.triangles.nbytes
+
+
 def test_base_and_empty(square):
     assert square.base == (500005.0, 4649781.0)
     far = kelm_tin.Surface(square.map_points(), square.triangles, base=(500000.37, 4649776.81))
@@ -57,6 +63,11 @@ def test_picture(terrain):
 
     picture = image.imread(io.BytesIO(terrain._repr_png_()))
     assert max(picture.shape) == 320 and 0.9 < picture[..., 3].mean() < 1
+    road = kelm_tin.Surface([[0, 0, 5], [9000, 0, 7], [9000, 9, 9], [0, 9, 9]], [[0, 1, 2], [0, 2, 3]])
+    assert image.imread(io.BytesIO(road._repr_png_())).shape[:2] == (2, 320)
+    for x, y in ((1, 0), (0, 1), (1, 1)):
+        upright = kelm_tin.Surface([[0, 0, 0], [9 * x, 9 * y, 0], [9 * x, 9 * y, 5]], [[0, 1, 2]])
+        assert upright._repr_png_() is None
 
 
 REFUSALS = {

@@ -89,14 +89,14 @@ def test_centres_are_those_of_the_whole_raster(cell, call):
     plan = tiles.Plan(TERRAIN, tile=1000.0)
     asked = []
     spy = SimpleNamespace(
-        raster=lambda *_, **__: asked.append("raster") or SimpleNamespace(heights=0),
-        heights=lambda *_, **__: asked.append("heights") or 0,
+        raster=lambda *_, closed, **__: asked.append(("raster", closed)) or SimpleNamespace(heights=0),
+        heights=lambda *_, closed, **__: asked.append(("heights", closed)) or 0,
     )
-    frame = _work.Frame(cell, round(1000 / cell), False)
+    frame = _work.Frame(cell, round(1000 / cell), True)
     with pytest.MonkeyPatch.context() as patch:
         patch.setattr(_work, "_load", lambda *_: spy)
         _work.fill_cells(plan, frame, (7, 5))
-    assert asked == [call]
+    assert asked == [(call, True)]
 
 
 def test_a_far_base_loses_no_triangle_beside_a_seam(country):
