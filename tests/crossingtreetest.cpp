@@ -203,7 +203,10 @@ TEST(CrossingTreeTest, AnswersAsAScanOfAllTriangles) {
         // Boxes that are out of date are part of the rule.
         for (unsigned i = 0; i < tin.GetTriangleCount(); i += 7)
             tin.GetTriangle(i)->GetVertex(0)->z += 3, tin.GetTriangle(i)->GetVertex(1)->x += 2;
-        Compare(tin, CrossingTree(tin), count / 5, random);
+        const std::size_t before = GetHeapBytes();
+        const CrossingTree tree(tin);
+        EXPECT_LE(GetHeapBytes() - before, 1.05 * double(tree.GetObjBytes()) + 4096);
+        Compare(tin, tree, count / 5, random);
     }
     EXPECT_GT(found, asked / 5);
 }

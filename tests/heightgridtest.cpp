@@ -3,6 +3,7 @@
 
 #include <memory>
 #include <stdexcept>
+#include <thread>
 
 namespace kelm::tin::test {
 namespace {
@@ -84,7 +85,10 @@ TEST(HeightGrid, OfASheetFitsIntoItsDefaultMemory) {
     const auto getBytes = [&](unsigned most) {
         BuildOptions options;
         options.bytesPerTriangle = most;
-        return HeightGrid(tin, options).GetObjBytes();
+        const std::size_t before = GetHeapBytes();
+        const HeightGrid grid(tin, options);
+        EXPECT_LE(GetHeapBytes() - before, 1.05 * double(grid.GetObjBytes()) + 4096);
+        return grid.GetObjBytes();
     };
     EXPECT_EQ(getBytes(0), getBytes(1000));
     EXPECT_NE(getBytes(0), getBytes(1)) << "too little for cells";
@@ -144,11 +148,13 @@ struct Told {
     double dfLast = -1.0;
     double dfStop = 2.0;
     unsigned nCalls = 0;
+    std::thread::id oStarter = std::this_thread::get_id();
 };
 
 int Tell(double done, const char* message, void* data) {
     Told& told = *static_cast<Told*>(data);
     EXPECT_TRUE(done >= told.dfLast && done <= 1.0 && message != nullptr);
+    EXPECT_EQ(std::this_thread::get_id(), told.oStarter);
     told.dfLast = done;
     ++told.nCalls;
     return done < told.dfStop;

@@ -8,6 +8,7 @@
 #include <cstdlib>
 #include <gtest/gtest.h>
 #include <limits>
+#include <malloc.h>
 #include <numeric>
 #include <random>
 
@@ -82,6 +83,12 @@ struct Mesh {
                        static_cast<unsigned>(ids.size()), dfXBase, dfYBase);
     }
 };
+
+/// @return the bytes of the heap in use; 0 with an allocator of a sanitizer
+inline std::size_t GetHeapBytes() {
+    const struct mallinfo2 info = mallinfo2();
+    return info.uordblks + info.hblkhd;
+}
 
 /// @return the sorted triangles of a tree or node
 template <typename T>
