@@ -160,6 +160,10 @@ TEST(MisuseTest, AssignmentOfACopyReleasesNothingAndAMoveReleasesWhatItReplaces)
     double x, y;
     tin.GetXYBase(x, y);
     EXPECT_TRUE(x == 5 && y == 6 && tin.GetTriangleCount() == 2);
+    OpenTin copy(tin);
+    tin = std::move(copy); // both have the same arrays
+    float h;
+    EXPECT_TRUE(tin.GetVertex(5)->x >= 0 && !tin.GetHeight(-9.0F, -9.0F, h, nullptr));
 }
 
 TEST(MisuseTest, BothConstructorsRefuseNullOnlyWhereItIsNeeded) {

@@ -62,7 +62,9 @@ def test_closed_misses_no_position_on_an_edge(terrain):
     assert missed.any() and np.isnan(closed).sum() < missed.sum() / 10
     assert (usual[~missed] == closed[~missed]).all()
     alone = [terrain.heights(float(x), float(y), closed=True) for x, y in positions[missed][:100]]
+    along = terrain.profile(positions[missed][:100], 1e9, closed=True).heights
     assert np.array_equal(alone, closed[missed][:100], equal_nan=True)
+    assert np.array_equal(alone, along, equal_nan=True)
     cells = [(x - 0.5, y - 0.5, x + 0.5, y + 0.5) for x, y in positions[missed & ~np.isnan(closed)][:50]]
     for options, share in (({}, 1), ({"closed": True}, 0)):  # but for a rounding of the centre
         found = [terrain.raster(cell, 1, **options).heights[0, 0] for cell in cells]

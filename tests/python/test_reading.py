@@ -79,6 +79,7 @@ def test_what_is_left_out_is_a_warning(write, capfd):
         (dict(source="geoid"), ValueError, 'source: expected "orthometric"'),
         (dict(output=3), ValueError, "output: expected"),
         (dict(output="ellipsoidal"), kelm_tin.DataError, ""),
+        (dict(source="ellipsoidal", output="other"), kelm_tin.DataError, "output vertical datum may not be"),
         (dict(base=(0, np.nan)), ValueError, "base: expected"),
         (dict(window=(0, 0, np.nan, 1)), ValueError, "window: expected finite"),
         (dict(window=(0, 0, 1, 1)), kelm_tin.DataError, "no polygon of the layer or window"),

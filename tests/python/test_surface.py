@@ -44,6 +44,7 @@ def test_the_list_of_triangles_is_counted(terrain):
     part = terrain.subset(terrain.bounds)
     before = part.nbytes
     assert part.triangles.nbytes > 0 and part.nbytes - before == part.triangles.nbytes
+    assert np.shares_memory(part.triangles, part.triangles)
 
 
 def test_base_and_empty(square):

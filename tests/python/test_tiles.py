@@ -232,7 +232,21 @@ def test_geotiff(country, tmp_path, monkeypatch, writer):
     tiles.write_geotiff(other, name, transform=cells.transform, nodata=0)
     with rasterio.open(name) as file:
         assert file.nodata == 0
+    kinds = np.where(np.indices((120, 600)).sum(axis=0) % 2, 1, 3).astype(np.int16)
+    uneven = da.from_array(kinds, chunks=((20, 50, 50), 600))
+    tiles.write_geotiff(uneven, name, transform=cells.transform)
+    with rasterio.open(name) as file, rasterio.open(name, overview_level=0) as overview:
+        assert (file.read(1) == kinds).all() and set(np.unique(overview.read(1))) <= {1, 3}
     assert os.listdir(tmp_path) == ["cells.tif"]
+
+
+def test_a_plan_of_a_relative_folder_holds_elsewhere(tmp_path, monkeypatch):
+    gdal = pytest.importorskip("osgeo.gdal")
+    monkeypatch.chdir(tmp_path)
+    gdal.VectorTranslate("a.gdb", TERRAIN, format="OpenFileGDB")
+    plan = tiles.Plan("a.gdb", tile=4000.0)
+    monkeypatch.chdir("/")
+    assert np.isfinite(tiles.raster(plan, 500.0).compute()).any()
 
 
 def test_the_margin_counts_all_distances(country):
@@ -302,6 +316,7 @@ def test_a_geotiff_takes_a_bounded_memory(tmp_path, writer):
         (lambda: tiles.Plan(TERRAIN, tile=2000, source="geoid"), "source: expected"),
         (lambda: tiles.Plan(TERRAIN, tile=2000, limit=-1), "limit: expected"),
         (lambda: tiles.raster(tiles.Plan(TERRAIN, tile=2000), 300), "no whole number of cells of 300"),
+        (lambda: tiles.raster(tiles.Plan(TERRAIN, tile=2000), 330), "no whole number of cells of 330"),
         (lambda: tiles.raster(tiles.Plan(TERRAIN, tile=2000), 5000), "no whole number of cells of 5000"),
         (lambda: tiles.heights(tiles.Plan(TERRAIN, tile=2000), [1.0, 2.0]), r"xy: expected shape \(n, 2\)"),
         (lambda: tiles.heights(tiles.Plan(TERRAIN, tile=2000), da.zeros((3, 3))), r"got \(3, 3\)"),
