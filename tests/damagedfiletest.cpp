@@ -172,7 +172,7 @@ TEST_F(DamagedFileTest, LayerZeroIsTheFirstWithPolygonsAndARefusalNamesThem) {
         {"stakes", {{"POINT Z (0 0 1)"}, wkbPoint25D}},
         {"empty", {{MakeTriangle(6, 0, 0)}, wkbPolygon25D}},
         {"paths", {{"LINESTRING Z (0 0 1,1 1 1)"}}},
-        {"roofs", {{MakeTriangle(7, 0, 0)}}},
+        {"roofs", {{"", MakeTriangle(7, 0, 0)}}},
         {"walls", {{MakeTriangle(8, 0, 0)}, wkbPolygon25D}}};
     for (const std::size_t nLayers : {5U, 3U}) {
         const std::string path = moFolder.GetPath("a.gpkg");

@@ -1,5 +1,6 @@
 #include "tests/support/oddsurfaces.h"
 #include "tin/heightgrid.h"
+#include "tin/raster.h"
 
 #ifndef __clang__ // g++ 12 sees no value where a number of Boost's has one
 #pragma GCC diagnostic ignored "-Wmaybe-uninitialized"
@@ -108,6 +109,18 @@ void ExpectRun(const HeightGrid& grid, const Point2& p, EdgeRule rule, bool isFo
             << p.x << ", " << p.y << ", rule " << rule;
 }
 
+/// A raster of three cells around a position, of which the others lie in triangles.
+void ExpectCells(const OpenTin& tin, const HeightGrid& grid, const Point2& p, float h,
+                 bool isFound) {
+    const double side = std::fabs(double(p.x)) * 1e-4;
+    const RasterFrame frame{3, 1, {double(p.x) - 1.5 * side, side, 0, double(p.y), 0, 0}};
+    float cells[3], same[3];
+    RasterizeHeights(tin, frame, cells, 1, ER_Closed);
+    RasterizeHeights(grid, frame, same, 1, ER_Closed);
+    EXPECT_TRUE(isFound ? IsSameBits(cells[1], h) : std::isnan(cells[1])) << p.x << ", " << p.y;
+    EXPECT_TRUE(isFound ? IsSameBits(same[1], h) : std::isnan(same[1])) << p.x << ", " << p.y;
+}
+
 // TIN_TEST_POSITIONS sets how many positions are tried on each sheet.
 TEST(EdgeRule, ClosedMissesNoPositionOfAGaplessSheetAndNoneBesideIt) {
     Random random;
@@ -130,6 +143,7 @@ TEST(EdgeRule, ClosedMissesNoPositionOfAGaplessSheetAndNoneBesideIt) {
             EXPECT_TRUE(IsSameBits(closed, byTree) && (!isFound || IsSameBits(closed, h)));
             if (isFound)
                 continue;
+            ExpectCells(tin, grid, p, closed, isClosed);
             Rational exact;
             const bool isHeld = IsInSheet(tin, tree, p, exact);
             nMissed += isHeld;

@@ -118,7 +118,12 @@ TEST(MisuseTest, ADefaultTriangleHoldsNothing) {
     Triangle unset;
     const OwnTriangle set({{-1, -1, 0}, {1, -1, 0}, {0, 1, 0}});
     unset.ComputeBBox();
+    for (const float y : {0.0F, NOT_A_NUMBER})
+        EXPECT_FALSE(set.IsIntersectedLine(NOT_A_NUMBER, y, 0, 2));
     float h = UNTOUCHED;
+    const Tin tin(new Point[1]{}, 1, new Triangle[1], 1, 0, 0);
+    EXPECT_FALSE(tin.GetHeight(0.0F, 0.0F, h, nullptr, ER_Closed));
+    h = UNTOUCHED;
     std::vector<int> cells{1};
     std::vector<float> heights;
     EXPECT_FALSE(unset.GetHeight(0, 0, h) || unset.IsPointInside(0, 0) ||

@@ -101,6 +101,12 @@ struct WindowTest : FileTest {
             }
             EXPECT_EQ(nCount, poReader->EstimateShapeCount(oWindow));
             EXPECT_LE(CountMet(oAll, oWindow), nCount);
+            const int nFirst = ZARGetNext(poLayer, -1);
+            ZARSetWindow(poLayer, nullptr, nullptr); // the walk goes on without it
+            const auto itNext =
+                std::lower_bound(oAll.begin(), oAll.end(), std::pair(nFirst + 1, Ring()));
+            const int nNext = itNext == oAll.end() ? -1 : itNext->first;
+            EXPECT_TRUE(nFirst == -1 || ZARGetNext(poLayer, nFirst) == nNext);
             for (const auto& oShape : {oAll.back(), oAll.front()}) { // out of turn
                 EXPECT_EQ(ReadShape(poLayer, oShape.first), oShape.second);
                 ZARSetWindow(poLayer, &low, &high);
