@@ -91,6 +91,7 @@ TEST(HeightGrid, OfASheetFitsIntoItsDefaultMemory) {
         return grid.GetObjBytes();
     };
     EXPECT_EQ(getBytes(0), getBytes(1000));
+    EXPECT_EQ(HeightGrid::EstimateObjBytes(9), HeightGrid::EstimateObjBytes(9, {0, 1000, {}}));
     EXPECT_NE(getBytes(0), getBytes(1)) << "too little for cells";
 }
 

@@ -1,6 +1,7 @@
 #include "tests/support/allocationcounter.h"
 #include "tests/support/sheets.h"
 #include "tests/support/transcript.h"
+#include "tin/ray2.h"
 
 // What headers let a caller write must not crash. Bad releases show under the address sanitizer.
 
@@ -85,6 +86,9 @@ TEST(MisuseTest, TreesAndNodesMoveSwapAndStandInAVector) {
     AabbTree left = std::move(trees[0]);
     EXPECT_TRUE(trees[0].GetRoot() == nullptr && trees[0].GetObjBytes() == 32);
     EXPECT_EQ(left.GetNodeCount(), trees[5].GetNodeCount());
+    left.SetCapacity(99);
+    trees[0] = std::move(left);
+    EXPECT_TRUE(trees[0].GetCapacity() == 99 && left.GetCapacity() == counter.GetCapacity());
 }
 
 TEST(MisuseTest, ACopiedInnerNodeMayOutliveItsTree) {
@@ -117,6 +121,7 @@ TEST(MisuseTest, TheCrossingMayBeWrittenToAnEndOfTheSegment) {
 TEST(MisuseTest, ADefaultTriangleHoldsNothing) {
     Triangle unset;
     const OwnTriangle set({{-1, -1, 0}, {1, -1, 0}, {0, 1, 0}});
+    EXPECT_TRUE(IsIntersectedBBox(set.GetBBox(), Point{0, 0, 1}, Point{-0.0F, -0.0F, -1}));
     unset.ComputeBBox();
     for (const float y : {0.0F, NOT_A_NUMBER})
         EXPECT_FALSE(set.IsIntersectedLine(NOT_A_NUMBER, y, 0, 2));

@@ -25,13 +25,14 @@ RasterFrame MakeFrame(const OpenTin& tin, unsigned kind) {
     // Cells so fine that several have one float for a centre, which is that of a vertex.
     const Point2 at = kind % 6 < 4 ? Point2{} : GetVertexOf(tin, kind);
     const double fx = std::fabs(double(at.x)) * 0x1p-26, fy = std::fabs(double(at.y)) * 0x1p-26;
+    const double turn = kind % 4 == 0 ? 0 : dx / 9; // or the rows alone are turned
     const double transforms[][6] = {
-        {500 + double(box.min.x), dx, 0, double(box.max.y) - 3, 0, -dy},       // as usual
-        {500 + double(box.min.x) - dx / 2, dx, 0, double(box.min.y), 0, dy},   // upside down
-        {500 + double(box.min.x), dx, dx / 9, double(box.max.y), dy / 3, -dy}, // turned
-        {500 + double(box.max.x), -dx, 0, double(box.max.y), 0, -dy},          // mirrored
-        {500 + double(at.x) - fx, fx, 0, double(at.y) - 3 + fy, 0, -fy},       // fine
-        {500 + double(at.x) - fx, fx, 0, double(at.y) - 3 - fy, 0, fy}};       // and upside down
+        {500 + double(box.min.x), dx, 0, double(box.max.y) - 3, 0, -dy},     // as usual
+        {500 + double(box.min.x) - dx / 2, dx, 0, double(box.min.y), 0, dy}, // upside down
+        {500 + double(box.min.x), dx, turn, double(box.max.y), dy / 3, -dy}, // turned
+        {500 + double(box.max.x), -dx, 0, double(box.max.y), 0, -dy},        // mirrored
+        {500 + double(at.x) - fx, fx, 0, double(at.y) - 3 + fy, 0, -fy},     // fine
+        {500 + double(at.x) - fx, fx, 0, double(at.y) - 3 - fy, 0, fy}};     // and upside down
     std::copy(transforms[kind % 6], transforms[kind % 6] + 6, t);
     return frame;
 }

@@ -39,12 +39,9 @@ inline Mesh MakeSoup(unsigned count, const std::function<float()>& coordinate) {
     });
 }
 
-/// A sheet with a patch of very many triangles, some of them in a yet smaller patch, and below all
-/// of it some large ones.
+/// A sheet with a patch of very many triangles, some of them in a yet smaller patch.
 inline Mesh MakePatches(Random& random) {
     Mesh mesh = MakeSheet(3, random);
-    for (float i = 0; i < 12; ++i)
-        mesh.Add({40, 40, -i}, {80, 40, -9}, {40, 80, i - 5});
     for (const float scale : {1.0F, 0.02F})
         for (unsigned i = 0; i < 6000; ++i) {
             const float x = 51 + scale * random.Between(0, 4),
