@@ -136,15 +136,10 @@ TEST_F(DamagedFileTest, AWalkThatLosesItsTurnCountsADamagedRecordOnce) {
 
 TEST_F(DamagedFileTest, MessagesForWhoeverDebugsGdalAreNoWarnings) {
     const std::string path = Write("GPKG", "a.gpkg");
-    const auto KeepOthers = [](CPLErr eClass, CPLErrorNum nError, const char* pszText) {
-        if (eClass != CE_Debug)
-            GdalTranscript::Keep(eClass, nError, pszText);
-    };
-    CPLPushErrorHandlerEx(KeepOthers, &moTranscript);
+    CPLSetCurrentErrorHandlerCatchDebug(FALSE); // they go past the transcript
     CPLSetThreadLocalConfigOption("CPL_DEBUG", "ON");
     EXPECT_EQ(Load(path), "0 1 2 3 ");
     CPLSetThreadLocalConfigOption("CPL_DEBUG", "TIN");
-    CPLPopErrorHandler();
 }
 
 TEST_F(DamagedFileTest, ADatabaseIsReadWithTheLogBesideItOrNotAtAll) {

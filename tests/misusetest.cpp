@@ -88,7 +88,8 @@ TEST(MisuseTest, TreesAndNodesMoveSwapAndStandInAVector) {
     EXPECT_EQ(left.GetNodeCount(), trees[5].GetNodeCount());
     left.SetCapacity(99);
     trees[0] = std::move(left);
-    EXPECT_TRUE(trees[0].GetCapacity() == 99 && left.GetCapacity() == counter.GetCapacity());
+    EXPECT_EQ(trees[0].GetCapacity(), 99U);
+    EXPECT_EQ(left.GetCapacity(), counter.GetCapacity()); // NOLINT(bugprone-use-after-move)
 }
 
 TEST(MisuseTest, ACopiedInnerNodeMayOutliveItsTree) {

@@ -57,6 +57,24 @@ inline void StretchSheet(Mesh& rMesh, float x, float y) {
         vertex = {vertex.x * x, vertex.y * y, vertex.z};
 }
 
+/// Triangles apart from each other, in the box of a long one.
+inline Mesh MakeLone() {
+    Mesh mesh = MakeEach(60, [](float i) {
+        return std::array<Point, 3>{{{20 * i, 0, 1}, {20 * i + 9, 0, 2}, {20 * i, 9, i}}};
+    });
+    mesh.Add({-500, -500, 0}, {1700, 500, 0}, {1700, 499, 0});
+    return mesh;
+}
+
+/// Moves a vertex of each far beyond one side of its box, which stays behind.
+inline void MoveLone(OpenTin& rTin) {
+    for (unsigned i = 0; i < 60; ++i) {
+        Point* const v = rTin.GetVertex(3 * i);
+        float* const sides[] = {&v[0].x, &v[0].y, &v[1].x, &v[2].y};
+        *sides[i % 4] += i % 4 < 2 ? -490.0F : 490.0F;
+    }
+}
+
 inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
     using Trio = std::array<Point, 3>;
     const float far = -LOWEST, inf = std::numeric_limits<float>::infinity();
@@ -120,20 +138,9 @@ inline std::vector<OddSurface> MakeOddSurfaces(Random& random) {
     });
     add("moved", MakeSheet(3, random), [](OpenTin& rTin) { // the boxes stay behind
         for (unsigned i = 0; i < 40; ++i)
-            (i % 2 == 0 ? rTin.GetVertex(i * 7)->x : rTin.GetVertex(i * 7)->y) +=
-                i % 4 < 2 ? 4 : -4;
+            rTin.GetVertex(i * 7)->x += 4;
     });
-    Mesh lone = MakeEach(60, [](float i) {
-        return Trio{{{20 * i, 0, 1}, {20 * i + 9, 0, 2}, {20 * i, 9, i}}};
-    });
-    lone.Add({-500, -500, 0}, {1700, 500, 0}, {1700, 499, 0}); // so that segments reach all of it
-    add("moved beyond one side of the box", lone, [](OpenTin& rTin) {
-        for (unsigned i = 0; i < 60; ++i) {
-            Point* const v = rTin.GetVertex(3 * i);
-            float* const sides[] = {&v[0].x, &v[0].y, &v[1].x, &v[2].y};
-            *sides[i % 4] += i % 4 < 2 ? -490.0F : 490.0F;
-        }
-    });
+    add("moved beyond one side of the box", MakeLone(), MoveLone);
     add("soup", MakeSoup(400, [&] { return random.Between(-9, 9); }), leave);
     add("soup at all scales",
         MakeSoup(400,
