@@ -28,9 +28,7 @@ def make_png(surface: Surface) -> Optional[bytes]:
     # The shade of a cell is found from its neighbours, so there must be two rows and two columns.
     columns, rows = (max(2, round(length / side)) for length in (xmax - xmin, ymax - ymin))
     dx, dy = (xmax - xmin) / columns, (ymax - ymin) / rows
-    x = xmin + (np.arange(columns) + 0.5) * dx
-    y = ymax - (np.arange(rows) + 0.5) * dy
-    heights = surface.heights(x, y[:, np.newaxis], closed=True)
+    heights = surface._native.rasterize(columns, rows, (xmin, dx, 0.0, ymax, 0.0, -dy), 0, True)
     there = np.isfinite(heights)
     if not there.any():
         return None
